@@ -1,0 +1,167 @@
+#include "config/VelmoraLoadXml.h"
+
+#include <tinyxml2.h>
+
+#include "compat/BoundedString.h"
+#include "platform/PlatformImports.h"
+#include "platform/VelmoraLog.h"
+
+#ifndef VELMORA_CLOUD_CONFIG_DIR
+#define VELMORA_CLOUD_CONFIG_DIR "/data/vendor/orvane"
+#endif
+
+namespace {
+
+constexpr size_t kPathBufferSize = 128;
+constexpr const char* kIncrementalProperty = "ro.build.version.incremental";
+constexpr const char* kCloudConfigFormat =
+    VELMORA_CLOUD_CONFIG_DIR "/cloud_cust_velmora_config_%s.xml";
+constexpr const char* kCustConfigSuffix = "xml/velmora_config_cust.xml";
+// A command keeps at most this many action elements; later ones are ignored.
+constexpr int kMaxActionsPerCommand = 3;
+
+}  // namespace
+
+void VelmoraLoadXml::freeRawXmlDataMap(RawXmlDataMap* rawMap) {
+    if (rawMap == nullptr) {
+        return;
+    }
+    for (auto& entry : *rawMap) {
+        RawXmlData* record = entry.second;
+        while (record != nullptr) {
+            RawXmlData* next = record->next;
+            delete record;
+            record = next;
+        }
+    }
+    rawMap->clear();
+}
+
+ActionMap* VelmoraLoadXml::loadXmlMap() {
+    RawXmlDataMap rawMap;
+    ActionMap* result = nullptr;
+
+    if (getCloudUpdateVelmoraConfig(&rawMap) != 0) {
+        char path[kPathBufferSize] = {0};
+        if (get_one_cfg_file(kCustConfigSuffix, 0, path) == nullptr) {
+            VLOGE("velmora_config_cust.xml is not exit or file is invalid!");
+            freeRawXmlDataMap(&rawMap);
+            return nullptr;
+        }
+        VLOGD("switch to velmora config file : %s.", path);
+        const int32_t ret = innerLoad(path, &rawMap);
+        if (ret != 0) {
+            VLOGE("get velmora_config_cust.xml failed!,ret:%d", ret);
+            freeRawXmlDataMap(&rawMap);
+            return nullptr;
+        }
+    }
+
+    // No second fallback here: a cloud copy that loads but holds no valid command hides the
+    // customisation copy on purpose.
+    if (rawMap.empty()) {
+        VLOGE("empty rawXmlDataMap!!");
+    } else {
+        result = createActionMap(rawMap);
+    }
+    freeRawXmlDataMap(&rawMap);
+    return result;
+}
+
+int32_t VelmoraLoadXml::getCloudUpdateVelmoraConfig(RawXmlDataMap* rawMap) {
+    char version[VELMORA_PROPERTY_VALUE_MAX] = {0};
+    if (property_get(kIncrementalProperty, version, "") < 1) {
+        VLOGE("get property %s failed!", kIncrementalProperty);
+        return -1;
+    }
+    char path[kPathBufferSize] = {0};
+    if (snprintf_s(path, kPathBufferSize, kPathBufferSize - 1, kCloudConfigFormat, version) < 0) {
+        VLOGE("get file path failed!");
+        return -1;
+    }
+    VLOGD("switch to cloud update config file : %s.", path);
+    const int32_t ret = innerLoad(path, rawMap);
+    if (ret != 0) {
+        VLOGE("get cloud velmora_config_cust.xml failed!,ret:%d", ret);
+        return -1;
+    }
+    return 0;
+}
+
+int32_t VelmoraLoadXml::innerLoad(const char* path, RawXmlDataMap* rawMap) {
+    if (path == nullptr || rawMap == nullptr) {
+        return 2;
+    }
+    tinyxml2::XMLDocument doc(true);
+    doc.LoadFile(path);
+    const int error = doc.ErrorID();
+    if (error != 0) {
+        VLOGE("LoadFile error, path:%s, error code:%d", path, error);
+        return 2;
+    }
+    tinyxml2::XMLElement* policy = doc.FirstChildElement("policy");
+    if (policy == nullptr) {
+        return 3;
+    }
+    tinyxml2::XMLElement* first = policy->FirstChildElement();
+    if (first == nullptr) {
+        return 3;
+    }
+    parseCmdInfo(first, rawMap);
+    return 0;
+}
+
+void VelmoraLoadXml::parseCmdInfo(tinyxml2::XMLElement* element, RawXmlDataMap* rawMap) {
+    for (; element != nullptr; element = element->NextSiblingElement()) {
+        int id = 0;
+        if (element->QueryIntAttribute("id", &id) != tinyxml2::XML_SUCCESS) {
+            continue;
+        }
+        if (rawMap->count(id) != 0) {
+            VLOGE("multi-cmdId exist! we choose the first one, cmdId=%d", id);
+            continue;
+        }
+        RawXmlData* head = new RawXmlData();
+        head->cmdId = id;
+        const char* name = element->Attribute("name");
+        head->name = name != nullptr ? name : "unknown";
+        iterRawXmlDatas(head, element);
+        (*rawMap)[id] = head;
+    }
+}
+
+void VelmoraLoadXml::iterRawXmlDatas(RawXmlData* head, tinyxml2::XMLElement* cmdElement) {
+    RawXmlData* tail = head;
+    int seen = 0;
+    for (tinyxml2::XMLElement* child = cmdElement->FirstChildElement();
+         child != nullptr && seen < kMaxActionsPerCommand; child = child->NextSiblingElement()) {
+        ++seen;  // rejected actions count towards the limit too
+        RawXmlData* record = new RawXmlData();
+        record->cmdId = head->cmdId;
+        record->name = head->name;
+        int type = 0;
+        if (child->QueryIntAttribute("type", &type) == tinyxml2::XML_SUCCESS) {
+            record->type = type;
+        }
+        if (parseRawXmlDataInfo(record, child->FirstChildElement())) {
+            tail->next = record;
+            tail = record;
+        } else {
+            delete record;
+        }
+    }
+}
+
+bool VelmoraLoadXml::parseRawXmlDataInfo(RawXmlData* record, tinyxml2::XMLElement* element) {
+    for (; element != nullptr; element = element->NextSiblingElement()) {
+        const char* name = element->Name();
+        const char* text = element->GetText();
+        if (name == nullptr || text == nullptr) {
+            VLOGE("xml name or value is NULL!");
+            return false;
+        }
+        record->names.emplace_back(name);
+        record->values.emplace_back(text);
+    }
+    return true;
+}

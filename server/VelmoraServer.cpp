@@ -1,0 +1,184 @@
+#include "server/VelmoraServer.h"
+
+#include "config/Action.h"
+#include "config/VelmoraLoadXml.h"
+#include "config/VelmoraParser.h"
+#include "freq/FreqClientManager.h"
+#include "platform/VelmoraLog.h"
+#include "platform/VelmoraPlat.h"
+#include "probe/ProbeHandler.h"
+#include "sched/SchedLevelManager.h"
+
+namespace {
+
+// The probe worker owns its action chain and frees it by walking mNext, but a parsed copy's
+// mNext is borrowed from the parser's chain: a probe command with a second alternative would be
+// freed twice (or after a reload, read after free). Keep only the first alternative.
+void detachBorrowedChain(Action* probeAction) {
+    if (probeAction->mNext != nullptr) {
+        VLOGW("probe command has more than one action, only the first is used");
+        probeAction->mNext = nullptr;
+    }
+}
+
+// Start-up command whose duration-0 action carries the default scheduling-group levels.
+constexpr int kDefaultSchedLevelCmdId = 5376;
+constexpr int kProbeCmdId = 4116;
+
+}  // namespace
+
+VelmoraServer::VelmoraServer()
+    : mPlatPtr(nullptr),
+      mFreqClientPtr(nullptr),
+      mSchedLevelPtr(nullptr),
+      mProbeHandler(nullptr),
+      mDebugLog(false),
+      mInitialized(false),
+      mPolicyEnabled(false),
+      mCurSpecialCmdId(0) {
+    initExistingPriority();
+}
+
+VelmoraServer::~VelmoraServer() {
+    releaseComponents();
+}
+
+void VelmoraServer::releaseComponents() {
+    // The platform goes first although the managers point at it: their destructors never call
+    // into the platform.
+    delete mPlatPtr;
+    mPlatPtr = nullptr;
+    delete mFreqClientPtr;
+    mFreqClientPtr = nullptr;
+    delete mSchedLevelPtr;
+    mSchedLevelPtr = nullptr;
+    delete mProbeHandler;
+    mProbeHandler = nullptr;
+}
+
+void VelmoraServer::deleteObject() {
+    releaseComponents();
+}
+
+int VelmoraServer::velmoraGetVersion() {
+    return 1;
+}
+
+void VelmoraServer::deleteActionPtr(Action* action) {
+    while (action != nullptr) {
+        Action* next = action->mNext;
+        delete action;
+        action = next;
+    }
+}
+
+int VelmoraServer::parseCommand(int cmdId, Action* action) {
+    VelmoraParser* parser = mPlatPtr != nullptr ? mPlatPtr->mParserPtr : nullptr;
+    if (parser == nullptr) {
+        return -1;
+    }
+    pthread_rwlock_rdlock(&parser->mRwLock);
+    const int ret = parser->doParseLocked(cmdId, action);
+    pthread_rwlock_unlock(&parser->mRwLock);
+    return ret;
+}
+
+int VelmoraServer::init() {
+    mPlatPtr = getPlat();
+    if (mPlatPtr == nullptr) {
+        VLOGE("get platform ptr failed!");
+        return -1;
+    }
+    mPlatPtr->mServerPtr = this;
+
+    mFreqClientPtr = getFreqClient(mPlatPtr);
+    if (mFreqClientPtr == nullptr) {
+        VLOGE("get freqClient ptr failed!");
+        delete mPlatPtr;
+        mPlatPtr = nullptr;
+        return -1;
+    }
+    mSchedLevelPtr = getSchedLevel(mPlatPtr);
+    if (mSchedLevelPtr == nullptr) {
+        VLOGE("get schedLevel ptr failed!");
+        delete mPlatPtr;
+        mPlatPtr = nullptr;
+        delete mFreqClientPtr;
+        mFreqClientPtr = nullptr;
+        return -1;
+    }
+
+    // The platform owns the parser from here on, also if loading fails below.
+    VelmoraParser* parser = new VelmoraParser();
+    mPlatPtr->mParserPtr = parser;
+
+    ActionMap* actionMap = nullptr;
+    VelmoraLoadXml* loader = createVelmoraLoadXml();
+    if (loader == nullptr) {
+        VLOGE("server get loader failed!");
+    } else {
+        actionMap = loader->loadXmlMap();
+        if (actionMap == nullptr) {
+            VLOGE("load xml map failed!");
+        }
+        delete loader;
+    }
+    if (actionMap == nullptr) {
+        VLOGE("createParser failed!");
+        releaseComponents();
+        return -1;
+    }
+    parser->mActionMap = actionMap;
+    parser->mServerPtr = mPlatPtr->mServerPtr;
+
+    const int initRet = mPlatPtr->initialize();
+    if (initRet != 0) {
+        VLOGE("initialize failed!");
+        releaseComponents();
+        return initRet;
+    }
+
+    mInitialized = true;
+    const int defaultRet = velmoraEvent(kDefaultSchedLevelCmdId, "", 0, nullptr);
+    if (defaultRet != 0) {
+        mInitialized = false;
+        releaseComponents();
+        VLOGE("init default group sched level failed!");
+        return defaultRet;
+    }
+
+    Action* probeAction = new Action();
+    if (parseCommand(kProbeCmdId, probeAction) != 0) {
+        deleteActionPtr(probeAction);
+        VLOGE("doParse probe event failed!");
+        return 4;
+    }
+    detachBorrowedChain(probeAction);
+    mProbeHandler = new ProbeHandler(mPlatPtr, probeAction);
+
+    initPriorityMap();
+    return 0;
+}
+
+int VelmoraServer::updateProbeHandler() {
+    Action* action = new Action();
+    VelmoraParser* parser = mPlatPtr != nullptr ? mPlatPtr->mParserPtr : nullptr;
+    // Runs under the parser's write lock: parse without taking the read lock.
+    if (parser == nullptr || parser->doParseLocked(kProbeCmdId, action) != 0) {
+        deleteActionPtr(action);
+        VLOGE("updateProbeHandler:doParse probe event failed!");
+        return 4;
+    }
+    detachBorrowedChain(action);
+    if (mProbeHandler == nullptr) {
+        deleteActionPtr(action);
+        VLOGE("updateProbeHandler:mProbeHandler is NULL!");
+        return 4;
+    }
+    if (mProbeHandler->updateProbeThread(action) == 0) {
+        return 0;
+    }
+    VLOGE("updateProbeHandler:updateProbeThread failed!");
+    deleteActionPtr(action);
+    return 4;
+}

@@ -1,0 +1,129 @@
+// Client configuration requests, queries and the debug dump.
+#include <unistd.h>
+
+#include <utils/String8.h>
+
+#include "freq/FreqClientManager.h"
+#include "platform/PerfExecutor.h"
+#include "platform/VelmoraLog.h"
+#include "platform/VelmoraPlat.h"
+#include "sched/SchedLevelManager.h"
+#include "server/VelmoraServer.h"
+
+namespace {
+
+constexpr int kTagSchedLevelStep = 40;
+constexpr int kTagSetSchedLevel = 42;
+constexpr size_t kMaxDumpArgLength = 512;
+
+}  // namespace
+
+int VelmoraServer::velmoraSetConfig(int clientId, int tagLen, const int* tags,
+                                    const int* configs) {
+    if (!mInitialized) {
+        return 1;
+    }
+    if (mFreqClientPtr == nullptr) {
+        VLOGE("init mFreqClientPtr failed!");
+        return 4;
+    }
+    // The managers size stack arrays by tagLen and read both arrays in full.
+    if (tagLen < 0 || (tagLen > 0 && (tags == nullptr || configs == nullptr))) {
+        VLOGE("velmoraSetConfig invalid request, clientId=%d, tagLen=%d", clientId, tagLen);
+        return 3;
+    }
+    if (clientId != 0) {
+        for (int i = 0; i < tagLen; ++i) {
+            VLOGI("setConfig clientId=%d, tagLen=%d, tags[%d]=%d, configs[%d]=%d", clientId,
+                  tagLen, i, tags[i], i, configs[i]);
+        }
+    }
+    for (int i = 0; i < tagLen; ++i) {
+        if (tags[i] != kTagSchedLevelStep && tags[i] != kTagSetSchedLevel) {
+            continue;
+        }
+        if (mSchedLevelPtr == nullptr) {
+            VLOGE("init mSchedLevelPtr failed!");
+            return 4;
+        }
+        const int ret = mSchedLevelPtr->doPerfSetSchedLevel(clientId, tagLen, tags, configs);
+        if (ret != 0) {
+            VLOGE("velmoraSetConfig doPerfSetSchedLevel failed! clientId=%d", clientId);
+        }
+        return ret;
+    }
+    if (mFreqClientPtr->doPerfSetConfig(clientId, tagLen, tags, configs, nullptr) != 0) {
+        VLOGE("velmoraSetConfig failed!");
+        return 3;
+    }
+    return 0;
+}
+
+int VelmoraServer::velmoraGetConfig(int tagLen, const int* tags, int* configs) {
+    if (!mInitialized) {
+        return 1;
+    }
+    if (mDebugLog) {
+        VLOGI("velmoraGetConfig tagLen=%d", tagLen);
+    }
+    if (mPlatPtr == nullptr) {
+        VLOGE("init mPlatPtr failed!");
+        return 4;
+    }
+    if (tagLen < 0 || (tagLen > 0 && (tags == nullptr || configs == nullptr))) {
+        VLOGE("velmoraGetConfig invalid request, tagLen=%d", tagLen);
+        return 3;
+    }
+    PerfExecutor* executor = mPlatPtr->mExecutorPtr;
+    if (executor != nullptr && executor->doPerfGetConfig(tagLen, tags, configs) == 0) {
+        return 0;
+    }
+    VLOGE("velmoraGetConfig doPerfGetConfig failed!");
+    return 3;
+}
+
+void VelmoraServer::dumpVelmoraServerInfo(int fd, const std::vector<std::string>& args) {
+    if (fd < 0) {
+        VLOGW("invalid dump FD, %d\n", fd);
+        return;
+    }
+    if (args.empty()) {
+        VLOGW("dump parameter is NULL!\n");
+        return;
+    }
+    if (args.size() >= 2) {
+        VLOGW("there is too many dump parameter!\n");
+        return;
+    }
+    const std::string& option = args[0];
+    if (option.size() > kMaxDumpArgLength) {
+        VLOGW("debug parameter is too long!\n");
+        return;
+    }
+
+    android::String8 out;
+    if (option == "--help") {
+        out.append("--help: print debug usage\n");
+        out.append("--logon: open debug log\n");
+        out.append("--logoff: close debug log\n");
+        out.append("--freqlist: print set freq list\n");
+        out.append("--easgrouplist: print set eas group list\n");
+    } else if (option == "--logon") {
+        mDebugLog = true;
+        out.appendFormat("velmora log is %s\n", "ON");
+    } else if (option == "--logoff") {
+        mDebugLog = false;
+        out.appendFormat("velmora log is %s\n", "OFF");
+    } else if (option == "--freqlist") {
+        if (mFreqClientPtr != nullptr) {
+            mFreqClientPtr->dumpFreqList(out);
+        }
+    } else if (option == "--easgrouplist") {
+        if (mSchedLevelPtr != nullptr) {
+            mSchedLevelPtr->dumpEasGroupList(out);
+        }
+    } else {
+        out.append("invalid parameter!\n");
+    }
+    dprintf(fd, "%s\n", out.string());
+}

@@ -1,0 +1,167 @@
+// Special-scene priorities: built-in and configured values and the selection of the scene to
+// apply. Lookups in mPriorityMap insert a 0 entry on a miss, on purpose: a scene without a
+// configured priority is remembered as invalid.
+#include <cstdlib>
+#include <cstring>
+
+#include "config/Action.h"
+#include "config/VelmoraParser.h"
+#include "platform/VelmoraPlat.h"
+#include "server/VelmoraServer.h"
+
+namespace {
+
+constexpr int kSceneFirst = 4118;
+// Configured priorities are read up to here; scene 4352 keeps whatever a lookup gave it.
+constexpr int kScenePriorityReadLast = 4351;
+constexpr int kGovSceneFirst = 4224;
+constexpr int kGovSceneLast = 4352;
+// A governor scene may be applied on its own while this scene is current.
+constexpr int kGovHostScene = 4119;
+constexpr int kPriorityTag = 101;
+constexpr const char* kPriorityKey = "priority";
+constexpr int kPriorityMin = 1;
+constexpr int kPriorityMax = 500;
+
+bool isGovScene(int cmdId) {
+    return cmdId >= kGovSceneFirst && cmdId <= kGovSceneLast;
+}
+
+bool inPriorityRange(int prio) {
+    return prio >= kPriorityMin && prio <= kPriorityMax;
+}
+
+}  // namespace
+
+void VelmoraServer::initExistingPriority() {
+    mPriorityMap[4118] = 100;
+    mPriorityMap[4119] = 200;
+    mPriorityMap[4120] = 20;
+    mPriorityMap[4121] = 70;
+}
+
+int VelmoraServer::getPriority(Action* action) {
+    if (action->mParamNum < 1) {
+        return 0;
+    }
+    int prio = 0;
+    const size_t pairs = static_cast<size_t>(action->mParamNum);
+    for (size_t i = 0; i < pairs && 2 * i + 1 < action->mTagValues.size(); ++i) {
+        if (action->mTagValues[2 * i] == kPriorityTag) {
+            prio = action->mTagValues[2 * i + 1];
+        }
+    }
+    return prio;
+}
+
+int VelmoraServer::getInterPriority(Action* action) {
+    if (action->mParamNum < 1) {
+        return 0;
+    }
+    int prio = 0;
+    const size_t pairs = static_cast<size_t>(action->mParamNum);
+    for (size_t i = 0; i < pairs && 2 * i + 1 < action->mParams.size(); ++i) {
+        if (action->mParams[2 * i] == kPriorityKey) {
+            prio = atoi(action->mParams[2 * i + 1].c_str());
+        }
+    }
+    return prio;
+}
+
+void VelmoraServer::setPriorityMap(int cmdId, Action* action) {
+    if (action == nullptr || action->mParamNum < 1) {
+        return;
+    }
+    const int prio = isGovScene(cmdId) ? getInterPriority(action) : getPriority(action);
+    if (!inPriorityRange(prio)) {
+        return;  // an invalid configured value keeps the built-in or earlier entry
+    }
+    mPriorityMap[cmdId] = prio;
+}
+
+void VelmoraServer::initPriorityMap() {
+    for (int cmdId = kSceneFirst; cmdId <= kScenePriorityReadLast; ++cmdId) {
+        Action action;
+        if (parseCommand(cmdId, &action) == 0) {
+            setPriorityMap(cmdId, &action);
+        }
+    }
+}
+
+void VelmoraServer::updatePriorityMap() {
+    VelmoraParser* parser = mPlatPtr != nullptr ? mPlatPtr->mParserPtr : nullptr;
+    android::Mutex::Autolock lock(mMutex);
+    mPriorityMap.clear();
+    initExistingPriority();
+    if (parser == nullptr) {
+        return;
+    }
+    // The parser's write lock is held by the reload that called us.
+    for (int cmdId = kSceneFirst; cmdId <= kScenePriorityReadLast; ++cmdId) {
+        Action action;
+        if (parser->doParseLocked(cmdId, &action) == 0) {
+            setPriorityMap(cmdId, &action);
+        }
+    }
+}
+
+bool VelmoraServer::isPriorityValid(int cmdId) {
+    return inPriorityRange(mPriorityMap[cmdId]);
+}
+
+int VelmoraServer::doOnEvent(int cmdId, int newPrio, int curPrio) {
+    mOnEventSet.insert(cmdId);
+    if (newPrio <= curPrio) {
+        return 1;
+    }
+    return mCurSpecialCmdId != 0 ? 3 : 0;
+}
+
+int VelmoraServer::doOffEvent(int cmdId, int* nextCmdId, int* flag) {
+    mOnEventSet.erase(cmdId);
+    if (cmdId != mCurSpecialCmdId) {
+        return 2;
+    }
+    const int next = getCmdIdWithMaxPrio(false);
+    if (next != 0) {
+        *nextCmdId = next;
+        *flag = 0;
+        mCurSpecialCmdId = next;
+        return 3;
+    }
+    *nextCmdId = cmdId;
+    mCurSpecialCmdId = 0;
+    return 0;
+}
+
+int VelmoraServer::getCmdIdWithMaxPrio(bool govOnly) {
+    int best = 0;
+    int bestPrio = -1;
+    for (int cmdId : mOnEventSet) {
+        if (govOnly && cmdId < kGovSceneFirst) {
+            continue;
+        }
+        const int prio = mPriorityMap[cmdId];
+        if (prio > bestPrio) {  // strict: ties go to the smaller cmdId
+            best = cmdId;
+            bestPrio = prio;
+        }
+    }
+    return best;
+}
+
+int VelmoraServer::getMaxGovPrioCmdIdInOnEvent(int cmdId) {
+    if (!isGovScene(cmdId) || mCurSpecialCmdId != kGovHostScene) {
+        return 0;
+    }
+    const int best = getCmdIdWithMaxPrio(true);
+    // A tie goes to the scene that just switched on.
+    return mPriorityMap[cmdId] < mPriorityMap[best] ? best : cmdId;
+}
+
+int VelmoraServer::getMaxGovPrioCmdIdInOffEvent() {
+    if (mCurSpecialCmdId != kGovHostScene) {
+        return 0;
+    }
+    return getCmdIdWithMaxPrio(true);
+}

@@ -1,0 +1,80 @@
+#include "tests/fakes/ServerTest.h"
+
+#include <stdlib.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <fstream>
+
+namespace velmora {
+namespace fake {
+
+const char* const kStartupCommands =
+    "<cmd id=\"5376\" name=\"default_sched\"><act><duration>0</duration>"
+    "<t51>0</t51><t52>0</t52><t53>0</t53><t54>0</t54>"
+    "<t55>0</t55><t56>0</t56><t57>0</t57><t58>0</t58></act></cmd>"
+    "<cmd id=\"4116\" name=\"probe\"><act><duration>8</duration><t1>1000</t1></act></cmd>";
+
+std::string policyXml(const std::string& commands) {
+    return "<?xml version=\"1.0\" encoding=\"utf-8\"?>\n<policy>" + commands + "</policy>\n";
+}
+
+namespace {
+
+void writeFile(const std::string& path, const std::string& text) {
+    std::ofstream out(path, std::ios::trunc);
+    out << text;
+}
+
+void mkdirs(const std::string& dir) {
+    std::string partial;
+    for (size_t pos = 0; pos != std::string::npos;) {
+        pos = dir.find('/', pos + 1);
+        partial = dir.substr(0, pos);
+        mkdir(partial.c_str(), 0755);
+    }
+}
+
+}  // namespace
+
+void ServerTest::SetUp() {
+    FakeEnv::get().reset();
+    LogCapture::start();
+    char tmpl[] = "/tmp/velmora-test-XXXXXX";
+    ASSERT_NE(mkdtemp(tmpl), nullptr);
+    mTmpDir = tmpl;
+}
+
+void ServerTest::TearDown() {
+    mServer.reset();
+    if (!mCloudPath.empty()) {
+        unlink(mCloudPath.c_str());
+    }
+    unlink((mTmpDir + "/velmora_config_cust.xml").c_str());
+    rmdir(mTmpDir.c_str());
+    FakeEnv::get().reset();
+}
+
+void ServerTest::writeCustConfig(const std::string& xml) {
+    const std::string path = mTmpDir + "/velmora_config_cust.xml";
+    writeFile(path, xml);
+    env().custConfigPath = path;
+}
+
+void ServerTest::writeCloudConfig(const std::string& incremental, const std::string& xml) {
+    mkdirs(VELMORA_CLOUD_CONFIG_DIR);
+    mCloudPath = std::string(VELMORA_CLOUD_CONFIG_DIR) + "/cloud_cust_velmora_config_" +
+                 incremental + ".xml";
+    writeFile(mCloudPath, xml);
+    env().incremental = incremental;
+}
+
+int ServerTest::startServer(const std::string& extraCommands) {
+    writeCustConfig(policyXml(std::string(kStartupCommands) + extraCommands));
+    mServer = std::make_unique<VelmoraServer>();
+    return mServer->init();
+}
+
+}  // namespace fake
+}  // namespace velmora
