@@ -1,5 +1,6 @@
 #include "config/VelmoraLoadXml.h"
 
+#include <ctype.h>
 #include <tinyxml2.h>
 
 #include "compat/BoundedString.h"
@@ -19,6 +20,33 @@ constexpr const char* kCloudConfigFormat =
 constexpr const char* kCustConfigSuffix = "xml/velmora_config_cust.xml";
 // A command keeps at most this many action elements; later ones are ignored.
 constexpr int kMaxActionsPerCommand = 3;
+
+// Reads a decimal integer attribute. Newer tinyxml2 releases also accept hexadecimal text
+// such as "0x10"; configurations written for devices must not depend on that, so only
+// decimal text counts as an integer here.
+bool queryDecimalAttribute(const tinyxml2::XMLElement* element, const char* name, int* out) {
+    const char* text = element->Attribute(name);
+    if (text == nullptr) {
+        return false;
+    }
+    const char* p = text;
+    while (isspace(static_cast<unsigned char>(*p))) {
+        ++p;
+    }
+    if (*p == '+' || *p == '-') {
+        ++p;
+    }
+    if (!isdigit(static_cast<unsigned char>(*p))) {
+        return false;
+    }
+    while (isdigit(static_cast<unsigned char>(*p))) {
+        ++p;
+    }
+    while (isspace(static_cast<unsigned char>(*p))) {
+        ++p;
+    }
+    return *p == '\0' && element->QueryIntAttribute(name, out) == tinyxml2::XML_SUCCESS;
+}
 
 }  // namespace
 
@@ -114,7 +142,7 @@ int32_t VelmoraLoadXml::innerLoad(const char* path, RawXmlDataMap* rawMap) {
 void VelmoraLoadXml::parseCmdInfo(tinyxml2::XMLElement* element, RawXmlDataMap* rawMap) {
     for (; element != nullptr; element = element->NextSiblingElement()) {
         int id = 0;
-        if (element->QueryIntAttribute("id", &id) != tinyxml2::XML_SUCCESS) {
+        if (!queryDecimalAttribute(element, "id", &id)) {
             continue;
         }
         if (rawMap->count(id) != 0) {
@@ -140,7 +168,7 @@ void VelmoraLoadXml::iterRawXmlDatas(RawXmlData* head, tinyxml2::XMLElement* cmd
         record->cmdId = head->cmdId;
         record->name = head->name;
         int type = 0;
-        if (child->QueryIntAttribute("type", &type) == tinyxml2::XML_SUCCESS) {
+        if (queryDecimalAttribute(child, "type", &type)) {
             record->type = type;
         }
         if (parseRawXmlDataInfo(record, child->FirstChildElement())) {

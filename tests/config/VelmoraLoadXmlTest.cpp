@@ -1,0 +1,203 @@
+// Loading the command configuration: which file wins, what the raw records look like and what
+// is logged for each kind of broken file.
+#include "config/VelmoraLoadXml.h"
+
+#include <string>
+#include <vector>
+
+#include "tests/fakes/ServerTest.h"
+
+namespace velmora {
+namespace fake {
+namespace {
+
+struct RawRecord {
+    int cmdId;
+    int type;
+    std::string name;
+    std::vector<std::string> names;
+    std::vector<std::string> values;
+};
+
+// Loader whose conversion snapshots the raw chains it is handed.
+class CapturingLoader : public VelmoraLoadXml {
+public:
+    ActionMap* createActionMap(RawXmlDataMap& rawMap) override {
+        ++conversions;
+        for (const auto& entry : rawMap) {
+            std::vector<RawRecord> chain;
+            for (const RawXmlData* rec = entry.second; rec != nullptr; rec = rec->next) {
+                chain.push_back({rec->cmdId, rec->type, rec->name, rec->names, rec->values});
+            }
+            chains[entry.first] = chain;
+        }
+        return new ActionMap();
+    }
+
+    int conversions = 0;
+    std::map<int, std::vector<RawRecord>> chains;
+};
+
+class VelmoraLoadXmlTest : public ServerTest {
+protected:
+    // Loads and returns whether a map came back; the map itself is empty by construction.
+    bool load() {
+        ActionMap* map = mLoader.loadXmlMap();
+        const bool loaded = map != nullptr;
+        delete map;
+        return loaded;
+    }
+
+    CapturingLoader mLoader;
+};
+
+const char* const kCustCommands = "<cmd id=\"4400\" name=\"cust\"><act><k>1</k></act></cmd>";
+const char* const kCloudCommands = "<cmd id=\"4500\" name=\"cloud\"><act><k>2</k></act></cmd>";
+
+TEST_F(VelmoraLoadXmlTest, CloudCopyForThisBuildWins) {
+    writeCustConfig(policyXml(kCustCommands));
+    writeCloudConfig("eng.1234", policyXml(kCloudCommands));
+    ASSERT_TRUE(load());
+    EXPECT_EQ(mLoader.chains.count(4500), 1u);
+    EXPECT_EQ(mLoader.chains.count(4400), 0u);
+    EXPECT_EQ(LogCapture::countContaining("switch to cloud update config file : "), 1);
+}
+
+TEST_F(VelmoraLoadXmlTest, MissingPropertyFallsBackToCustomisationCopy) {
+    writeCustConfig(policyXml(kCustCommands));
+    ASSERT_TRUE(load());
+    EXPECT_EQ(mLoader.chains.count(4400), 1u);
+    EXPECT_TRUE(
+        LogCapture::has(ANDROID_LOG_ERROR, "get property ro.build.version.incremental failed!"));
+    EXPECT_EQ(LogCapture::countContaining("switch to velmora config file : "), 1);
+}
+
+TEST_F(VelmoraLoadXmlTest, MissingCloudFileFallsBack) {
+    writeCustConfig(policyXml(kCustCommands));
+    env().incremental = "no-such-build";
+    ASSERT_TRUE(load());
+    EXPECT_EQ(mLoader.chains.count(4400), 1u);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "get cloud velmora_config_cust.xml failed!,ret:2"));
+}
+
+TEST_F(VelmoraLoadXmlTest, CloudCopyWithoutPolicyFallsBackWithStatusThree) {
+    writeCustConfig(policyXml(kCustCommands));
+    writeCloudConfig("b1", "<config><cmd id=\"4500\"/></config>");
+    ASSERT_TRUE(load());
+    EXPECT_EQ(mLoader.chains.count(4400), 1u);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "get cloud velmora_config_cust.xml failed!,ret:3"));
+
+    LogCapture::clear();
+    mLoader.chains.clear();
+    writeCloudConfig("b1", "<policy></policy>");
+    ASSERT_TRUE(load());
+    EXPECT_EQ(mLoader.chains.count(4400), 1u);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "get cloud velmora_config_cust.xml failed!,ret:3"));
+}
+
+TEST_F(VelmoraLoadXmlTest, CloudCopyWithoutValidCommandsHidesCustomisationCopy) {
+    writeCustConfig(policyXml(kCustCommands));
+    writeCloudConfig("b2", policyXml("<cmd name=\"x\"/><cmd id=\"abc\"/>"));
+    EXPECT_FALSE(load());
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "empty rawXmlDataMap!!"));
+    EXPECT_EQ(mLoader.conversions, 0);
+    EXPECT_EQ(LogCapture::countContaining("switch to velmora config file"), 0);
+}
+
+TEST_F(VelmoraLoadXmlTest, CloudPathTooLongForItsBufferFallsBack) {
+    writeCustConfig(policyXml(kCustCommands));
+    env().incremental = std::string(120, 'v');
+    ASSERT_TRUE(load());
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "get file path failed!"));
+    EXPECT_EQ(mLoader.chains.count(4400), 1u);
+}
+
+TEST_F(VelmoraLoadXmlTest, MissingCustomisationCopyFails) {
+    EXPECT_FALSE(load());
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
+                                "velmora_config_cust.xml is not exit or file is invalid!"));
+}
+
+TEST_F(VelmoraLoadXmlTest, BrokenCustomisationCopyFails) {
+    writeCustConfig("<policy><cmd id=\"1\"></policy>");
+    EXPECT_FALSE(load());
+    EXPECT_EQ(LogCapture::countContaining("LoadFile error, path:" + mTmpDir), 1);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "get velmora_config_cust.xml failed!,ret:2"));
+    EXPECT_EQ(mLoader.conversions, 0);
+}
+
+TEST_F(VelmoraLoadXmlTest, RecordsFollowTheDocument) {
+    writeCustConfig(policyXml(
+        "<cmd id=\"4116\" name=\"probe\"><act type=\"1\"><k1>8</k1><k2>100</k2></act></cmd>"
+        "<anything id=\"4400\"><a/></anything>"));
+    ASSERT_TRUE(load());
+    const auto& probe = mLoader.chains.at(4116);
+    ASSERT_EQ(probe.size(), 2u);
+    EXPECT_EQ(probe[0].type, 0);
+    EXPECT_EQ(probe[0].name, "probe");
+    EXPECT_TRUE(probe[0].names.empty());
+    EXPECT_EQ(probe[1].cmdId, 4116);
+    EXPECT_EQ(probe[1].type, 1);
+    EXPECT_EQ(probe[1].name, "probe");
+    EXPECT_EQ(probe[1].names, (std::vector<std::string>{"k1", "k2"}));
+    EXPECT_EQ(probe[1].values, (std::vector<std::string>{"8", "100"}));
+
+    // No name: "unknown" everywhere; an action without parameters is an empty record.
+    const auto& bare = mLoader.chains.at(4400);
+    ASSERT_EQ(bare.size(), 2u);
+    EXPECT_EQ(bare[0].name, "unknown");
+    EXPECT_EQ(bare[1].name, "unknown");
+    EXPECT_TRUE(bare[1].names.empty());
+    EXPECT_TRUE(bare[1].values.empty());
+}
+
+TEST_F(VelmoraLoadXmlTest, FirstDefinitionOfAnIdWins) {
+    writeCustConfig(policyXml(
+        "<cmd id=\"4400\" name=\"first\"><act><bad></bad></act></cmd>"
+        "<cmd id=\"4400\" name=\"second\"><act><k>1</k></act></cmd>"));
+    ASSERT_TRUE(load());
+    const auto& chain = mLoader.chains.at(4400);
+    ASSERT_EQ(chain.size(), 1u);  // the first had no usable action, and still wins
+    EXPECT_EQ(chain[0].name, "first");
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
+                                "multi-cmdId exist! we choose the first one, cmdId=4400"));
+}
+
+TEST_F(VelmoraLoadXmlTest, AtMostThreeActionsAndRejectedOnesCount) {
+    writeCustConfig(policyXml(
+        "<cmd id=\"4400\">"
+        "<a><v>1</v></a><a><v>2</v><empty/></a><a><v>3</v></a><a><v>4</v></a><a><v>5</v></a>"
+        "</cmd>"));
+    ASSERT_TRUE(load());
+    const auto& chain = mLoader.chains.at(4400);
+    ASSERT_EQ(chain.size(), 3u);
+    EXPECT_EQ(chain[1].values, std::vector<std::string>{"1"});
+    EXPECT_EQ(chain[2].values, std::vector<std::string>{"3"});
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "xml name or value is NULL!"));
+}
+
+TEST_F(VelmoraLoadXmlTest, IdsThatAreNotDecimalIntegersAreSkippedSilently) {
+    writeCustConfig(policyXml(
+        "<cmd id=\"0x10\"><a/></cmd><cmd id=\"abc\"><a/></cmd><cmd id=\"4400\"><a/></cmd>"));
+    ASSERT_TRUE(load());
+    EXPECT_EQ(mLoader.chains.size(), 1u);
+    EXPECT_EQ(mLoader.chains.count(4400), 1u);
+    EXPECT_EQ(LogCapture::countContaining("cmdId"), 0);
+}
+
+TEST_F(VelmoraLoadXmlTest, TypeThatIsNotAnIntegerReadsAsZero) {
+    writeCustConfig(policyXml("<cmd id=\"4400\"><a type=\"fast\"><k>1</k></a></cmd>"));
+    ASSERT_TRUE(load());
+    EXPECT_EQ(mLoader.chains.at(4400)[1].type, 0);
+}
+
+TEST_F(VelmoraLoadXmlTest, InnerLoadRejectsNullArguments) {
+    RawXmlDataMap map;
+    EXPECT_EQ(mLoader.innerLoad(nullptr, &map), 2);
+    EXPECT_EQ(mLoader.innerLoad("/nonexistent", nullptr), 2);
+    EXPECT_EQ(mLoader.innerLoad("/nonexistent/velmora.xml", &map), 2);
+}
+
+}  // namespace
+}  // namespace fake
+}  // namespace velmora
