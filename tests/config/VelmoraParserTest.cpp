@@ -1,0 +1,154 @@
+// The command parser: what a parse copies, and reloads swapping the configuration while other
+// threads parse.
+#include "config/VelmoraParser.h"
+
+#include <atomic>
+#include <thread>
+#include <vector>
+
+#include "platform/VelmoraPlat.h"
+#include "tests/fakes/ServerTest.h"
+
+namespace velmora {
+namespace fake {
+namespace {
+
+class VelmoraParserTest : public ::testing::Test {
+protected:
+    void SetUp() override {
+        LogCapture::start();
+        mParser.mActionMap = new ActionMap();
+    }
+
+    // Adds a chain head -> records for `cmdId`; returns the head.
+    Action* addChain(int cmdId, int records) {
+        auto* head = new Action();
+        head->mCmdId = cmdId;
+        Action* tail = head;
+        for (int i = 0; i < records; ++i) {
+            tail->mNext = new Action();
+            tail = tail->mNext;
+            tail->mCmdId = cmdId;
+            tail->mName = "rec" + std::to_string(i);
+            tail->mDuration = 10 * (i + 1);
+            tail->mParamNum = 1;
+            tail->mTagValues = {1, 1000 + i};
+            tail->mParams = {"k", "v" + std::to_string(i)};
+        }
+        (*mParser.mActionMap)[cmdId] = head;
+        return head;
+    }
+
+    VelmoraParser mParser;
+};
+
+TEST_F(VelmoraParserTest, CopiesTheRecordAfterTheHead) {
+    Action* head = addChain(4400, 2);
+    Action target;
+    EXPECT_EQ(mParser.doParseLocked(4400, &target), 0);
+    EXPECT_EQ(target.mCmdId, 4400);
+    EXPECT_EQ(target.mName, "rec0");
+    EXPECT_EQ(target.mDuration, 10);
+    EXPECT_EQ(target.mParamNum, 1);
+    EXPECT_EQ(target.mTagValues, (std::vector<int32_t>{1, 1000}));
+    EXPECT_EQ(target.mParams, (std::vector<std::string>{"k", "v0"}));
+    // The rest of the chain is borrowed from the parser, not copied.
+    EXPECT_EQ(target.mNext, head->mNext->mNext);
+}
+
+TEST_F(VelmoraParserTest, UnknownCommandLeavesTargetUntouched) {
+    addChain(4400, 1);
+    Action target;
+    target.mDuration = 77;
+    EXPECT_EQ(mParser.doParseLocked(4401, &target), 1);
+    EXPECT_EQ(target.mDuration, 77);
+    EXPECT_EQ(target.mCmdId, -1);
+}
+
+TEST_F(VelmoraParserTest, HeadOnlyChainParsesToNothing) {
+    addChain(4400, 0);
+    Action target;
+    EXPECT_EQ(mParser.doParseLocked(4400, &target), 0);
+    EXPECT_EQ(target.mDuration, -1);
+    EXPECT_EQ(target.mCmdId, -1);
+}
+
+TEST_F(VelmoraParserTest, MissingTargetOrMapIsAnError) {
+    EXPECT_EQ(mParser.doParseLocked(4400, nullptr), 2);
+    VelmoraParser empty;
+    Action target;
+    EXPECT_EQ(empty.doParseLocked(4400, &target), 2);
+    EXPECT_EQ(LogCapture::count(ANDROID_LOG_ERROR, "doParse failed, nullptr!"), 2);
+}
+
+class VelmoraParserReloadTest : public ServerTest {};
+
+TEST_F(VelmoraParserReloadTest, FailedReloadKeepsTheOldConfiguration) {
+    ASSERT_EQ(startServer("<cmd id=\"4400\"><a><duration>50</duration><t1>900</t1></a></cmd>"),
+              0);
+    writeCustConfig("<policy><broken></policy>");
+    EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "load xml map failed!"));
+
+    const int on = 0;
+    executor().clear();
+    EXPECT_EQ(mServer->velmoraEvent(4400, "", 1, &on), 0);
+    ASSERT_EQ(executor().calls(Op::DoAction).size(), 1u);
+    EXPECT_EQ(executor().calls(Op::DoAction)[0].duration, 50);
+}
+
+TEST_F(VelmoraParserReloadTest, ReloadReplacesCommands) {
+    ASSERT_EQ(startServer("<cmd id=\"4400\"><a><duration>50</duration></a></cmd>"), 0);
+    writeCustConfig(policyXml(std::string(kStartupCommands) +
+                              "<cmd id=\"4401\"><a><duration>60</duration></a></cmd>"));
+    EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
+    const int on = 0;
+    EXPECT_EQ(mServer->velmoraEvent(4400, "", 1, &on), 2);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doParse failed! cmdId=4400, errno=1"));
+    EXPECT_EQ(mServer->velmoraEvent(4401, "", 1, &on), 0);
+}
+
+TEST_F(VelmoraParserReloadTest, ReloadRacesWithParsesOnOtherThreads) {
+    const std::string commands = "<cmd id=\"4400\"><a><duration>50</duration><t1>900</t1></a></cmd>";
+    ASSERT_EQ(startServer(commands), 0);
+    std::atomic<bool> stop{false};
+    std::atomic<int> failures{0};
+    std::vector<std::thread> parsers;
+    for (int t = 0; t < 3; ++t) {
+        parsers.emplace_back([&] {
+            const int on = 0;
+            while (!stop.load()) {
+                if (mServer->velmoraEvent(4400, "", 1, &on) != 0) {
+                    ++failures;
+                }
+            }
+        });
+    }
+    for (int i = 0; i < 30; ++i) {
+        EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
+    }
+    stop = true;
+    for (auto& thread : parsers) {
+        thread.join();
+    }
+    EXPECT_EQ(failures.load(), 0);
+    for (const auto& call : executor().calls(Op::DoAction)) {
+        if (call.id == 4400) {
+            ASSERT_EQ(call.tagValues, (std::vector<int>{1, 900}));
+        }
+    }
+}
+
+TEST_F(VelmoraParserReloadTest, ReloadWithoutParserIsRefused) {
+    ASSERT_EQ(startServer(), 0);
+    VelmoraPlat* plat = mServer->mPlatPtr;
+    VelmoraParser* parser = plat->mParserPtr;
+    plat->mParserPtr = nullptr;
+    EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), -1);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "failed to update parser: mParserPtr is NULL!"));
+    plat->mParserPtr = parser;
+}
+
+}  // namespace
+}  // namespace fake
+}  // namespace velmora

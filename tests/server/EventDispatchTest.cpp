@@ -1,0 +1,248 @@
+// velmoraEvent: the door checks, which command ids go where, launch policies, notifications
+// and on/off actions, observed at the platform and in the log.
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <string>
+
+#include "platform/VelmoraPlat.h"
+#include "tests/fakes/ServerTest.h"
+
+namespace velmora {
+namespace fake {
+namespace {
+
+const int kOn = 0;
+const int kOff = -1;
+
+const char* const kDispatchCommands =
+    "<cmd id=\"4353\" name=\"after_scenes\"><a><duration>30</duration><t1>800</t1></a></cmd>"
+    "<cmd id=\"12287\" name=\"before_onoff\"><a><duration>40</duration><t1>700</t1></a></cmd>"
+    "<cmd id=\"13569\" name=\"after_onoff\"><a><duration>45</duration><t1>600</t1></a></cmd>"
+    "<cmd id=\"12288\" name=\"onoff_platform\"><a><duration>0</duration><t10>5</t10></a></cmd>"
+    "<cmd id=\"13568\" name=\"onoff_mixed\"><a><duration>0</duration><t10>5</t10><t22>0</t22>"
+    "</a></cmd>"
+    "<cmd id=\"12300\" name=\"onoff_timed\"><a><duration>20</duration><t2>900</t2></a></cmd>"
+    "<cmd id=\"12301\" name=\"onoff_empty\"><a><duration>0</duration></a></cmd>"
+    "<cmd id=\"4099\" name=\"cold\"><a><duration>500</duration><t4>2000</t4></a></cmd>"
+    "<cmd id=\"4098\" name=\"winswitch\"><a><duration>300</duration><t4>1800</t4></a></cmd>"
+    "<cmd id=\"4401\" name=\"disabled\"><a><duration>-1</duration><t1>1</t1></a></cmd>"
+    "<cmd id=\"4402\" name=\"head_only\"></cmd>"
+    "<cmd id=\"-7\" name=\"negative\"><a><duration>10</duration></a></cmd>";
+
+class EventDispatchTest : public ServerTest {
+protected:
+    void SetUp() override {
+        ServerTest::SetUp();
+        ASSERT_EQ(startServer(kDispatchCommands), 0);
+        executor().clear();
+        LogCapture::clear();
+    }
+
+    std::vector<ExecutorCall> actions() { return executor().calls(Op::DoAction); }
+};
+
+TEST_F(EventDispatchTest, NotInitialisedServerAnswersOne) {
+    VelmoraServer server;
+    EXPECT_EQ(server.velmoraEvent(4353, "", 1, &kOn), 1);
+    EXPECT_EQ(server.velmoraEvent(20230, "", 0, nullptr), 1);
+}
+
+TEST_F(EventDispatchTest, TimedActionReachesThePlatformWithTheHostPayload) {
+    const int payload[2] = {0, 99};
+    EXPECT_EQ(mServer->velmoraEvent(4353, "", 2, payload), 0);
+    const std::vector<ExecutorCall> calls = actions();
+    ASSERT_EQ(calls.size(), 1u);
+    const ExecutorCall& call = calls[0];
+    EXPECT_EQ(call.id, 4353);
+    EXPECT_EQ(call.name, "after_scenes");
+    EXPECT_EQ(call.duration, 30);
+    EXPECT_EQ(call.tagValues, (std::vector<int>{1, 800}));
+    EXPECT_EQ(call.payload, (std::vector<int>{0, 99}));
+}
+
+TEST_F(EventDispatchTest, ClassBoundaries) {
+    // 4352 is the last special scene: it has no priority, so it is refused as a scene.
+    EXPECT_EQ(mServer->velmoraEvent(4352, "", 1, &kOn), 2);  // and it is not configured
+    EXPECT_EQ(mServer->velmoraEvent(4353, "", 1, &kOn), 0);
+    EXPECT_EQ(mServer->velmoraEvent(12287, "", 1, &kOn), 0);
+    EXPECT_EQ(mServer->velmoraEvent(13569, "", 1, &kOn), 0);
+    ASSERT_EQ(actions().size(), 3u);
+    EXPECT_EQ(actions()[1].payload, std::vector<int>{0});
+
+    // 12288 and 13568 are on/off actions: a bad payload is refused before the platform.
+    const int bad = 3;
+    EXPECT_EQ(mServer->velmoraEvent(12288, "", 1, &bad), -1);
+    EXPECT_EQ(mServer->velmoraEvent(13568, "", 1, &bad), -1);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene parameters, cmdId is 12288"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene parameters, cmdId is 13568"));
+    EXPECT_EQ(actions().size(), 3u);
+}
+
+TEST_F(EventDispatchTest, IdsFrom20224UpAreNotParsed) {
+    EXPECT_EQ(mServer->velmoraEvent(20300, "", 1, &kOn), 0);
+    EXPECT_EQ(mServer->velmoraEvent(20226, "", 1, &kOn), 0);
+    EXPECT_EQ(LogCapture::countContaining("doParse"), 0);
+    EXPECT_TRUE(executor().calls().empty());
+}
+
+TEST_F(EventDispatchTest, NegativeIdsAreParsedLikeAnyCommand) {
+    EXPECT_EQ(mServer->velmoraEvent(-8, "", 1, &kOn), 2);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doParse failed! cmdId=-8, errno=1"));
+    EXPECT_EQ(mServer->velmoraEvent(-7, "", 1, &kOn), 0);
+    EXPECT_EQ(actions().size(), 1u);
+}
+
+TEST_F(EventDispatchTest, DisabledAndHeadOnlyCommandsDoNothing) {
+    EXPECT_EQ(mServer->velmoraEvent(4401, "", 1, &kOn), 0);
+    EXPECT_EQ(mServer->velmoraEvent(4402, "", 1, &kOn), 0);
+    EXPECT_TRUE(executor().calls().empty());
+}
+
+TEST_F(EventDispatchTest, PlatformFailureIsStatusThree) {
+    executor().setResult(Op::DoAction, 9);
+    EXPECT_EQ(mServer->velmoraEvent(4353, "", 1, &kOn), 3);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4353"));
+}
+
+TEST_F(EventDispatchTest, MissingExecutorIsStatusThree) {
+    mServer->mPlatPtr->mExecutorPtr = nullptr;
+    EXPECT_EQ(mServer->velmoraEvent(4353, "", 1, &kOn), 3);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4353"));
+    EXPECT_EQ(mServer->velmoraEvent(12288, "", 1, &kOn), -1);
+}
+
+TEST_F(EventDispatchTest, DebugLogTracesEntryPoints) {
+    const int devNull = open("/dev/null", O_WRONLY);
+    EXPECT_EQ(mServer->velmoraEvent(4353, "", 1, &kOn), 0);
+    EXPECT_EQ(LogCapture::countContaining("velmoraEvent cmdId="), 0);
+    mServer->dumpVelmoraServerInfo(devNull, {"--logon"});
+    EXPECT_EQ(mServer->velmoraEvent(4353, "", 1, &kOn), 0);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO, "velmoraEvent cmdId=4353, payload=0"));
+    EXPECT_EQ(mServer->velmoraEvent(20300, "", 0, nullptr), 0);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO, "velmoraEvent cmdId=20300"));
+    mServer->dumpVelmoraServerInfo(devNull, {"--logoff"});
+    EXPECT_FALSE(mServer->mDebugLog);
+    close(devNull);
+}
+
+// Launch policies replace the duration of cold starts and window switches once the
+// notification word enables them.
+class LaunchPolicyTest : public EventDispatchTest {
+protected:
+    void enablePolicies() {
+        const int word = 0x40000;
+        mServer->velmoraEvent(20225, "", 1, &word);
+        executor().clear();
+    }
+};
+
+TEST_F(LaunchPolicyTest, PolicyAnswerReplacesTheDuration) {
+    enablePolicies();
+    env().setPolicy("cold", 80);
+    env().setPolicy("winswitch", 40);
+    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOn), 0);
+    EXPECT_EQ(mServer->velmoraEvent(4098, "", 1, &kOn), 0);
+    ASSERT_EQ(actions().size(), 2u);
+    EXPECT_EQ(actions()[0].duration, 80);
+    EXPECT_EQ(actions()[1].duration, 40);
+}
+
+TEST_F(LaunchPolicyTest, NoPolicyKeepsTheConfiguredDuration) {
+    enablePolicies();
+    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOn), 0);
+    ASSERT_EQ(actions().size(), 1u);
+    EXPECT_EQ(actions()[0].duration, 500);
+}
+
+TEST_F(LaunchPolicyTest, NegativePolicyDisablesTheEvent) {
+    enablePolicies();
+    env().setPolicy("cold", -5);
+    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOn), 0);
+    EXPECT_TRUE(actions().empty());
+}
+
+TEST_F(LaunchPolicyTest, OnlyAnOnPayloadConsultsThePolicyServer) {
+    enablePolicies();
+    env().setPolicy("cold", 80);
+    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOff), 0);
+    EXPECT_EQ(env().policyQueries(), 0);
+    EXPECT_EQ(actions()[0].duration, 500);
+}
+
+TEST_F(LaunchPolicyTest, PoliciesAreOffUntilTheNotificationEnablesThem) {
+    env().setPolicy("cold", 80);
+    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOn), 0);
+    EXPECT_EQ(actions()[0].duration, 500);
+    EXPECT_EQ(env().policyQueries(), 0);
+
+    enablePolicies();
+    const int word = 0;
+    mServer->velmoraEvent(20225, "", 1, &word);  // bit 18 cleared again
+    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOn), 0);
+    EXPECT_EQ(env().policyQueries(), 0);
+}
+
+TEST_F(EventDispatchTest, NotificationWithWrongPayloadChangesNothing) {
+    const int words[2] = {0x40000, 0};
+    EXPECT_EQ(mServer->velmoraEvent(20225, "", 2, words), 0);
+    EXPECT_EQ(mServer->velmoraEvent(20225, "", 1, nullptr), 0);
+    EXPECT_FALSE(mServer->mPolicyEnabled);
+    EXPECT_EQ(mServer->velmoraEvent(20225, "", 1, words), 0);
+    EXPECT_TRUE(mServer->mPolicyEnabled);
+}
+
+// On/off commands: pairs with tag 10 belong to the platform, the others to the frequency
+// manager.
+TEST_F(EventDispatchTest, OnOffWithOnlyPlatformPairsGoesToTheExecutorAlone) {
+    EXPECT_EQ(mServer->velmoraEvent(12288, "", 1, &kOn), 0);
+    EXPECT_EQ(mServer->velmoraEvent(12288, "", 1, &kOff), 0);
+    ASSERT_EQ(actions().size(), 2u);
+    EXPECT_EQ(actions()[0].payload, std::vector<int>{0});
+    EXPECT_EQ(actions()[1].payload, std::vector<int>{-1});
+    EXPECT_TRUE(executor().calls(Op::SetConfig).empty());
+}
+
+TEST_F(EventDispatchTest, OnOffPairBelowOneIsRefused) {
+    EXPECT_EQ(mServer->velmoraEvent(13568, "", 1, &kOn), -1);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid parameters, cmdId is 13568"));
+    EXPECT_TRUE(executor().calls().empty());
+}
+
+TEST_F(EventDispatchTest, OnOffWithPositiveDurationIsATimedPlatformAction) {
+    EXPECT_EQ(mServer->velmoraEvent(12300, "", 1, &kOn), 0);
+    ASSERT_EQ(actions().size(), 1u);
+    EXPECT_EQ(actions()[0].duration, 20);
+    EXPECT_TRUE(executor().calls(Op::SetConfig).empty());
+}
+
+TEST_F(EventDispatchTest, OnOffWithoutPairsDoesNothing) {
+    EXPECT_EQ(mServer->velmoraEvent(12301, "", 1, &kOn), 0);
+    EXPECT_TRUE(executor().calls().empty());
+}
+
+TEST_F(EventDispatchTest, OnOffPayloadRules) {
+    const int two[2] = {0, 0};
+    EXPECT_EQ(mServer->velmoraEvent(12288, "", 2, two), -1);
+    EXPECT_EQ(mServer->velmoraEvent(12288, "", 1, nullptr), -1);
+    EXPECT_TRUE(executor().calls().empty());
+}
+
+class OnOffLimitTest : public ServerTest {};
+
+TEST_F(OnOffLimitTest, MoreFrequencyPairsThanTheManagerTakesAreRefused) {
+    std::string pairs;
+    for (int i = 0; i < 44; ++i) {
+        pairs += "<t2>" + std::to_string(1000000 + i) + "</t2>";
+    }
+    ASSERT_EQ(startServer("<cmd id=\"12400\"><a><duration>0</duration>" + pairs + "</a></cmd>"), 0);
+    executor().clear();
+    EXPECT_EQ(mServer->velmoraEvent(12400, "", 1, &kOn), -1);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
+                                "on/off command 12400 has more than 43 frequency pairs, rejected"));
+    EXPECT_TRUE(executor().calls().empty());
+}
+
+}  // namespace
+}  // namespace fake
+}  // namespace velmora
