@@ -28,7 +28,7 @@ int VelmoraServer::doMemlatencyEvent(int cmdId, const char* msg, unsigned int pa
         VLOGE("payload is invalid! cmdId=%d", cmdId);
         return 3;
     }
-    PerfExecutor* executor = mPlatPtr->mExecutorPtr;
+    PerfExecutor* executor = mPlatPtr != nullptr ? mPlatPtr->mExecutorPtr : nullptr;
 
     if (cmdId == kCmdMemLatency) {
         Action action;

@@ -41,7 +41,7 @@ void VelmoraServer::initExistingPriority() {
 }
 
 int VelmoraServer::getPriority(Action* action) {
-    if (action->mParamNum < 1) {
+    if (action == nullptr || action->mParamNum < 1) {
         return 0;
     }
     int prio = 0;
@@ -55,7 +55,7 @@ int VelmoraServer::getPriority(Action* action) {
 }
 
 int VelmoraServer::getInterPriority(Action* action) {
-    if (action->mParamNum < 1) {
+    if (action == nullptr || action->mParamNum < 1) {
         return 0;
     }
     int prio = 0;

@@ -1,0 +1,281 @@
+// Special-scene priorities: built-in values, configured values that override them, the ranges
+// that are read, the rebuild on reload, and the selection rules with their tie-breaks.
+#include <map>
+#include <ostream>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "config/Action.h"
+#include "tests/fakes/ServerTest.h"
+
+namespace velmora {
+namespace fake {
+namespace {
+
+constexpr int kOn = 0;
+constexpr int kOff = -1;
+
+std::string scene(int cmdId, const std::string& body = "") {
+    return "<cmd id=\"" + std::to_string(cmdId) + "\" name=\"scene_" + std::to_string(cmdId) +
+           "\"><act><duration>0</duration>" + body + "</act></cmd>";
+}
+
+const std::string kBuiltinScenes = scene(4118) + scene(4119) + scene(4120) + scene(4121);
+
+using PriorityMap = std::map<int32_t, int32_t>;
+const PriorityMap kBuiltins = {{4118, 100}, {4119, 200}, {4120, 20}, {4121, 70}};
+
+class ServerPriorityTest : public ServerTest {
+protected:
+    void start(const std::string& extra) {
+        ASSERT_EQ(startServer(extra), 0);
+        executor().clear();
+        LogCapture::clear();
+    }
+    int on(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOn); }
+    int off(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOff); }
+    int reload(const std::string& extra) {
+        writeCustConfig(policyXml(std::string(kStartupCommands) + extra));
+        return mServer->velmoraEvent(20230, "", 0, nullptr);
+    }
+    PriorityMap priorities() {
+        VelmoraServer* s = mServer.get();
+        android::Mutex::Autolock lock(s->mMutex);
+        return s->mPriorityMap;
+    }
+    // (cmdId, payload) of every doAction since the last call.
+    std::vector<std::pair<int, int>> steps() {
+        std::vector<std::pair<int, int>> out;
+        for (const ExecutorCall& c : executor().calls(Op::DoAction)) {
+            out.emplace_back(c.id, c.payload.size() == 1 ? c.payload[0] : 999);
+        }
+        executor().clear();
+        return out;
+    }
+};
+
+using StepList = std::vector<std::pair<int, int>>;
+
+TEST_F(ServerPriorityTest, WithoutConfiguredPrioritiesOnlyTheBuiltinsExist) {
+    start(kBuiltinScenes + scene(4122) + scene(4300));
+    EXPECT_EQ(priorities(), kBuiltins);
+    // The built-in order: 4119 over 4118 over 4121 over 4120.
+    ASSERT_EQ(on(4120), 0);
+    ASSERT_EQ(on(4121), 0);
+    ASSERT_EQ(on(4118), 0);
+    ASSERT_EQ(on(4119), 0);
+    EXPECT_EQ(steps(), StepList({{4120, kOn},
+                                 {4120, kOff},
+                                 {4121, kOn},
+                                 {4121, kOff},
+                                 {4118, kOn},
+                                 {4118, kOff},
+                                 {4119, kOn}}));
+    EXPECT_EQ(on(4122), -1);
+    EXPECT_EQ(on(4300), -1);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4122"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4300"));
+}
+
+// One configured scene per row: the priority it ends up with (0: none, the scene is refused).
+struct PriorityRow {
+    const char* what;
+    int cmdId;
+    std::string body;
+    int expected;
+};
+
+std::ostream& operator<<(std::ostream& os, const PriorityRow& r) { return os << r.what; }
+
+class ServerPriorityRowTest : public ServerPriorityTest,
+                              public ::testing::WithParamInterface<PriorityRow> {};
+
+TEST_P(ServerPriorityRowTest, ConfiguredPriorityDecidesWhetherTheSceneRuns) {
+    const PriorityRow& row = GetParam();
+    start(scene(row.cmdId, row.body));
+    const PriorityMap map = priorities();
+    const auto it = map.find(row.cmdId);
+    EXPECT_EQ(it == map.end() ? 0 : it->second, row.expected);
+
+    if (row.expected > 0) {
+        EXPECT_EQ(on(row.cmdId), 0);
+        EXPECT_EQ(steps(), StepList({{row.cmdId, kOn}}));
+    } else {
+        EXPECT_EQ(on(row.cmdId), -1);
+        EXPECT_TRUE(LogCapture::has(
+            ANDROID_LOG_ERROR,
+            "invalid special scene priority, cmdId is " + std::to_string(row.cmdId)));
+        EXPECT_EQ(steps(), StepList());
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Rows, ServerPriorityRowTest,
+    ::testing::Values(
+        // Tag 101 overrides a built-in when it lies in 1..500; otherwise the built-in stays.
+        PriorityRow{"builtin_overridden", 4118, "<t1>5</t1><t101>150</t101>", 150},
+        PriorityRow{"upper_bound", 4118, "<t101>500</t101>", 500},
+        PriorityRow{"lower_bound", 4120, "<t101>1</t101>", 1},
+        PriorityRow{"above_range_keeps_builtin", 4118, "<t101>600</t101>", 100},
+        PriorityRow{"just_above_range_keeps_builtin", 4121, "<t101>501</t101>", 70},
+        PriorityRow{"zero_keeps_builtin", 4118, "<t101>0</t101>", 100},
+        PriorityRow{"negative_keeps_builtin", 4119, "<t101>-5</t101>", 200},
+        // Several tag-101 pairs: the last one wins, even when it is out of range.
+        PriorityRow{"last_tag_wins", 4118, "<t101>30</t101><t2>1</t2><t101>40</t101>", 40},
+        PriorityRow{"invalid_last_tag_wins", 4118, "<t101>150</t101><t101>600</t101>", 100},
+        // Ordinary scenes read integer pairs only.
+        PriorityRow{"ordinary_scene_configured", 4200, "<t101>90</t101>", 90},
+        PriorityRow{"ordinary_scene_string_pair_ignored", 4223, "<s_priority>90</s_priority>", 0},
+        PriorityRow{"ordinary_scene_without_pairs", 4200, "", 0},
+        // Governor scenes read the string pair "priority" only, the last one winning.
+        PriorityRow{"governor_last_string_wins", 4300,
+                    "<s_priority>30</s_priority><s_priority>40</s_priority><t101>300</t101>", 40},
+        PriorityRow{"governor_first_id", 4224, "<s_priority>10</s_priority>", 10},
+        PriorityRow{"governor_last_id_read", 4351, "<s_priority>60</s_priority>", 60},
+        PriorityRow{"governor_tag_101_ignored", 4224, "<t101>10</t101>", 0},
+        PriorityRow{"governor_out_of_range", 4300, "<s_priority>501</s_priority>", 0},
+        PriorityRow{"governor_not_a_number", 4300, "<s_priority>high</s_priority>", 0},
+        PriorityRow{"governor_number_prefix", 4300, "<s_priority>45ms</s_priority>", 45},
+        PriorityRow{"governor_key_must_match_exactly", 4300,
+                    "<s_priority2>40</s_priority2><s_Priority>40</s_Priority>", 0},
+        // The table is read up to 4351: scene 4352 never gets a configured priority.
+        PriorityRow{"scene_4352_never_configured", 4352, "<s_priority>60</s_priority>", 0}),
+    [](const ::testing::TestParamInfo<PriorityRow>& info) { return std::string(info.param.what); });
+
+TEST_F(ServerPriorityTest, EqualPrioritiesGoToTheSmallerCmdId) {
+    start(scene(4118) + scene(4119) + scene(4121, "<t101>100</t101>"));
+    ASSERT_EQ(on(4119), 0);
+    ASSERT_EQ(on(4121), 0);
+    ASSERT_EQ(on(4118), 0);
+    steps();
+    EXPECT_EQ(off(4119), 0);
+    EXPECT_EQ(steps(), StepList({{4119, kOff}, {4118, kOn}}));
+    // An equal priority never takes over the current scene.
+    EXPECT_EQ(off(4118), 0);
+    EXPECT_EQ(steps(), StepList({{4118, kOff}, {4121, kOn}}));
+    EXPECT_EQ(on(4118), 0);
+    EXPECT_EQ(steps(), StepList());
+}
+
+TEST_F(ServerPriorityTest, ReloadRebuildsTheTableFromScratch) {
+    start(scene(4118, "<t101>150</t101>") + scene(4119) + scene(4120) + scene(4121) +
+          scene(4130, "<t101>300</t101>") + scene(4131) + scene(4300, "<s_priority>40</s_priority>"));
+    ASSERT_EQ(priorities().at(4118), 150);
+    ASSERT_EQ(priorities().at(4300), 40);
+    ASSERT_EQ(on(4118), 0);
+    ASSERT_EQ(on(4131), -1);  // leaves a 0 entry behind
+    ASSERT_EQ(priorities().count(4131), 1u);
+
+    ASSERT_EQ(reload(kBuiltinScenes + scene(4130, "<t101>60</t101>") + scene(4131) +
+                     scene(4122, "<t101>90</t101>") + scene(4300)),
+              0);
+    PriorityMap expected = kBuiltins;
+    expected[4130] = 60;
+    expected[4122] = 90;
+    EXPECT_EQ(priorities(), expected);
+
+    // The scene state survives: 4118 stays current and now outranks 4130.
+    steps();
+    EXPECT_EQ(on(4130), 0);
+    EXPECT_EQ(steps(), StepList());
+    EXPECT_EQ(on(4300), -1);
+    EXPECT_EQ(off(4118), 0);
+    EXPECT_EQ(steps(), StepList({{4118, kOff}, {4130, kOn}}));
+}
+
+TEST_F(ServerPriorityTest, FailedReloadKeepsThePriorities) {
+    start(kBuiltinScenes + scene(4130, "<t101>300</t101>"));
+    const PriorityMap before = priorities();
+    writeCustConfig(policyXml("<cmd name=\"no id\"><act><duration>1</duration></act></cmd>"));
+    EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "load xml map failed!"));
+    EXPECT_EQ(priorities(), before);
+    EXPECT_EQ(on(4130), 0);
+    EXPECT_EQ(steps(), StepList({{4130, kOn}}));
+}
+
+TEST_F(ServerPriorityTest, PriorityReadersTakeTheLastMatchingPair) {
+    VelmoraServer server;
+    Action plain;
+    plain.mParamNum = 3;
+    plain.mTagValues = {101, 30, 7, 8, 101, 45};
+    EXPECT_EQ(server.getPriority(&plain), 45);
+    plain.mParamNum = 2;  // only the first two pairs count
+    EXPECT_EQ(server.getPriority(&plain), 30);
+    plain.mParamNum = 0;
+    EXPECT_EQ(server.getPriority(&plain), 0);
+
+    Action gov(4300, "", 0, 3, {"priority", "30", "prio", "99", "priority", "44"});
+    EXPECT_EQ(server.getInterPriority(&gov), 44);
+    EXPECT_EQ(server.getPriority(&gov), 0);
+    Action noKey(4300, "", 0, 1, {"priority ", "30"});
+    EXPECT_EQ(server.getInterPriority(&noKey), 0);
+}
+
+TEST_F(ServerPriorityTest, DecisionCodesOfOnAndOffEvents) {
+    VelmoraServer server;
+    VelmoraServer* s = &server;
+    android::Mutex::Autolock lock(s->mMutex);
+    // 0: apply alone; 1: does not outrank; 3: withdraw the previous one first.
+    EXPECT_EQ(s->doOnEvent(4118, 100, 0), 0);
+    s->mCurSpecialCmdId = 4118;
+    EXPECT_EQ(s->doOnEvent(4120, 20, 100), 1);
+    EXPECT_EQ(s->doOnEvent(4121, 100, 100), 1);
+    EXPECT_EQ(s->doOnEvent(4119, 200, 100), 3);
+    s->mCurSpecialCmdId = 4119;
+    EXPECT_EQ(s->mOnEventSet, std::set<int32_t>({4118, 4119, 4120, 4121}));
+
+    int next = -5;
+    int flag = -5;
+    // 2: the ended scene was not applied.
+    EXPECT_EQ(s->doOffEvent(4120, &next, &flag), 2);
+    EXPECT_EQ(next, -5);
+    // 3: the best remaining scene follows.
+    EXPECT_EQ(s->doOffEvent(4119, &next, &flag), 3);
+    EXPECT_EQ(next, 4118);
+    EXPECT_EQ(flag, 0);
+    EXPECT_EQ(s->mCurSpecialCmdId, 4118);
+    EXPECT_EQ(s->doOffEvent(4121, &next, &flag), 2);
+    // 0: nothing left, the ended scene is reported back.
+    flag = -5;
+    EXPECT_EQ(s->doOffEvent(4118, &next, &flag), 0);
+    EXPECT_EQ(next, 4118);
+    EXPECT_EQ(flag, -5);
+    EXPECT_EQ(s->mCurSpecialCmdId, 0);
+    EXPECT_TRUE(s->mOnEventSet.empty());
+}
+
+TEST_F(ServerPriorityTest, GovernorSelection) {
+    VelmoraServer server;
+    VelmoraServer* s = &server;
+    android::Mutex::Autolock lock(s->mMutex);
+    s->mPriorityMap[4230] = 50;
+    s->mPriorityMap[4240] = 50;
+    s->mPriorityMap[4250] = 80;
+    s->mOnEventSet = {4118, 4119, 4230, 4240};
+    s->mCurSpecialCmdId = 4118;
+    // Only under scene 4119, and only for governor scenes.
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 0);
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOffEvent(), 0);
+    s->mCurSpecialCmdId = 4119;
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4121), 0);
+    // A tie goes to the new scene when switching on, to the smaller cmdId otherwise.
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 4240);
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOffEvent(), 4230);
+    s->mOnEventSet.insert(4250);
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 4250);
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOffEvent(), 4250);
+    EXPECT_EQ(s->getCmdIdWithMaxPrio(false), 4119);
+    // A scene without priority still beats an empty choice.
+    s->mOnEventSet = {4300};
+    EXPECT_EQ(s->getCmdIdWithMaxPrio(true), 4300);
+    s->mOnEventSet = {4118};
+    EXPECT_EQ(s->getCmdIdWithMaxPrio(true), 0);
+    s->mOnEventSet.clear();
+    EXPECT_EQ(s->getCmdIdWithMaxPrio(false), 0);
+}
+
+}  // namespace
+}  // namespace fake
+}  // namespace velmora
