@@ -1,0 +1,37 @@
+// The device event log of the host: every line the library reports (frequency-limit periods)
+// is kept in memory, appended to a file when one is set, and marked on the timeline.
+// Thread safe.
+#pragma once
+
+#include <mutex>
+#include <string>
+#include <vector>
+
+#include "host/HostClock.h"
+#include "host/Timeline.h"
+
+namespace velmora {
+
+class EventLog {
+public:
+    EventLog(HostClock& clock, Timeline& timeline);
+
+    // Appends later lines to `path` ("" for none); truncates the file. False when it cannot
+    // be opened.
+    bool setPath(const std::string& path);
+    std::string path() const;
+    void clear();
+
+    // Records one line with its priority and event tag.
+    void write(int prio, int tag, const std::string& text);
+    std::vector<std::string> lines() const;
+
+private:
+    HostClock& mClock;
+    Timeline& mTimeline;
+    mutable std::mutex mLock;  // guards both members and the file
+    std::string mPath;
+    std::vector<std::string> mLines;
+};
+
+}  // namespace velmora

@@ -1,0 +1,58 @@
+// The node map: which file under the device root stands for which logical node, how requests
+// for the node combine, and which value a fresh simulated device starts with.
+//
+// Built with defaults that follow the usual Linux layout (cpufreq policies, devfreq, thermal
+// zones, cgroup schedtune groups); a small text file can override paths and seed values:
+//
+//     # key                 path (relative to the device root)                  [seed]
+//     cpu.big.max           sys/devices/system/cpu/cpufreq/policy6/scaling_max_freq
+//
+// Also maps the integer tags of actions and requests to nodes. Not thread safe: configure it
+// before the platform is created, then only read it.
+#pragma once
+
+#include <map>
+#include <string>
+#include <vector>
+
+namespace velmora {
+
+enum class NodeKind {
+    Floor,  // the largest request wins; never below the node's initial value
+    Cap,    // the smallest request wins; never above the node's initial value
+    Value,  // the latest request wins; the initial value when none is left
+    Text,   // like Value, for text nodes (governors)
+};
+
+struct NodeSpec {
+    std::string key;   // logical name, e.g. "cpu.little.max"
+    std::string path;  // relative to the device root
+    NodeKind kind;
+    std::string seed;  // value of a fresh simulated device
+};
+
+class NodeMap {
+public:
+    NodeMap();  // the defaults
+
+    const std::vector<NodeSpec>& nodes() const { return mNodes; }
+    // Null when `key` is not a node.
+    const NodeSpec* find(const std::string& key) const;
+    // Node of an integer tag (1 little min ... 58 background group), or "" when the tag has none.
+    std::string keyForTag(int tag) const;
+
+    // Applies override lines from `text`; `origin` names the source in `error` ("file:line:
+    // message"). Returns 0, or -1 at the first bad line (earlier lines stay applied).
+    int parse(const std::string& text, const std::string& origin, std::string* error);
+    // parse() on the contents of the file at `path`.
+    int load(const std::string& path, std::string* error);
+
+private:
+    void add(const std::string& key, const std::string& path, NodeKind kind,
+             const std::string& seed);
+
+    std::vector<NodeSpec> mNodes;
+    std::map<int, std::string> mTagKeys;
+};
+
+}  // namespace velmora

@@ -1,0 +1,202 @@
+#include "host/Timeline.h"
+
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+
+namespace velmora {
+
+namespace {
+
+constexpr int kNodePid = 1;
+constexpr int kEventPid = 2;
+
+std::string jsonEscape(const std::string& in) {
+    std::string out;
+    out.reserve(in.size() + 2);
+    for (char c : in) {
+        switch (c) {
+            case '"': out += "\\\""; break;
+            case '\\': out += "\\\\"; break;
+            case '\n': out += "\\n"; break;
+            case '\r': out += "\\r"; break;
+            case '\t': out += "\\t"; break;
+            default:
+                if (static_cast<unsigned char>(c) < 0x20) {
+                    char buf[8];
+                    snprintf(buf, sizeof(buf), "\\u%04x", static_cast<unsigned char>(c));
+                    out += buf;
+                } else {
+                    out += c;
+                }
+        }
+    }
+    return out;
+}
+
+std::string formatNumber(double v) {
+    char buf[64];
+    snprintf(buf, sizeof(buf), "%.17g", v);
+    return buf;
+}
+
+}  // namespace
+
+bool parseNodeNumber(const std::string& text, double* value) {
+    size_t begin = text.find_first_not_of(" \t\n");
+    size_t end = text.find_last_not_of(" \t\n");
+    if (begin == std::string::npos) {
+        return false;
+    }
+    const std::string trimmed = text.substr(begin, end - begin + 1);
+    char* stop = nullptr;
+    const double v = strtod(trimmed.c_str(), &stop);
+    if (stop == trimmed.c_str() || *stop != '\0') {
+        return false;
+    }
+    *value = v;
+    return true;
+}
+
+Timeline::Timeline(HostClock& clock) : mClock(clock) {}
+
+void Timeline::clear() {
+    std::lock_guard<std::mutex> lock(mLock);
+    mTracks.clear();
+    mInstants.clear();
+}
+
+Timeline::Track* Timeline::findTrack(const std::string& key) {
+    for (auto& track : mTracks) {
+        if (track.key == key) {
+            return &track;
+        }
+    }
+    return nullptr;
+}
+
+void Timeline::recordInitial(const std::string& key, const std::string& path,
+                             const std::string& text) {
+    const int64_t now = mClock.nowUs();
+    std::lock_guard<std::mutex> lock(mLock);
+    if (findTrack(key) == nullptr) {
+        mTracks.push_back({key, path, {{now, text}}});
+    }
+}
+
+void Timeline::recordWrite(const std::string& key, const std::string& path,
+                           const std::string& text) {
+    const int64_t now = mClock.nowUs();
+    std::lock_guard<std::mutex> lock(mLock);
+    Track* track = findTrack(key);
+    if (track == nullptr) {
+        // A write to a node nobody read first: its initial value is unknown, keep the write.
+        mTracks.push_back({key, path, {{now, text}}});
+        return;
+    }
+    track->samples.push_back({now, text});
+}
+
+void Timeline::recordInstant(const std::string& category, const std::string& name) {
+    const int64_t now = mClock.nowUs();
+    std::lock_guard<std::mutex> lock(mLock);
+    mInstants.push_back({now, category, name});
+}
+
+std::vector<Timeline::NodeSummary> Timeline::summary() const {
+    std::lock_guard<std::mutex> lock(mLock);
+    std::vector<NodeSummary> out;
+    for (const auto& track : mTracks) {
+        NodeSummary s;
+        s.key = track.key;
+        s.path = track.path;
+        s.initial = track.samples.front().text;
+        s.final = track.samples.back().text;
+        s.changes = static_cast<int>(track.samples.size()) - 1;
+        bool first = true;
+        for (const auto& sample : track.samples) {
+            double v = 0;
+            if (!parseNodeNumber(sample.text, &v)) {
+                s.numeric = false;
+                continue;
+            }
+            if (first || v < s.min) s.min = v;
+            if (first || v > s.max) s.max = v;
+            first = false;
+        }
+        out.push_back(s);
+    }
+    return out;
+}
+
+std::vector<Timeline::Instant> Timeline::instants(const std::string& category) const {
+    std::lock_guard<std::mutex> lock(mLock);
+    std::vector<Instant> out;
+    for (const auto& instant : mInstants) {
+        if (instant.category == category) {
+            out.push_back(instant);
+        }
+    }
+    return out;
+}
+
+int Timeline::changes(const std::string& key) const {
+    std::lock_guard<std::mutex> lock(mLock);
+    for (const auto& track : mTracks) {
+        if (track.key == key) {
+            return static_cast<int>(track.samples.size()) - 1;
+        }
+    }
+    return 0;
+}
+
+std::string Timeline::chromeJson() const {
+    std::lock_guard<std::mutex> lock(mLock);
+    std::string out = "{\"displayTimeUnit\":\"ms\",\"traceEvents\":[\n";
+    out += "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":1,\"tid\":0,"
+           "\"args\":{\"name\":\"device nodes\"}},\n";
+    out += "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":2,\"tid\":0,"
+           "\"args\":{\"name\":\"events\"}}";
+    for (const auto& track : mTracks) {
+        for (const auto& sample : track.samples) {
+            double v = 0;
+            out += ",\n";
+            if (parseNodeNumber(sample.text, &v)) {
+                out += "{\"name\":\"" + jsonEscape(track.key) + "\",\"ph\":\"C\",\"ts\":" +
+                       std::to_string(sample.us) + ",\"pid\":" + std::to_string(kNodePid) +
+                       ",\"tid\":0,\"args\":{\"value\":" + formatNumber(v) + "}}";
+            } else {
+                // Text nodes (governors) have no counter value: an instant on the node track.
+                out += "{\"name\":\"" + jsonEscape(track.key + "=" + sample.text) +
+                       "\",\"cat\":\"node\",\"ph\":\"i\",\"s\":\"p\",\"ts\":" +
+                       std::to_string(sample.us) + ",\"pid\":" + std::to_string(kNodePid) +
+                       ",\"tid\":0}";
+            }
+        }
+    }
+    for (const auto& instant : mInstants) {
+        out += ",\n{\"name\":\"" + jsonEscape(instant.name) + "\",\"cat\":\"" +
+               jsonEscape(instant.category) + "\",\"ph\":\"i\",\"s\":\"g\",\"ts\":" +
+               std::to_string(instant.us) + ",\"pid\":" + std::to_string(kEventPid) +
+               ",\"tid\":0}";
+    }
+    out += "\n]}\n";
+    return out;
+}
+
+bool Timeline::writeChromeJson(const std::string& path, std::string* error) const {
+    std::ofstream file(path, std::ios::trunc);
+    if (!file) {
+        if (error != nullptr) *error = "cannot write " + path;
+        return false;
+    }
+    file << chromeJson();
+    file.close();
+    if (!file) {
+        if (error != nullptr) *error = "write failed: " + path;
+        return false;
+    }
+    return true;
+}
+
+}  // namespace velmora
