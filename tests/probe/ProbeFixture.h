@@ -1,0 +1,141 @@
+// Fixture for the probe handler and its worker, run against a bare platform object whose
+// executor records every call. The handler is declared last so that it (and with it the worker)
+// goes before the platform and the executor it uses.
+#pragma once
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <functional>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "config/Action.h"
+#include "platform/VelmoraPlat.h"
+#include "probe/ProbeHandler.h"
+#include "probe/ProbeThread.h"
+#include "tests/fakes/FakeExecutor.h"
+#include "tests/fakes/LogCapture.h"
+
+namespace velmora {
+namespace fake {
+
+using Clock = std::chrono::steady_clock;  // CLOCK_MONOTONIC, the worker's clock
+using std::chrono::milliseconds;
+
+constexpr milliseconds kBoostDelay{8};
+constexpr milliseconds kBoostLifetime{256};
+// How late the worker (or any wait below) may be on a loaded, sanitized build. Only upper
+// bounds use it; lower bounds are exact.
+constexpr milliseconds kTolerance{250};
+
+using ProbeThread = ProbeHandler::ProbeThread;
+
+// The probe command as the server parses it: cmdId 4116, "probe", one integer pair.
+inline Action* makeProbeAction(int duration, int value = 1000) {
+    Action* action = new Action();
+    action->mCmdId = 4116;
+    action->mName = "probe";
+    action->mDuration = duration;
+    action->mParamNum = 1;
+    action->mTagValues = {1, value};
+    return action;
+}
+
+// setProbeTid(tid, state) as recorded, for comparing whole sequences.
+struct TidCall {
+    unsigned int tid;
+    int state;
+    bool operator==(const TidCall& o) const { return tid == o.tid && state == o.state; }
+};
+inline std::ostream& operator<<(std::ostream& os, const TidCall& c) {
+    return os << "{" << c.tid << ", " << c.state << "}";
+}
+
+class ProbeFixture : public ::testing::Test {
+protected:
+    void SetUp() override {
+        LogCapture::start();
+        mPlat.mExecutorPtr = &mExecutor;
+    }
+    void TearDown() override { mHandler.reset(); }
+
+    void startHandler(Action* action = makeProbeAction(8)) {
+        mHandler = std::make_unique<ProbeHandler>(&mPlat, action);
+    }
+    ProbeThread& thread() { return *mHandler->mProbeThreadPtr; }
+
+    int probe(int pid, int tid, int state) {
+        const std::string msg = "pid=" + std::to_string(pid) + "|tid=" + std::to_string(tid);
+        return mHandler->handle(msg.c_str(), 1, &state);
+    }
+
+    std::vector<TidCall> tidCalls() const {
+        std::vector<TidCall> out;
+        for (const auto& call : mExecutor.calls(Op::ProbeTid)) {
+            out.push_back({call.tid, call.state});
+        }
+        return out;
+    }
+    // Time of the first setProbeTid(tid, state); fails the test when there is none.
+    Clock::time_point tidCallTime(unsigned int tid, int state) const {
+        for (const auto& call : mExecutor.calls(Op::ProbeTid)) {
+            if (call.tid == tid && call.state == state) {
+                return call.when;
+            }
+        }
+        ADD_FAILURE() << "no setProbeTid(" << tid << ", " << state << ")";
+        return Clock::time_point::max();
+    }
+
+    // Queue views, read under the worker's lock. -1: no entry; 0: withdrawn.
+    int64_t waitTimestamp(uint32_t tid) { return timestampIn(&ProbeThread::mWaitQueue, tid); }
+    int64_t boostedTimestamp(uint32_t tid) {
+        return timestampIn(&ProbeThread::mBoostedQueue, tid);
+    }
+    // The same with the worker's lock already held by the caller; the analysis cannot follow
+    // the lock through thread(), hence the opt-out.
+    int64_t waitTimestampLocked(uint32_t tid) NO_THREAD_SAFETY_ANALYSIS {
+        return timestampOf(thread().mWaitQueue, tid);
+    }
+    int64_t boostedTimestampLocked(uint32_t tid) NO_THREAD_SAFETY_ANALYSIS {
+        return timestampOf(thread().mBoostedQueue, tid);
+    }
+    size_t queuedCount() {
+        ProbeThread& t = thread();
+        android::Mutex::Autolock lock(t.mLock);
+        return t.mWaitQueue.size() + t.mBoostedQueue.size();
+    }
+
+    // Polls `done` every millisecond; true once it holds, false after `timeout`.
+    static bool waitUntil(const std::function<bool()>& done, milliseconds timeout = kTolerance) {
+        const auto deadline = Clock::now() + timeout;
+        while (!done()) {
+            if (Clock::now() > deadline) {
+                return false;
+            }
+            usleep(1000);
+        }
+        return true;
+    }
+
+    FakeExecutor mExecutor;
+    VelmoraPlat mPlat;
+    std::unique_ptr<ProbeHandler> mHandler;
+
+private:
+    static int64_t timestampOf(const ProbeThread::ProbeQueue& queue, uint32_t tid) {
+        const ssize_t index = queue.indexOfKey(tid);
+        return index < 0 ? -1 : queue.valueAt(index)->timestamp;
+    }
+    int64_t timestampIn(ProbeThread::ProbeQueue ProbeThread::*queue, uint32_t tid) {
+        ProbeThread& t = thread();
+        android::Mutex::Autolock lock(t.mLock);
+        return timestampOf(t.*queue, tid);
+    }
+};
+
+}  // namespace fake
+}  // namespace velmora

@@ -1,0 +1,169 @@
+// The probe handler: what handle() returns and logs for each kind of event, what reaches the
+// platform, action replacement, and that a stopped or deleted handler leaves the platform alone.
+#include <climits>
+
+#include "tests/probe/ProbeFixture.h"
+
+namespace velmora {
+namespace fake {
+namespace {
+
+class ProbeHandlerTest : public ProbeFixture {};
+
+struct RejectCase {
+    const char* name;
+    const char* msg;
+    unsigned int payloadNum;
+    bool nullPayload;
+    int state;
+    int expected;
+    int prio;
+    const char* log;
+};
+
+class ProbeHandlerRejectTest : public ProbeFixture,
+                               public ::testing::WithParamInterface<RejectCase> {};
+
+TEST_P(ProbeHandlerRejectTest, ReturnsStatusLogsAndQueuesNothing) {
+    const RejectCase& c = GetParam();
+    startHandler();
+    const int state = c.state;
+    EXPECT_EQ(mHandler->handle(c.msg, c.payloadNum, c.nullPayload ? nullptr : &state),
+              c.expected);
+    EXPECT_EQ(LogCapture::count(c.prio, c.log), 1);
+    EXPECT_EQ(queuedCount(), 0u);
+    EXPECT_TRUE(mExecutor.calls().empty());
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Rows, ProbeHandlerRejectTest,
+    ::testing::Values(
+        // The scanner's count comes back as the status: one value read.
+        RejectCase{"PidOnly", "pid=12", 1, false, 0, 1, ANDROID_LOG_ERROR,
+                   "velmora: get msg info failed!"},
+        // Nothing to read at all: the scanner reports end of input.
+        RejectCase{"Empty", "", 1, false, 0, -1, ANDROID_LOG_ERROR,
+                   "velmora: get msg info failed!"},
+        RejectCase{"NullMessage", nullptr, 1, false, 0, -1, ANDROID_LOG_ERROR,
+                   "velmora: get msg info failed!"},
+        // Fields in the wrong order: the first literal already fails.
+        RejectCase{"SwappedFields", "tid=34|pid=12", 1, false, 0, 0, ANDROID_LOG_ERROR,
+                   "velmora: get msg info failed!"},
+        // The message is checked before the payload.
+        RejectCase{"BadMessageAndPayload", "pid=12", 2, false, 0, 1, ANDROID_LOG_ERROR,
+                   "velmora: get msg info failed!"},
+        RejectCase{"TwoPayloadValues", "pid=12|tid=34", 2, false, 0, 2, ANDROID_LOG_ERROR,
+                   "invalid payload, payloadNum=2"},
+        RejectCase{"NoPayloadValues", "pid=12|tid=34", 0, false, 0, 2, ANDROID_LOG_ERROR,
+                   "invalid payload, payloadNum=0"},
+        RejectCase{"NullPayload", "pid=12|tid=34", 1, true, 0, 2, ANDROID_LOG_ERROR,
+                   "payload is NULL"},
+        RejectCase{"StateOne", "pid=12|tid=34", 1, false, 1, 2, ANDROID_LOG_DEBUG,
+                   "error case: state=1, pid=12, tid=34\n"},
+        RejectCase{"StateMinusTwo", "pid=12|tid=34", 1, false, -2, 2, ANDROID_LOG_DEBUG,
+                   "error case: state=-2, pid=12, tid=34\n"},
+        // Only all bits set withdraws; the sign bit alone is just another bad state.
+        RejectCase{"StateIntMin", "pid=12|tid=34", 1, false, INT_MIN, 2, ANDROID_LOG_DEBUG,
+                   "error case: state=-2147483648, pid=12, tid=34\n"}),
+    [](const ::testing::TestParamInfo<RejectCase>& info) { return info.param.name; });
+
+TEST_F(ProbeHandlerTest, StateZeroBoostsThreadAfterDelay) {
+    startHandler();
+    const auto queued = Clock::now();
+    EXPECT_EQ(probe(12, 34, 0), 0);
+    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 1, kBoostDelay + kTolerance));
+    EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{34, 0}}));
+    EXPECT_GE(tidCallTime(34, 0) - queued, kBoostDelay);
+    EXPECT_EQ(mExecutor.calls(Op::DoAction)[0].payload, (std::vector<int>{0}));
+}
+
+TEST_F(ProbeHandlerTest, RepeatedStateZeroBoostsOnce) {
+    startHandler();
+    EXPECT_EQ(probe(12, 34, 0), 0);
+    EXPECT_EQ(probe(12, 34, 0), 0);
+    ASSERT_TRUE(mExecutor.waitFor(Op::ProbeTid, 1, kBoostDelay + kTolerance));
+    EXPECT_EQ(probe(12, 34, 0), 0);  // already boosted: nothing to do
+    EXPECT_FALSE(mExecutor.waitFor(Op::ProbeTid, 2, 3 * kBoostDelay));
+    EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{34, 0}}));
+}
+
+TEST_F(ProbeHandlerTest, StateMinusOneWithdrawsBoostedThreadOnce) {
+    startHandler();
+    EXPECT_EQ(probe(12, 34, 0), 0);
+    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 1, kBoostDelay + kTolerance));
+
+    // The withdrawal is made on the caller's thread, before handle() returns.
+    EXPECT_EQ(probe(12, 34, -1), 0);
+    EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{34, 0}, {34, -1}}));
+    const auto actions = mExecutor.calls(Op::DoAction);
+    ASSERT_EQ(actions.size(), 2u);
+    EXPECT_EQ(actions[1].payload, (std::vector<int>{-1}));
+    EXPECT_EQ(actions[1].name, "probe");
+
+    // The worker drops the entry; neither a second withdrawal nor the lifetime calls again.
+    ASSERT_TRUE(waitUntil([&] { return queuedCount() == 0; }));
+    EXPECT_EQ(probe(12, 34, -1), 0);
+    EXPECT_EQ(mExecutor.calls().size(), 4u);
+}
+
+TEST_F(ProbeHandlerTest, UpdateReplacesActionWithoutCap) {
+    startHandler();
+    Action* chain = makeProbeAction(5000, 2000);
+    chain->mNext = makeProbeAction(7, 7);  // the whole chain is taken over and freed later
+    EXPECT_EQ(mHandler->updateProbeThread(chain), 0);
+
+    EXPECT_EQ(probe(12, 34, 0), 0);
+    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 1, kBoostDelay + kTolerance));
+    const auto action = mExecutor.calls(Op::DoAction)[0];
+    EXPECT_EQ(action.duration, 5000);
+    EXPECT_EQ(action.tagValues, (std::vector<int>{1, 2000}));
+}
+
+TEST_F(ProbeHandlerTest, WithoutWorkerEventsAreIgnoredAndUpdateFails) {
+    startHandler();
+    mHandler->stopProbeThread();
+    mHandler->mProbeThreadPtr.clear();
+
+    EXPECT_EQ(probe(12, 34, 0), 0);
+    EXPECT_EQ(probe(12, 34, 7), 0);  // the state is not even looked at
+    Action* action = makeProbeAction(8);
+    EXPECT_EQ(mHandler->updateProbeThread(action), -1);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "updateProbeThread:mProbeThreadPtr is NULL!"));
+    delete action;  // refused: still the caller's
+    EXPECT_TRUE(mExecutor.calls().empty());
+}
+
+// Once stopped, nothing reaches the platform any more, not even the immediate boost of a
+// thread whose process is boosted: the platform object may be on its way out.
+TEST_F(ProbeHandlerTest, StoppedHandlerLeavesPlatformAlone) {
+    startHandler();
+    EXPECT_EQ(probe(10, 10, 0), 0);
+    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 1, kBoostDelay + kTolerance));
+    EXPECT_EQ(probe(12, 34, 0), 0);
+
+    mHandler->stopProbeThread();
+    mHandler->stopProbeThread();  // idempotent
+    const size_t before = mExecutor.calls(Op::ProbeTid).size();
+    EXPECT_EQ(probe(10, 20, 0), 0);
+    EXPECT_EQ(probe(10, 10, -1), 0);
+    EXPECT_FALSE(mExecutor.waitFor(Op::ProbeTid, before + 1, 3 * kBoostDelay));
+}
+
+// Deleting the handler while the worker polls a boosted thread or waits out a delay returns
+// promptly and leaves nothing behind that could still call the platform or read the handler.
+TEST_F(ProbeHandlerTest, DeletingHandlerStopsWorker) {
+    startHandler();
+    EXPECT_EQ(probe(10, 10, 0), 0);
+    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 1, kBoostDelay + kTolerance));
+    EXPECT_EQ(probe(12, 34, 0), 0);
+
+    const auto start = Clock::now();
+    mHandler.reset();
+    EXPECT_LE(Clock::now() - start, kTolerance);
+    const size_t before = mExecutor.calls(Op::ProbeTid).size();
+    EXPECT_FALSE(mExecutor.waitFor(Op::ProbeTid, before + 1, 3 * kBoostDelay));
+}
+
+}  // namespace
+}  // namespace fake
+}  // namespace velmora
