@@ -24,7 +24,7 @@ std::string ratioText(const std::string& big, const std::string& little) {
 }
 
 class ServerMemlatencyTest : public ServerTest {
-protected:
+  protected:
     void start(const std::string& extra = "") {
         ASSERT_EQ(startServer(extra), 0);
         executor().clear();
@@ -45,18 +45,19 @@ TEST_F(ServerMemlatencyTest, RatiosReachThePlatformAsStringPairs) {
     EXPECT_EQ(calls[0].id, kRatioEvent);
     EXPECT_EQ(calls[0].name, "");
     EXPECT_EQ(calls[0].duration, 0);
-    EXPECT_EQ(calls[0].params, std::vector<std::string>({"mem_latency_ratio_b", "0.5",
-                                                          "mem_latency_ratio_l", "0.7"}));
+    EXPECT_EQ(calls[0].params, std::vector<std::string>(
+                                   {"mem_latency_ratio_b", "0.5", "mem_latency_ratio_l", "0.7"}));
     EXPECT_TRUE(calls[0].tagValues.empty());
     EXPECT_EQ(calls[0].payload, std::vector<int>({kOn}));
-    EXPECT_EQ(calls[1].params, std::vector<std::string>({"mem_latency_ratio_b", "0.9",
-                                                          "mem_latency_ratio_l", "1.25"}));
+    EXPECT_EQ(calls[1].params, std::vector<std::string>(
+                                   {"mem_latency_ratio_b", "0.9", "mem_latency_ratio_l", "1.25"}));
     EXPECT_EQ(calls[1].payload, std::vector<int>({kOff}));
 }
 
 TEST_F(ServerMemlatencyTest, RatioEventIgnoresAConfiguredCommandOfTheSameId) {
-    start("<cmd id=\"20480\" name=\"configured\"><act><duration>7</duration><t1>999</t1></act>"
-          "</cmd>");
+    start(
+        "<cmd id=\"20480\" name=\"configured\"><act><duration>7</duration><t1>999</t1></act>"
+        "</cmd>");
     EXPECT_EQ(ratio(ratioText("0.5", "0.7")), 0);
     const auto calls = actions();
     ASSERT_EQ(calls.size(), 1u);
@@ -107,8 +108,7 @@ INSTANTIATE_TEST_SUITE_P(
                       TextRow{"ratios_glued", "pid=12|tid=34|ratio_b=0.5ratio_l=0.7"},
                       TextRow{"pid_not_a_number", "pid=x|tid=34|ratio_b=0.5 ratio_l=0.7"},
                       TextRow{"tid_missing", "pid=12|ratio_b=0.5 ratio_l=0.7"},
-                      TextRow{"probe_text", "pid=12|tid=34"},
-                      TextRow{"empty_text", ""},
+                      TextRow{"probe_text", "pid=12|tid=34"}, TextRow{"empty_text", ""},
                       TextRow{"no_text", nullptr}),
     [](const ::testing::TestParamInfo<TextRow>& info) { return std::string(info.param.what); });
 

@@ -27,7 +27,7 @@ using PriorityMap = std::map<int32_t, int32_t>;
 const PriorityMap kBuiltins = {{4118, 100}, {4119, 200}, {4120, 20}, {4121, 70}};
 
 class ServerPriorityTest : public ServerTest {
-protected:
+  protected:
     void start(const std::string& extra) {
         ASSERT_EQ(startServer(extra), 0);
         executor().clear();
@@ -74,8 +74,10 @@ TEST_F(ServerPriorityTest, WithoutConfiguredPrioritiesOnlyTheBuiltinsExist) {
                                  {4119, kOn}}));
     EXPECT_EQ(on(4122), -1);
     EXPECT_EQ(on(4300), -1);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4122"));
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4300"));
+    EXPECT_TRUE(
+        LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4122"));
+    EXPECT_TRUE(
+        LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4300"));
 }
 
 // One configured scene per row: the priority it ends up with (0: none, the scene is refused).
@@ -86,7 +88,9 @@ struct PriorityRow {
     int expected;
 };
 
-std::ostream& operator<<(std::ostream& os, const PriorityRow& r) { return os << r.what; }
+std::ostream& operator<<(std::ostream& os, const PriorityRow& r) {
+    return os << r.what;
+}
 
 class ServerPriorityRowTest : public ServerPriorityTest,
                               public ::testing::WithParamInterface<PriorityRow> {};
@@ -103,9 +107,8 @@ TEST_P(ServerPriorityRowTest, ConfiguredPriorityDecidesWhetherTheSceneRuns) {
         EXPECT_EQ(steps(), StepList({{row.cmdId, kOn}}));
     } else {
         EXPECT_EQ(on(row.cmdId), -1);
-        EXPECT_TRUE(LogCapture::has(
-            ANDROID_LOG_ERROR,
-            "invalid special scene priority, cmdId is " + std::to_string(row.cmdId)));
+        EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is " +
+                                                           std::to_string(row.cmdId)));
         EXPECT_EQ(steps(), StepList());
     }
 }
@@ -160,7 +163,8 @@ TEST_F(ServerPriorityTest, EqualPrioritiesGoToTheSmallerCmdId) {
 
 TEST_F(ServerPriorityTest, ReloadRebuildsTheTableFromScratch) {
     start(scene(4118, "<t101>150</t101>") + scene(4119) + scene(4120) + scene(4121) +
-          scene(4130, "<t101>300</t101>") + scene(4131) + scene(4300, "<s_priority>40</s_priority>"));
+          scene(4130, "<t101>300</t101>") + scene(4131) +
+          scene(4300, "<s_priority>40</s_priority>"));
     ASSERT_EQ(priorities().at(4118), 150);
     ASSERT_EQ(priorities().at(4300), 40);
     ASSERT_EQ(on(4118), 0);

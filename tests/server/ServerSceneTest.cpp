@@ -41,14 +41,17 @@ std::ostream& operator<<(std::ostream& os, const Step& s) {
     return os;
 }
 
-Step apply(int cmdId) { return {cmdId, {kOn}}; }
-Step withdraw(int cmdId) { return {cmdId, {kOff}}; }
+Step apply(int cmdId) {
+    return {cmdId, {kOn}};
+}
+Step withdraw(int cmdId) {
+    return {cmdId, {kOff}};
+}
 using Steps = std::vector<Step>;
 
 std::string scene(int cmdId, const std::string& body = "", int duration = 0) {
     return "<cmd id=\"" + std::to_string(cmdId) + "\" name=\"scene_" + std::to_string(cmdId) +
-           "\"><act><duration>" + std::to_string(duration) + "</duration>" + body +
-           "</act></cmd>";
+           "\"><act><duration>" + std::to_string(duration) + "</duration>" + body + "</act></cmd>";
 }
 
 std::string govScene(int cmdId, int priority) {
@@ -57,9 +60,9 @@ std::string govScene(int cmdId, int priority) {
 
 // Built-in scenes 4118 (100), 4119 (200), 4120 (20), 4121 (70); governor scenes 4230 and 4240
 // (50 each), 4250 (30) and 4260 (300, above 4119); 4130 is configured without a priority.
-const std::string kScenes = scene(4118, "<t1>1500</t1>") + scene(4119) + scene(4120) +
-                            scene(4121) + govScene(4230, 50) + govScene(4240, 50) +
-                            govScene(4250, 30) + govScene(4260, 300) + scene(4130, "<t1>1</t1>");
+const std::string kScenes = scene(4118, "<t1>1500</t1>") + scene(4119) + scene(4120) + scene(4121) +
+                            govScene(4230, 50) + govScene(4240, 50) + govScene(4250, 30) +
+                            govScene(4260, 300) + scene(4130, "<t1>1</t1>");
 
 struct SceneState {
     int cur;
@@ -73,7 +76,7 @@ SceneState snapshot(VelmoraServer* s) {
 }
 
 class ServerSceneTest : public ServerTest {
-protected:
+  protected:
     void start(const std::string& extra = kScenes) {
         ASSERT_EQ(startServer(extra), 0);
         executor().clear();
@@ -263,7 +266,8 @@ TEST_F(ServerSceneTest, UnconfiguredPriorityIsRefusedWithoutTouchingTheState) {
     ASSERT_EQ(on(4118), 0);
     steps();
     EXPECT_EQ(on(4130), -1);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4130"));
+    EXPECT_TRUE(
+        LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4130"));
     EXPECT_EQ(off(4130), -1);
     EXPECT_EQ(steps(), Steps());
     const SceneState s = state();
@@ -308,7 +312,8 @@ TEST_P(ServerSceneInvalidPayloadTest, IsRefusedAndChangesNothing) {
     const PayloadRow& row = GetParam();
     const int* payload = row.payload.empty() ? nullptr : row.payload.data();
     EXPECT_EQ(mServer->velmoraEvent(4119, "", row.payloadNum, payload), -1);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene parameters, cmdId is 4119"));
+    EXPECT_TRUE(
+        LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene parameters, cmdId is 4119"));
     EXPECT_EQ(steps(), Steps());
     EXPECT_EQ(state().cur, 4118);
     EXPECT_EQ(state().on, std::set<int32_t>({4118}));
@@ -316,11 +321,10 @@ TEST_P(ServerSceneInvalidPayloadTest, IsRefusedAndChangesNothing) {
 
 INSTANTIATE_TEST_SUITE_P(
     Rows, ServerSceneInvalidPayloadTest,
-    ::testing::Values(PayloadRow{"payload_one", 1, {1}},       // neither on nor off
-                      PayloadRow{"payload_minus_two", 1, {-2}},
-                      PayloadRow{"null_payload", 1, {}},
+    ::testing::Values(PayloadRow{"payload_one", 1, {1}},  // neither on nor off
+                      PayloadRow{"payload_minus_two", 1, {-2}}, PayloadRow{"null_payload", 1, {}},
                       PayloadRow{"no_payload", 0, {}},
-                      PayloadRow{"two_ints", 2, {0, 0}}),     // only exactly one int counts
+                      PayloadRow{"two_ints", 2, {0, 0}}),  // only exactly one int counts
     [](const ::testing::TestParamInfo<PayloadRow>& info) { return std::string(info.param.what); });
 
 TEST_F(ServerSceneTest, TwoResultsAreJoinedByBitwiseOr) {
@@ -328,9 +332,8 @@ TEST_F(ServerSceneTest, TwoResultsAreJoinedByBitwiseOr) {
     ASSERT_EQ(on(4118), 0);
     steps();
     // Withdrawing 4118 answers 1, applying 4119 answers 4.
-    executor().setActionHook([this](const Action* a) {
-        executor().setResult(Op::DoAction, a->mCmdId == 4118 ? 1 : 4);
-    });
+    executor().setActionHook(
+        [this](const Action* a) { executor().setResult(Op::DoAction, a->mCmdId == 4118 ? 1 : 4); });
     EXPECT_EQ(on(4119), 5);
     EXPECT_EQ(steps(), Steps({withdraw(4118), apply(4119)}));
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4118"));
@@ -394,7 +397,8 @@ TEST_F(ServerSceneTest, DebugLogTracesEverySceneAction) {
 }
 
 // Host threads switch scenes concurrently; whatever the interleaving, the current scene must
-// be a switched-on scene of the highest priority, and none when nothing is on.
+// be a switched-on scene of the highest priority, and none when nothing is on. Checked under
+// mMutex while the switches run and once they are done.
 ::testing::AssertionResult currentIsBest(const SceneState& s) {
     if (s.on.empty()) {
         if (s.cur == 0) {
@@ -449,6 +453,14 @@ TEST_F(ServerSceneTest, ConcurrentSwitchesKeepTheBestSceneCurrent) {
             }
         });
     }
+    // Reloads rebuild the priority table (parser write lock, then mMutex) while switches run
+    // (mMutex released before the parser's read lock is taken): a lock-order slip hangs here.
+    workers.emplace_back([&] {
+        for (int i = 0; i < 10; ++i) {
+            EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
+            std::this_thread::yield();
+        }
+    });
     for (auto& w : workers) {
         w.join();
     }
