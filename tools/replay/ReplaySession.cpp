@@ -1,0 +1,241 @@
+#include "tools/replay/ReplaySession.h"
+
+#include <chrono>
+#include <thread>
+
+#include "host/HostEnvironment.h"
+#include "host/HostPlatform.h"
+#include "server/VelmoraServer.h"
+
+namespace velmora {
+
+namespace {
+
+constexpr int kReloadCmdId = 20230;
+// How long the end of a replay waits for the library's probe worker to withdraw its boosts
+// (boosts live at most 256 ms).
+constexpr auto kProbeDrainLimit = std::chrono::milliseconds(1000);
+
+std::string directoryOf(const std::string& path) {
+    const size_t slash = path.find_last_of('/');
+    if (slash == std::string::npos) return ".";
+    return slash == 0 ? "/" : path.substr(0, slash);
+}
+
+std::string formatNumber(double v) {
+    char buf[32];
+    snprintf(buf, sizeof(buf), "%.10g", v);
+    return buf;
+}
+
+}  // namespace
+
+ReplaySession::ReplaySession(ReplayOptions options, FILE* out, FILE* err, FILE* input)
+    : mOptions(std::move(options)), mOut(out), mErr(err), mInput(input) {}
+
+ReplaySession::~ReplaySession() {
+    tearDown();
+}
+
+int ReplaySession::setUp() {
+    HostEnvironment& env = HostEnvironment::get();
+    env.reset();
+    if (mOptions.fast) {
+        env.clock().setVirtual();
+    } else {
+        env.clock().setRealTime(mOptions.speed);
+    }
+    std::string error;
+    if (!mOptions.nodeMapPath.empty() && env.nodeMap().load(mOptions.nodeMapPath, &error) != 0) {
+        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+        return kBadInput;
+    }
+    std::vector<std::string> dirs = mOptions.configDirs;
+    if (dirs.empty()) {
+        dirs.push_back(mOptions.interactive ? "." : directoryOf(mOptions.tracePath));
+    }
+    env.properties().setConfigDirs(dirs);
+    if (env.properties().findConfigFile("xml/velmora_config_cust.xml").empty()) {
+        fprintf(mErr, "velmora-replay: no xml/velmora_config_cust.xml in %s\n", dirs[0].c_str());
+        return kBadInput;
+    }
+    for (const auto& property : mOptions.properties) {
+        env.properties().set(property.first, property.second);
+    }
+    const std::string root = mOptions.deviceRoot.empty() ? HostEnvironment::defaultSimulatedRoot()
+                                                         : mOptions.deviceRoot;
+    if (env.useDeviceRoot(root, /*fresh=*/true) != 0) {
+        fprintf(mErr, "velmora-replay: device root %s is not usable\n", root.c_str());
+        return kSetupFailed;
+    }
+    if (!env.eventLog().setPath(mOptions.eventLogPath)) {
+        fprintf(mErr, "velmora-replay: cannot write %s\n", mOptions.eventLogPath.c_str());
+        return kSetupFailed;
+    }
+    // Every node gets its initial value on the timeline, also the ones nothing will touch.
+    for (const auto& node : env.nodeMap().nodes()) {
+        std::string text;
+        env.device().read(node.key, &text);
+    }
+    mServer.reset(new VelmoraServer());
+    const int status = mServer->init();
+    fprintf(mOut, "init -> %d (device %s)\n", status, root.c_str());
+    // 4 means the probe command is missing; everything else is running.
+    if (status != 0 && status != 4) {
+        fprintf(mErr, "velmora-replay: server init failed with %d\n", status);
+        mServer.reset();
+        return kSetupFailed;
+    }
+    return kOk;
+}
+
+void ReplaySession::echo(const TraceCall& call, const std::string& result) {
+    if (mOptions.quiet) return;
+    const int64_t ms = HostEnvironment::get().clock().nowMs();
+    fprintf(mOut, "[%7lld.%03lld] %s:%d %s -> %s\n", static_cast<long long>(ms / 1000),
+            static_cast<long long>(ms % 1000), call.file.c_str(), call.line, call.source.c_str(),
+            result.c_str());
+    fflush(mOut);
+}
+
+int ReplaySession::perform(const TraceCall& call) {
+    HostEnvironment& env = HostEnvironment::get();
+    if (call.atMs >= 0) {
+        env.clock().advanceTo(call.atMs);
+    }
+    int status = 0;
+    std::string result;
+    switch (call.kind) {
+        case TraceCall::Kind::Stamp:
+            return 0;
+        case TraceCall::Kind::Sleep:
+            env.clock().sleepMs(call.sleepMs);
+            return 0;
+        case TraceCall::Kind::Policy:
+            env.launchPolicies().set(call.text, call.id);
+            echo(call, "ok");
+            return 0;
+        case TraceCall::Kind::Event:
+            status = mServer->velmoraEvent(
+                call.id, call.hasMsg ? call.text.c_str() : nullptr,
+                static_cast<unsigned int>(call.payload.size()),
+                call.payload.empty() ? nullptr : call.payload.data());
+            break;
+        case TraceCall::Kind::Reload:
+            status = mServer->velmoraEvent(kReloadCmdId, nullptr, 0, nullptr);
+            break;
+        case TraceCall::Kind::SetConfig:
+            status = mServer->velmoraSetConfig(call.id, static_cast<int>(call.tags.size()),
+                                               call.tags.data(), call.values.data());
+            break;
+        case TraceCall::Kind::GetConfig: {
+            std::vector<int> values(call.tags.size(), -1);
+            status = mServer->velmoraGetConfig(static_cast<int>(call.tags.size()),
+                                               call.tags.data(), values.data());
+            for (size_t i = 0; i < values.size(); ++i) {
+                result += std::to_string(call.tags[i]) + "=" + std::to_string(values[i]) + " ";
+            }
+            break;
+        }
+        case TraceCall::Kind::Dump:
+            echo(call, "");
+            fflush(mOut);
+            mServer->dumpVelmoraServerInfo(fileno(mOut), {call.text});
+            ++mCalls;
+            return 0;
+    }
+    ++mCalls;
+    if (status != 0) ++mFailed;
+    env.timeline().recordInstant("call", call.source + " -> " + std::to_string(status));
+    echo(call, result + std::to_string(status));
+    return status;
+}
+
+int ReplaySession::replayFile() {
+    std::vector<TraceCall> calls;
+    std::string error;
+    if (TraceParser::parseFile(mOptions.tracePath, &calls, &error) != 0) {
+        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+        return kBadInput;
+    }
+    const int setup = setUp();
+    if (setup != kOk) return setup;
+    for (const auto& call : calls) {
+        perform(call);
+    }
+    return kOk;
+}
+
+int ReplaySession::replayInteractive() {
+    const int setup = setUp();
+    if (setup != kOk) return setup;
+    int result = kOk;
+    char buffer[4096];
+    int lineNo = 0;
+    while (fgets(buffer, sizeof(buffer), mInput) != nullptr) {
+        std::string line(buffer);
+        if (!line.empty() && line.back() == '\n') line.pop_back();
+        std::vector<TraceCall> calls;
+        std::string error;
+        if (TraceParser::parseLine(line, "<stdin>", ++lineNo, &calls, &error) != 0) {
+            fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+            result = kBadInput;  // keep going: a typo should not end the session
+            continue;
+        }
+        for (const auto& call : calls) perform(call);
+    }
+    return result;
+}
+
+void ReplaySession::waitForProbeBoosts() {
+    auto* plat = mServer != nullptr ? dynamic_cast<HostPlatform*>(mServer->mPlatPtr) : nullptr;
+    if (plat == nullptr) return;
+    const auto limit = std::chrono::steady_clock::now() + kProbeDrainLimit;
+    while (plat->executor()->boostedThreads() != 0 && std::chrono::steady_clock::now() < limit) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    }
+    // Let the worker drop the withdrawn entries before the platform goes away.
+    std::this_thread::sleep_for(std::chrono::milliseconds(20));
+}
+
+void ReplaySession::tearDown() {
+    if (mServer == nullptr) return;
+    waitForProbeBoosts();
+    mServer.reset();
+}
+
+std::string ReplaySession::summaryText() const {
+    std::string out;
+    char line[512];
+    snprintf(line, sizeof(line), "%-30s %14s %14s %8s %14s %14s\n", "node", "initial", "final",
+             "changes", "min", "max");
+    out += line;
+    for (const auto& node : HostEnvironment::get().timeline().summary()) {
+        snprintf(line, sizeof(line), "%-30s %14s %14s %8d %14s %14s\n", node.key.c_str(),
+                 node.initial.c_str(), node.final.c_str(), node.changes,
+                 node.numeric ? formatNumber(node.min).c_str() : "-",
+                 node.numeric ? formatNumber(node.max).c_str() : "-");
+        out += line;
+    }
+    return out;
+}
+
+int ReplaySession::run() {
+    const int result = mOptions.interactive ? replayInteractive() : replayFile();
+    if (mServer == nullptr) return result;
+    tearDown();
+    HostEnvironment& env = HostEnvironment::get();
+    fprintf(mOut, "\n%d host calls, %d with a nonzero status, %zu report lines\n\n", mCalls,
+            mFailed, env.eventLog().lines().size());
+    fputs(summaryText().c_str(), mOut);
+    std::string error;
+    if (!env.timeline().writeChromeJson(mOptions.timelinePath, &error)) {
+        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+        return kSetupFailed;
+    }
+    fprintf(mOut, "\ntimeline: %s (open in https://ui.perfetto.dev)\nevent log: %s\n",
+            mOptions.timelinePath.c_str(), mOptions.eventLogPath.c_str());
+    return result;
+}
+
+}  // namespace velmora

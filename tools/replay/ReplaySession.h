@@ -1,0 +1,71 @@
+// One run of velmora-replay: sets up the host platform layer, initialises a VelmoraServer on it,
+// replays the calls of a trace (or of stdin, interactively), and reports what the device nodes
+// went through: a per-node summary and a timeline in Chrome's JSON trace format.
+//
+// Used by the velmora-replay program and by the end-to-end tests; single threaded.
+#pragma once
+
+#include <cstdio>
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "tools/replay/TraceParser.h"
+
+class VelmoraServer;
+
+namespace velmora {
+
+struct ReplayOptions {
+    std::string tracePath;                 // ignored when interactive
+    bool interactive = false;              // read calls from `input` until end of file
+    std::vector<std::string> configDirs;   // default: the trace's directory
+    std::string deviceRoot;                // default: a fresh simulated device in /tmp
+    std::string nodeMapPath;               // node map overrides, optional
+    double speed = 1.0;                    // trace ms per real ms
+    bool fast = false;                     // virtual time: no waiting at all
+    std::string timelinePath = "velmora-timeline.json";
+    std::string eventLogPath = "velmora-events.log";
+    std::vector<std::pair<std::string, std::string>> properties;
+    bool quiet = false;                    // no per-call lines
+};
+
+class ReplaySession {
+public:
+    // Exit codes of run().
+    static constexpr int kOk = 0;
+    static constexpr int kBadInput = 1;   // unknown call, malformed number, missing file
+    static constexpr int kSetupFailed = 2;
+
+    ReplaySession(ReplayOptions options, FILE* out, FILE* err, FILE* input = stdin);
+    ~ReplaySession();
+
+    // Whole run: set-up, replay, summary, timeline. One of the exit codes above.
+    int run();
+
+    // Parts of run(), for tests.
+    int setUp();
+    // Performs one call; returns the host status (0 for calls that are not host calls).
+    int perform(const TraceCall& call);
+    void tearDown();
+    std::string summaryText() const;
+    int calls() const { return mCalls; }
+    int failedCalls() const { return mFailed; }
+
+private:
+    int replayFile();
+    int replayInteractive();
+    void waitForProbeBoosts();
+    void echo(const TraceCall& call, const std::string& result);
+
+    ReplayOptions mOptions;
+    FILE* mOut;
+    FILE* mErr;
+    FILE* mInput;
+    std::unique_ptr<VelmoraServer> mServer;
+    int mCalls = 0;
+    int mFailed = 0;  // host calls with a nonzero status
+};
+
+}  // namespace velmora

@@ -1,0 +1,55 @@
+// The event-trace format of velmora-replay: one host call per line.
+//
+//     # comment (also after a call)
+//     [@<ms>] <call>                  "@<ms>" waits until trace time <ms> before the call
+//     @<ms>                           a time stamp on its own
+//     sleep <ms>
+//     event <cmdId> [<payload>...] [msg="<text>"]
+//     reload                          event 20230
+//     setconfig <clientId> <tag>=<value> [<tag>=<value>...]
+//     getconfig <tag> [<tag>...]
+//     dump <option>                   --help --logon --logoff --freqlist --easgrouplist
+//     policy <name> <duration>        launch-policy answer (cold, winswitch); -1 clears it
+//
+// Numbers are decimal or 0x hexadecimal, with an optional minus sign. Errors name the file and
+// line: "trace.txt:12: malformed number 'x1' for payload".
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace velmora {
+
+struct TraceCall {
+    enum class Kind { Stamp, Sleep, Event, Reload, SetConfig, GetConfig, Dump, Policy };
+
+    Kind kind = Kind::Stamp;
+    std::string file;
+    int line = 0;
+    int64_t atMs = -1;          // "@<ms>" prefix, -1 when absent
+    int64_t sleepMs = 0;        // sleep
+    int id = 0;                 // event: cmdId; setconfig: clientId; policy: duration
+    std::vector<int> payload;   // event
+    bool hasMsg = false;        // event: msg= given (null message otherwise)
+    std::string text;           // event: msg; dump: option; policy: name
+    std::vector<int> tags;      // setconfig, getconfig
+    std::vector<int> values;    // setconfig
+    std::string source;         // the line as written, for the echo
+};
+
+class TraceParser {
+public:
+    // Parses one line; appends a call unless the line is blank or a comment. 0, or -1 with
+    // `error` naming file:line.
+    static int parseLine(const std::string& line, const std::string& file, int lineNo,
+                         std::vector<TraceCall>* calls, std::string* error);
+    // Every line of `text`; stops at the first error.
+    static int parseText(const std::string& text, const std::string& file,
+                         std::vector<TraceCall>* calls, std::string* error);
+    // parseText on the contents of `path`; a missing file is an error naming it.
+    static int parseFile(const std::string& path, std::vector<TraceCall>* calls,
+                         std::string* error);
+};
+
+}  // namespace velmora

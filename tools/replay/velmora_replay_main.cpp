@@ -1,0 +1,97 @@
+// velmora-replay: replays an event trace against the server on the host platform layer.
+// See docs/replay.md for the trace format.
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <string>
+
+#include "tools/replay/ReplaySession.h"
+
+namespace {
+
+void usage(FILE* to) {
+    fputs(
+        "usage: velmora-replay [options] TRACE\n"
+        "       velmora-replay [options] --interactive\n"
+        "  --config-dir DIR     where xml/velmora_config_cust.xml is looked up (repeatable;\n"
+        "                       default: the trace's directory)\n"
+        "  --root DIR           device root: a fresh simulated device is created there\n"
+        "                       (default /tmp/velmora-sim-<pid>); \"/\" writes the real nodes\n"
+        "  --nodes FILE         node map overrides\n"
+        "  --speed X            replay X times faster than real time\n"
+        "  --fast               do not wait at all (virtual time)\n"
+        "  --timeline FILE      Chrome JSON timeline (default velmora-timeline.json)\n"
+        "  --event-log FILE     device event log lines (default velmora-events.log)\n"
+        "  --property KEY=VAL   system property seen by the server (repeatable)\n"
+        "  --quiet              no line per call\n"
+        "  --interactive        read calls from stdin\n",
+        to);
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    velmora::ReplayOptions options;
+    for (int i = 1; i < argc; ++i) {
+        const std::string arg = argv[i];
+        auto value = [&](const char* name) -> const char* {
+            if (i + 1 >= argc) {
+                fprintf(stderr, "velmora-replay: %s needs a value\n", name);
+                exit(velmora::ReplaySession::kBadInput);
+            }
+            return argv[++i];
+        };
+        if (arg == "--config-dir") {
+            options.configDirs.push_back(value("--config-dir"));
+        } else if (arg == "--root") {
+            options.deviceRoot = value("--root");
+        } else if (arg == "--nodes") {
+            options.nodeMapPath = value("--nodes");
+        } else if (arg == "--speed") {
+            const char* text = value("--speed");
+            char* end = nullptr;
+            options.speed = strtod(text, &end);
+            if (*end != '\0' || !(options.speed > 0)) {
+                fprintf(stderr, "velmora-replay: malformed speed '%s'\n", text);
+                return velmora::ReplaySession::kBadInput;
+            }
+        } else if (arg == "--fast") {
+            options.fast = true;
+        } else if (arg == "--timeline") {
+            options.timelinePath = value("--timeline");
+        } else if (arg == "--event-log") {
+            options.eventLogPath = value("--event-log");
+        } else if (arg == "--property") {
+            const std::string kv = value("--property");
+            const size_t eq = kv.find('=');
+            if (eq == std::string::npos || eq == 0) {
+                fprintf(stderr, "velmora-replay: --property wants KEY=VALUE, got '%s'\n",
+                        kv.c_str());
+                return velmora::ReplaySession::kBadInput;
+            }
+            options.properties.emplace_back(kv.substr(0, eq), kv.substr(eq + 1));
+        } else if (arg == "--quiet") {
+            options.quiet = true;
+        } else if (arg == "--interactive") {
+            options.interactive = true;
+        } else if (arg == "--help" || arg == "-h") {
+            usage(stdout);
+            return 0;
+        } else if (!arg.empty() && arg[0] == '-') {
+            fprintf(stderr, "velmora-replay: unknown option %s\n", arg.c_str());
+            usage(stderr);
+            return velmora::ReplaySession::kBadInput;
+        } else if (options.tracePath.empty()) {
+            options.tracePath = arg;
+        } else {
+            fprintf(stderr, "velmora-replay: more than one trace given\n");
+            return velmora::ReplaySession::kBadInput;
+        }
+    }
+    if (options.tracePath.empty() && !options.interactive) {
+        usage(stderr);
+        return velmora::ReplaySession::kBadInput;
+    }
+    velmora::ReplaySession session(options, stdout, stderr);
+    return session.run();
+}
