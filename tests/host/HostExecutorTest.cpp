@@ -1,0 +1,221 @@
+// What reaches the device nodes: timed actions (expiry, re-arm, withdraw), scenes and on/off
+// actions, merged frequency configurations, group levels, probe boosts and queries. Runs on a
+// simulated device in virtual time, so expiry happens exactly when the clock is advanced.
+#include <gtest/gtest.h>
+
+#include <unistd.h>
+
+#include <memory>
+
+#include "config/Action.h"
+#include "host/DeviceTree.h"
+#include "host/HostClock.h"
+#include "host/HostExecutor.h"
+#include "host/NodeMap.h"
+#include "host/Timeline.h"
+#include "tests/host/HostTestSupport.h"
+
+namespace velmora {
+namespace {
+
+class HostExecutorTest : public testing::Test {
+protected:
+    void SetUp() override {
+        mClock.setVirtual();
+        mTree.setRoot(hosttest::makeScratchDir("executor"));
+        ASSERT_EQ(0, mTree.seed());
+        mExecutor.reset(new HostExecutor(mNodes, mTree, mClock, mTimeline));
+    }
+
+    std::string node(const std::string& key) { return hosttest::readFile(mTree.pathOf(key)); }
+
+    static Action action(int cmdId, int duration, std::vector<int32_t> pairs) {
+        Action a;
+        a.mCmdId = cmdId;
+        a.mName = "test";
+        a.mDuration = duration;
+        a.mParamNum = static_cast<int32_t>(pairs.size() / 2);
+        a.mTagValues = std::move(pairs);
+        return a;
+    }
+    int apply(const Action& a, int payload) { return mExecutor->doAction(&a, 1, &payload); }
+
+    HostClock mClock;
+    Timeline mTimeline{mClock};
+    NodeMap mNodes;
+    DeviceTree mTree{mNodes, mTimeline};
+    std::unique_ptr<HostExecutor> mExecutor;
+};
+
+TEST_F(HostExecutorTest, TimedActionRevertsWhenItsDurationExpires) {
+    const Action boost = action(4099, 1500, {1, 1804800, 4, 2419200, 20, 1});
+    ASSERT_EQ(0, apply(boost, 0));
+    EXPECT_EQ("1804800", node("cpu.little.min"));
+    EXPECT_EQ("2419200", node("cpu.big.min"));
+    EXPECT_EQ("1", node("sched.fork_on_big"));
+
+    mClock.advanceTo(1499);
+    EXPECT_EQ("1804800", node("cpu.little.min"));
+    mClock.advanceTo(1500);
+    EXPECT_EQ("300000", node("cpu.little.min"));
+    EXPECT_EQ("710400", node("cpu.big.min"));
+    EXPECT_EQ("0", node("sched.fork_on_big"));
+    EXPECT_FALSE(mExecutor->timedActionPending(4099));
+}
+
+TEST_F(HostExecutorTest, SameCommandAgainReArmsTheTimer) {
+    const Action boost = action(4098, 400, {1, 1401600});
+    ASSERT_EQ(0, apply(boost, 0));
+    mClock.advanceTo(300);
+    ASSERT_EQ(0, apply(boost, 0));  // deadline now 700
+    mClock.advanceTo(600);
+    EXPECT_EQ("1401600", node("cpu.little.min"));
+    mClock.advanceTo(700);
+    EXPECT_EQ("300000", node("cpu.little.min"));
+    // Applying the same value again wrote nothing: one write up, one back down.
+    EXPECT_EQ(2, mTimeline.changes("cpu.little.min"));
+}
+
+TEST_F(HostExecutorTest, PayloadMinusOneWithdrawsATimedActionEarly) {
+    const Action boost = action(4100, 3000, {4, 1804800});
+    ASSERT_EQ(0, apply(boost, 0));
+    ASSERT_EQ(0, apply(boost, -1));
+    EXPECT_EQ("710400", node("cpu.big.min"));
+    EXPECT_FALSE(mExecutor->timedActionPending(4100));
+    // A later expiry must not touch a floor someone else set in the meantime.
+    ASSERT_EQ(0, apply(action(4101, 5000, {4, 1497600}), 0));
+    mClock.advanceTo(3000);
+    EXPECT_EQ("1497600", node("cpu.big.min"));
+}
+
+// Floors combine by the largest request and caps by the smallest; withdrawing one request
+// leaves the others in force.
+TEST_F(HostExecutorTest, RequestsOfDifferentSourcesCombinePerNode) {
+    const Action scene = action(4119, 0, {1, 1209600, 101, 200});
+    const Action launch = action(4099, 1000, {1, 1804800});
+    ASSERT_EQ(0, apply(scene, 0));
+    ASSERT_EQ(0, apply(launch, 0));
+    EXPECT_EQ("1804800", node("cpu.little.min"));
+    mClock.advanceTo(1000);
+    EXPECT_EQ("1209600", node("cpu.little.min"));  // the scene's floor remains
+
+    const int tags[] = {2};
+    const int caps[] = {1497600};
+    ASSERT_EQ(0, mExecutor->doPerfSetConfig(1, 1, tags, caps));
+    ASSERT_EQ(0, apply(action(12288, 0, {2, 1401600}), 0));
+    EXPECT_EQ("1401600", node("cpu.little.max"));
+    ASSERT_EQ(0, apply(action(12288, 0, {2, 1401600}), -1));
+    EXPECT_EQ("1497600", node("cpu.little.max"));
+    const int release[] = {0};
+    ASSERT_EQ(0, mExecutor->doPerfSetConfig(1, 1, tags, release));
+    EXPECT_EQ("1804800", node("cpu.little.max"));
+    ASSERT_EQ(0, apply(scene, -1));
+    EXPECT_EQ("300000", node("cpu.little.min"));
+}
+
+TEST_F(HostExecutorTest, ScenesAndMemoryLatencyStayUntilWithdrawnAndAreMarked) {
+    Action gov;
+    gov.mCmdId = 4224;
+    gov.mName = "gov";
+    gov.mParamNum = 2;
+    gov.mParams = {"priority", "50", "big_governor", "performance"};
+    Action memlat(20480, "", 0, 2, {"mem_latency_ratio_b", "0.5", "mem_latency_ratio_l", "0.7"});
+    ASSERT_EQ(0, apply(gov, 0));
+    ASSERT_EQ(0, apply(memlat, 0));
+    mClock.advanceTo(60000);
+    EXPECT_EQ("performance", node("cpu.big.governor"));
+    EXPECT_EQ("0.5", node("memlat.ratio_b"));
+    EXPECT_EQ("0.7", node("memlat.ratio_l"));
+    ASSERT_EQ(0, apply(gov, -1));
+    ASSERT_EQ(0, apply(memlat, -1));
+    EXPECT_EQ("schedutil", node("cpu.big.governor"));
+    EXPECT_EQ("1", node("memlat.ratio_b"));
+    const auto scenes = mTimeline.instants("scene");
+    ASSERT_EQ(2u, scenes.size());
+    EXPECT_EQ("4224 gov on", scenes[0].name);
+    EXPECT_EQ("4224 gov off", scenes[1].name);
+}
+
+TEST_F(HostExecutorTest, MergedConfigurationAndGroupLevelsReachTheirNodes) {
+    const int tags[] = {5, 8, 17, 20};
+    const int values[] = {1804800, 600000000, 60000, 0};
+    ASSERT_EQ(0, mExecutor->doPerfSetConfig(2, 4, tags, values));
+    EXPECT_EQ("1804800", node("cpu.big.max"));
+    EXPECT_EQ("600000000", node("gpu.max"));
+    EXPECT_EQ("60000", node("ipa.switch_temp"));
+    EXPECT_EQ("0", node("sched.fork_on_big"));
+
+    const int groups[] = {51, 53, 58};
+    const int levels[] = {10, -100, -20};
+    ASSERT_EQ(0, mExecutor->doSchedLevelAction(3, groups, levels));
+    EXPECT_EQ("10", node("sched.group.boost"));
+    EXPECT_EQ("0", node("sched.group.top_app"));  // -100: nothing requested, baseline
+    EXPECT_EQ("-20", node("sched.group.background"));
+
+    const int bad[] = {49};
+    EXPECT_EQ(-1, mExecutor->doSchedLevelAction(1, bad, levels));
+    const int readOnly[] = {24};
+    EXPECT_EQ(-1, mExecutor->doPerfSetConfig(1, 1, readOnly, values));
+}
+
+TEST_F(HostExecutorTest, QueriesReadTheNodes) {
+    const int tags[] = {22, 24, 26, 5, 53, 999};
+    int values[] = {-1, -1, -1, -1, -1, -1};
+    EXPECT_EQ(-1, mExecutor->doPerfGetConfig(6, tags, values));  // 999 has no node
+    EXPECT_EQ(1804800, values[0]);
+    EXPECT_EQ(2841600, values[1]);
+    EXPECT_EQ(900000000, values[2]);
+    EXPECT_EQ(2841600, values[3]);
+    EXPECT_EQ(0, values[4]);
+    EXPECT_EQ(-1, values[5]);
+}
+
+TEST_F(HostExecutorTest, ProbeBoostLastsWhileAnyThreadIsBoosted) {
+    const Action probe = action(4116, 100, {1, 1209600});
+    ASSERT_EQ(0, mExecutor->setProbeTid(2133, 0));
+    ASSERT_EQ(0, apply(probe, 0));
+    ASSERT_EQ(0, mExecutor->setProbeTid(2140, 0));
+    ASSERT_EQ(0, apply(probe, 0));
+    EXPECT_EQ("2140", node("probe.tid"));
+    EXPECT_EQ("2", node("probe.threads"));
+    EXPECT_EQ("1209600", node("cpu.little.min"));
+    ASSERT_EQ(0, mExecutor->setProbeTid(2140, -1));
+    ASSERT_EQ(0, apply(probe, -1));
+    EXPECT_EQ("1209600", node("cpu.little.min"));
+    EXPECT_EQ("1", node("probe.threads"));
+    ASSERT_EQ(0, mExecutor->setProbeTid(2133, -1));
+    ASSERT_EQ(0, apply(probe, -1));
+    EXPECT_EQ("300000", node("cpu.little.min"));
+    EXPECT_EQ("0", node("probe.tid"));
+    EXPECT_EQ(0u, mExecutor->boostedThreads());
+}
+
+TEST(HostExecutorRealTime, TimerThreadRevertsWithoutAnyCaller) {
+    HostClock clock;
+    clock.setRealTime(50.0);  // 1000 trace ms in 20 real ms
+    Timeline timeline(clock);
+    NodeMap nodes;
+    DeviceTree tree(nodes, timeline);
+    tree.setRoot(hosttest::makeScratchDir("realtime"));
+    ASSERT_EQ(0, tree.seed());
+    HostExecutor executor(nodes, tree, clock, timeline);
+    Action boost;
+    boost.mCmdId = 4099;
+    boost.mDuration = 1000;
+    boost.mParamNum = 1;
+    boost.mTagValues = {7, 500000000};
+    const int on = 0;
+    ASSERT_EQ(0, executor.doAction(&boost, 1, &on));
+    // Generous bound: the revert is due after 20 ms real.
+    std::string gpuMin;
+    for (int i = 0; i < 200; ++i) {
+        ASSERT_TRUE(tree.read("gpu.min", &gpuMin));
+        if (gpuMin == "257000000") break;
+        usleep(10000);
+    }
+    EXPECT_EQ("257000000", gpuMin);
+    EXPECT_FALSE(executor.timedActionPending(4099));
+}
+
+}  // namespace
+}  // namespace velmora

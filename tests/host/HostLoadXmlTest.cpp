@@ -1,0 +1,133 @@
+// The configuration vocabulary: what the host loader makes of XML parameter elements, as the
+// server's parser will see it, and what it logs for anything it does not understand.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <memory>
+
+#include "config/VelmoraLoadXml.h"
+#include "config/VelmoraParser.h"
+#include "host/HostEnvironment.h"
+#include "tests/fakes/LogCapture.h"
+#include "tests/host/HostTestSupport.h"
+
+namespace velmora {
+namespace {
+
+using fake::LogCapture;
+
+class HostLoadXmlTest : public testing::Test {
+protected:
+    void SetUp() override {
+        HostEnvironment::get().reset();
+        HostEnvironment::get().properties().unset("ro.build.version.incremental");
+        mDir = hosttest::makeScratchDir("loadxml");
+        mkdir((mDir + "/xml").c_str(), 0755);
+        HostEnvironment::get().properties().setConfigDirs({mDir + "/missing", mDir});
+        LogCapture::start();
+    }
+    void TearDown() override { VelmoraParser::deleteActionMap(mMap); }
+
+    // Loads `commands` through the library's loader and the host conversion.
+    ActionMap* load(const std::string& commands) {
+        hosttest::writeFile(mDir + "/xml/velmora_config_cust.xml",
+                            "<policy>" + commands + "</policy>");
+        std::unique_ptr<VelmoraLoadXml> loader(createVelmoraLoadXml());
+        mMap = loader->loadXmlMap();
+        return mMap;
+    }
+    const Action* first(int cmdId) {
+        auto it = mMap->find(cmdId);
+        return it == mMap->end() ? nullptr : it->second->mNext;
+    }
+
+    std::string mDir;
+    ActionMap* mMap = nullptr;
+};
+
+TEST_F(HostLoadXmlTest, NamedParametersBecomeTagPairs) {
+    ASSERT_NE(nullptr, load(R"(<cmd id="4099" name="cold"><act type="1">
+        <duration>1500</duration><little_min>1804800</little_min><big_max>2419200</big_max>
+        <gpu_min>500</gpu_min><ddr_min>800</ddr_min><ipa_control_temp>80000</ipa_control_temp>
+        <fork_on_big>1</fork_on_big><group_key_background>-10</group_key_background>
+        <priority>150</priority><tag_33>7</tag_33></act></cmd>)"));
+    const Action* action = first(4099);
+    ASSERT_NE(nullptr, action);
+    EXPECT_EQ("cold", action->mName);
+    EXPECT_EQ(1500, action->mDuration);
+    EXPECT_EQ(9, action->mParamNum);
+    EXPECT_EQ((std::vector<int32_t>{1, 1804800, 5, 2419200, 7, 500, 10, 800, 18, 80000, 20, 1,
+                                    57, -10, 101, 150, 33, 7}),
+              action->mTagValues);
+    EXPECT_TRUE(action->mParams.empty());
+    // The head stands for the command and carries no parameters.
+    EXPECT_EQ(0, mMap->at(4099)->mParamNum);
+    EXPECT_EQ(-1, mMap->at(4099)->mDuration);
+}
+
+TEST_F(HostLoadXmlTest, GovernorScenesAndMemoryLatencyKeepStringPairs) {
+    ASSERT_NE(nullptr, load(R"(
+        <cmd id="4230" name="gov"><act><priority>40</priority><duration>0</duration>
+            <gpu_governor>performance</gpu_governor><big_max>1804800</big_max></act></cmd>
+        <cmd id="20481" name="memlat"><act><mem_latency_ratio_b>0.6</mem_latency_ratio_b>
+            </act></cmd>)"));
+    const Action* gov = first(4230);
+    ASSERT_NE(nullptr, gov);
+    EXPECT_EQ(3, gov->mParamNum);
+    EXPECT_EQ((std::vector<std::string>{"priority", "40", "gpu_governor", "performance",
+                                        "big_max", "1804800"}),
+              gov->mParams);
+    EXPECT_TRUE(gov->mTagValues.empty());
+    EXPECT_EQ((std::vector<std::string>{"mem_latency_ratio_b", "0.6"}), first(20481)->mParams);
+}
+
+TEST_F(HostLoadXmlTest, EveryActionElementBecomesOneRecordInOrder) {
+    ASSERT_NE(nullptr, load(R"(<cmd id="4100"><a><duration>10</duration></a>
+        <a><duration>20</duration></a><a/></cmd>)"));
+    const Action* action = first(4100);
+    ASSERT_NE(nullptr, action);
+    ASSERT_NE(nullptr, action->mNext);
+    ASSERT_NE(nullptr, action->mNext->mNext);
+    EXPECT_EQ(10, action->mDuration);
+    EXPECT_EQ(20, action->mNext->mDuration);
+    EXPECT_EQ(0, action->mNext->mNext->mDuration);  // no duration element: 0
+    EXPECT_EQ("unknown", action->mName);
+}
+
+// Parameters the vocabulary does not know are left out, each with a log line naming the
+// command and the element; the rest of the action survives.
+TEST_F(HostLoadXmlTest, NotUnderstoodParametersAreLoggedAndLeftOut) {
+    ASSERT_NE(nullptr, load(R"(<cmd id="4101" name="scroll"><act>
+        <duration>soon</duration><group_top_app>20</group_top_app><turbo>1</turbo>
+        <little_min>1.5GHz</little_min><tag_x>3</tag_x></act></cmd>
+        <cmd id="4300" name="gov"><act><warp_drive>on</warp_drive></act></cmd>)"));
+    const Action* action = first(4101);
+    ASSERT_NE(nullptr, action);
+    EXPECT_EQ((std::vector<int32_t>{53, 20}), action->mTagValues);
+    EXPECT_EQ(0, action->mDuration);
+    EXPECT_TRUE(first(4300)->mParams.empty());
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
+                                "config: cmdId=4101 (scroll): duration 'soon' is not an "
+                                "integer, ignored"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
+                                "config: cmdId=4101 (scroll): unknown parameter <turbo>, ignored"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
+                                "config: cmdId=4101 (scroll): <little_min> value '1.5GHz' is not "
+                                "an integer, ignored"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
+                                "config: cmdId=4101 (scroll): unknown parameter <tag_x>, ignored"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
+                                "config: cmdId=4300 (gov): unknown parameter <warp_drive>, "
+                                "ignored"));
+}
+
+TEST_F(HostLoadXmlTest, MissingConfigurationInEveryDirectoryFailsTheLoad) {
+    HostEnvironment::get().properties().setConfigDirs({mDir + "/missing"});
+    std::unique_ptr<VelmoraLoadXml> loader(createVelmoraLoadXml());
+    EXPECT_EQ(nullptr, loader->loadXmlMap());
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
+                                "velmora_config_cust.xml is not exit or file is invalid!"));
+}
+
+}  // namespace
+}  // namespace velmora

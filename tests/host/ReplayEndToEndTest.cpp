@@ -1,0 +1,245 @@
+// End to end: the example minute of device use replayed through the server on the host layer,
+// in virtual time on a fresh simulated device. Asserts what the device nodes ended at and went
+// through, the report lines of the device event log, and the timeline file.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstring>
+
+#include "host/HostEnvironment.h"
+#include "tests/host/HostTestSupport.h"
+#include "tools/replay/ReplaySession.h"
+
+namespace velmora {
+namespace {
+
+// A minimal JSON syntax check: true when `text` is one JSON value and nothing else.
+class JsonChecker {
+public:
+    explicit JsonChecker(const std::string& text) : mText(text) {}
+    bool valid() {
+        skip();
+        if (!value()) return false;
+        skip();
+        return mPos == mText.size();
+    }
+
+private:
+    void skip() {
+        while (mPos < mText.size() && isspace(static_cast<unsigned char>(mText[mPos]))) ++mPos;
+    }
+    bool eat(char c) {
+        skip();
+        if (mPos < mText.size() && mText[mPos] == c) {
+            ++mPos;
+            return true;
+        }
+        return false;
+    }
+    bool string() {
+        if (!eat('"')) return false;
+        while (mPos < mText.size() && mText[mPos] != '"') {
+            if (static_cast<unsigned char>(mText[mPos]) < 0x20) return false;
+            mPos += mText[mPos] == '\\' ? 2 : 1;
+        }
+        return eat('"');
+    }
+    bool number() {
+        const size_t start = mPos;
+        while (mPos < mText.size() && strchr("+-0123456789.eE", mText[mPos]) != nullptr) ++mPos;
+        return mPos > start;
+    }
+    bool value() {
+        skip();
+        if (mPos >= mText.size()) return false;
+        const char c = mText[mPos];
+        if (c == '{') return sequence('{', '}', true);
+        if (c == '[') return sequence('[', ']', false);
+        if (c == '"') return string();
+        for (const char* word : {"true", "false", "null"}) {
+            if (mText.compare(mPos, strlen(word), word) == 0) {
+                mPos += strlen(word);
+                return true;
+            }
+        }
+        return number();
+    }
+    bool sequence(char open, char close, bool object) {
+        eat(open);
+        if (eat(close)) return true;
+        do {
+            if (object && (!string() || !eat(':'))) return false;
+            if (!value()) return false;
+        } while (eat(','));
+        return eat(close);
+    }
+    const std::string& mText;
+    size_t mPos = 0;
+};
+
+class ReplayEndToEndTest : public testing::Test {
+protected:
+    static void SetUpTestSuite() {
+        sDir = new std::string(hosttest::makeScratchDir("replay"));
+        ReplayOptions options;
+        options.tracePath = std::string(VELMORA_SOURCE_DIR) + "/examples/minute.trace";
+        options.fast = true;
+        options.quiet = true;
+        options.deviceRoot = *sDir + "/device";
+        options.timelinePath = *sDir + "/timeline.json";
+        options.eventLogPath = *sDir + "/events.log";
+        FILE* out = fopen((*sDir + "/stdout.txt").c_str(), "w");
+        ReplaySession session(options, out, stderr);
+        sResult = session.run();
+        sFailedCalls = session.failedCalls();
+        fclose(out);
+    }
+    static void TearDownTestSuite() { delete sDir; }
+
+    static std::string node(const std::string& key) {
+        return hosttest::readFile(HostEnvironment::get().device().pathOf(key));
+    }
+    static const Timeline::NodeSummary* summaryOf(const std::string& key) {
+        static std::vector<Timeline::NodeSummary> summary;
+        summary = HostEnvironment::get().timeline().summary();
+        for (const auto& s : summary) {
+            if (s.key == key) return &s;
+        }
+        return nullptr;
+    }
+
+    static std::string* sDir;
+    static int sResult;
+    static int sFailedCalls;
+};
+
+std::string* ReplayEndToEndTest::sDir = nullptr;
+int ReplayEndToEndTest::sResult = -1;
+int ReplayEndToEndTest::sFailedCalls = -1;
+
+TEST_F(ReplayEndToEndTest, EveryHostCallSucceeds) {
+    EXPECT_EQ(ReplaySession::kOk, sResult);
+    EXPECT_EQ(0, sFailedCalls);
+    const std::string out = hosttest::readFile(*sDir + "/stdout.txt");
+    EXPECT_NE(std::string::npos, out.find("init -> 0"));
+    EXPECT_NE(std::string::npos, out.find("cpu.big.max"));
+}
+
+// Client caps and event limits reach the cpufreq and devfreq nodes through the frequency
+// manager's merge; at the end only ZOLA's big-cluster cap remains.
+TEST_F(ReplayEndToEndTest, FrequencyLimitsReachedTheNodesAndWereReleased) {
+    EXPECT_EQ("2419200", node("cpu.big.max"));
+    EXPECT_EQ("1804800", node("cpu.little.max"));
+    EXPECT_EQ("900000000", node("gpu.max"));
+    EXPECT_EQ("300000", node("cpu.little.min"));
+    EXPECT_EQ("65000", node("ipa.switch_temp"));
+    const auto* bigMax = summaryOf("cpu.big.max");
+    ASSERT_NE(nullptr, bigMax);
+    EXPECT_EQ(1804800, bigMax->min);  // thermal cap and battery saver
+    const auto* littleMax = summaryOf("cpu.little.max");
+    ASSERT_NE(nullptr, littleMax);
+    EXPECT_EQ(1401600, littleMax->min);
+    const auto* switchTemp = summaryOf("ipa.switch_temp");
+    ASSERT_NE(nullptr, switchTemp);
+    EXPECT_EQ(60000, switchTemp->min);
+    const auto* ddr = summaryOf("ddr.min");
+    ASSERT_NE(nullptr, ddr);
+    EXPECT_EQ(800000000, ddr->max);  // tag 10 of the touch floor, left to the platform
+}
+
+// The 5376 defaults, the scroll and ZOLA events and KX's step all end up in the group nodes.
+TEST_F(ReplayEndToEndTest, GroupLevelsFollowDefaultsEventsAndClients) {
+    EXPECT_EQ("-10", node("sched.group.top_app"));  // KX lowered it below the default 10
+    EXPECT_EQ("10", node("sched.group.vip"));       // 4113 restored the ZOLA level
+    EXPECT_EQ("-20", node("sched.group.background"));
+    EXPECT_EQ("-20", node("sched.group.system_background"));
+    const auto* topApp = summaryOf("sched.group.top_app");
+    ASSERT_NE(nullptr, topApp);
+    EXPECT_EQ(30, topApp->max);  // first ZOLA level event
+}
+
+TEST_F(ReplayEndToEndTest, ScenesAndTimedBoostsWereAppliedAndUndone) {
+    EXPECT_EQ("schedutil", node("cpu.big.governor"));
+    EXPECT_EQ("simple_ondemand", node("gpu.governor"));
+    EXPECT_EQ("0", node("sched.fork_on_big"));
+    EXPECT_EQ("1", node("memlat.ratio_b"));
+    const auto scenes = HostEnvironment::get().timeline().instants("scene");
+    std::vector<std::string> names;
+    for (const auto& s : scenes) names.push_back(s.name);
+    for (const char* expected : {"4118 video_playback on", "4118 video_playback off",
+                                 "4119 game on", "4119 game off", "4224 game_big_performance on",
+                                 "4230 game_gpu_performance off"}) {
+        EXPECT_NE(names.end(), std::find(names.begin(), names.end(), expected)) << expected;
+    }
+    const auto actions = HostEnvironment::get().timeline().instants("action");
+    ASSERT_FALSE(actions.empty());
+    // The launch policy answered 1200 for the cold launch.
+    EXPECT_EQ("4099 cold_launch for 1200 ms", actions.front().name);
+    EXPECT_EQ(1000000, actions.front().us);
+}
+
+// The thermal client's caps start, continue and end a limiting period; ZOLA starts another.
+TEST_F(ReplayEndToEndTest, ReportLinesWentToTheEventLogAndTimeline) {
+    const auto lines = HostEnvironment::get().eventLog().lines();
+    ASSERT_EQ(4u, lines.size());
+    const char* tails[] = {",1,1497,2016,700000,4>", ",3,1401,1804,600000,4>",
+                           ",2,-1,-1,-1,0>", ",1,,2419,,1>"};
+    for (size_t i = 0; i < lines.size(); ++i) {
+        EXPECT_EQ(0u, lines[i].find("#ARG1:<")) << lines[i];
+        EXPECT_EQ(lines[i].size() - strlen(tails[i]), lines[i].rfind(tails[i])) << lines[i];
+    }
+    const std::string file = hosttest::readFile(*sDir + "/events.log");
+    EXPECT_NE(std::string::npos, file.find("25.000 prio=3 tag=361 #ARG1:<"));
+    EXPECT_EQ(4u, HostEnvironment::get().timeline().instants("report").size());
+}
+
+TEST_F(ReplayEndToEndTest, TimelineIsChromeJsonWithTheExpectedTracks) {
+    const std::string json = hosttest::readFile(*sDir + "/timeline.json");
+    EXPECT_TRUE(JsonChecker(json).valid());
+    EXPECT_EQ(0u, json.find("{\"displayTimeUnit\":\"ms\",\"traceEvents\":["));
+    for (const auto& node : HostEnvironment::get().nodeMap().nodes()) {
+        if (node.kind == NodeKind::Text) continue;
+        EXPECT_NE(std::string::npos, json.find("{\"name\":\"" + node.key + "\",\"ph\":\"C\""))
+            << node.key;
+    }
+    EXPECT_NE(std::string::npos, json.find("\"cat\":\"report\",\"ph\":\"i\""));
+    EXPECT_NE(std::string::npos, json.find("{\"name\":\"4119 game on\",\"cat\":\"scene\""));
+    EXPECT_NE(std::string::npos, json.find("\"name\":\"cpu.big.governor=performance\""));
+}
+
+TEST(ReplaySessionTest, BadTraceOrMissingConfigurationStopsBeforeAnyCall) {
+    const std::string dir = hosttest::makeScratchDir("badtrace");
+    hosttest::writeFile(dir + "/t.trace", "event 4099 0\n@100 setconfig 1 2=x\n");
+    ReplayOptions options;
+    options.tracePath = dir + "/t.trace";
+    options.fast = true;
+    options.timelinePath = dir + "/timeline.json";
+    options.eventLogPath = dir + "/events.log";
+    FILE* err = tmpfile();
+    ReplaySession bad(options, stdout, err);
+    EXPECT_EQ(ReplaySession::kBadInput, bad.run());
+    EXPECT_EQ(0, bad.calls());
+    rewind(err);
+    char message[256] = {0};
+    ASSERT_NE(nullptr, fgets(message, sizeof(message), err));
+    EXPECT_EQ("velmora-replay: " + dir + "/t.trace:2: malformed number 'x' for value\n",
+              std::string(message));
+    fclose(err);
+
+    // A good trace whose directory holds no configuration.
+    hosttest::writeFile(dir + "/t.trace", "event 4099 0\n");
+    ReplaySession noConfig(options, stdout, stderr);
+    EXPECT_EQ(ReplaySession::kBadInput, noConfig.run());
+    EXPECT_EQ(0, noConfig.calls());
+}
+
+TEST(JsonCheckerTest, RejectsBrokenJson) {
+    EXPECT_TRUE(JsonChecker("{\"a\":[1,-2.5e3,\"x\\\"\",true,null,{}]}").valid());
+    EXPECT_FALSE(JsonChecker("{\"a\":[1,2}").valid());
+    EXPECT_FALSE(JsonChecker("{\"a\":1,}").valid());
+    EXPECT_FALSE(JsonChecker("{\"a\":\"line\nbreak\"}").valid());
+}
+
+}  // namespace
+}  // namespace velmora
