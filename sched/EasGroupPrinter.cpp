@@ -25,16 +25,14 @@ constexpr GroupLabel kEasLabels[] = {
     {VELMORA_TAG_GROUP_BACKGROUND, "background,       "},
 };
 
-void printGroup(const std::map<int, int>& table, const GroupLabel& group,
-                android::String8& out) {
+void printGroup(const std::map<int, int>& table, const GroupLabel& group, android::String8& out) {
     const auto it = table.find(group.tag);
     out.appendFormat("group=%s value=%d\n", group.label, it != table.end() ? it->second : 0);
 }
 
 }  // namespace
 
-void EasGroupPrinter::print(const std::map<int, int>& table, bool hmpMode,
-                            android::String8& out) {
+void EasGroupPrinter::print(const std::map<int, int>& table, bool hmpMode, android::String8& out) {
     if (hmpMode) {
         printGroup(table, kHmpLabel, out);
         return;

@@ -122,8 +122,8 @@ int SchedLevelManager::getIndex(int level) {
     return -1;
 }
 
-int SchedLevelManager::initDefaultSchedLevel(int tagLen, const std::vector<int>& tags,
-                                             int* groups, int* levels) {
+int SchedLevelManager::initDefaultSchedLevel(int tagLen, const std::vector<int>& tags, int* groups,
+                                             int* levels) {
     if (static_cast<size_t>(std::max(tagLen, 0)) * 2 > tags.size()) {
         VLOGE("init default group failed! %d pairs announced, %zu values given", tagLen,
               tags.size());
@@ -174,8 +174,8 @@ int SchedLevelManager::doEventSchedLevel(const Action* action) {
     }
     const int pairNum = action->mParamNum;
     if (pairNum < 1 || pairNum > kMaxGroupNum) {
-        VLOGD("cmdId(%d) (duration=0): group num is invalid, max group num is %d!",
-              action->mCmdId, kMaxGroupNum);
+        VLOGD("cmdId(%d) (duration=0): group num is invalid, max group num is %d!", action->mCmdId,
+              kMaxGroupNum);
         return -1;
     }
     if (pairCount(*action) != pairNum) {

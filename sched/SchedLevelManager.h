@@ -80,8 +80,8 @@ public:
     // Records the defaults of command 5376 (`tags` holds its pairs interleaved) into the
     // default table and the three client tables, and reports them in `groups`/`levels`.
     // 0, or -1 on a shape that is neither one hmp pair nor eight EAS pairs (nothing changed).
-    int initDefaultSchedLevel(int tagLen, const std::vector<int>& tags, int* groups,
-                              int* levels) REQUIRES(mLock);
+    int initDefaultSchedLevel(int tagLen, const std::vector<int>& tags, int* groups, int* levels)
+        REQUIRES(mLock);
 
     // Applies an event to the ZOLA event tables and copies changed groups into the ZOLA table.
     // 1 when the ZOLA table changed, else 0.

@@ -48,9 +48,8 @@ TEST_F(SchedLevelManagerDumpTest, FreshManagerDumpsFiveBlocksOfZeros) {
         "group=key-background,    value=0\n"
         "group=system-background, value=0\n"
         "group=background,        value=0\n";
-    EXPECT_EQ(dump(), "default eas group value is:\n" + zeros +
-                          "current eas group value is:\n" + zeros +
-                          "KX set eas group value is:\n" + zeros +
+    EXPECT_EQ(dump(), "default eas group value is:\n" + zeros + "current eas group value is:\n" +
+                          zeros + "KX set eas group value is:\n" + zeros +
                           "JN set eas group value is:\n" + zeros +
                           "ZOLA set eas group value is:\n" + zeros);
 }
@@ -103,9 +102,8 @@ TEST_F(SchedLevelManagerDumpTest, ClientTablesShowTheirOwnRequests) {
     ASSERT_EQ(mManager.doPerfSetSchedLevel(1, 1, &kx[0], &kx[1]), 0);
     const int jn[] = {42, 8 * 65536 + 40};  // background at 20, above its default
     ASSERT_EQ(mManager.doPerfSetSchedLevel(2, 1, &jn[0], &jn[1]), 0);
-    EXPECT_EQ(dump(), easDump(easLevels(10), easLevels(10, {{53, -10}}),
-                              easLevels(10, {{53, -10}}), easLevels(10, {{58, 20}}),
-                              easLevels(10)));
+    EXPECT_EQ(dump(), easDump(easLevels(10), easLevels(10, {{53, -10}}), easLevels(10, {{53, -10}}),
+                              easLevels(10, {{58, 20}}), easLevels(10)));
 }
 
 TEST_F(SchedLevelManagerDumpTest, PlatformFailureLeavesTheDumpAsItWas) {

@@ -56,9 +56,10 @@ protected:
 
     Tables snapshot() {
         android::Mutex::Autolock lock(mManager.mLock);
-        return {mManager.mDefaultLevelMap, mManager.mCurrentLevelMap, mManager.mKxLevelMap,
-                mManager.mJnLevelMap,      mManager.mZolaLevelMap,    mManager.mZolaFirstEventMap,
-                mManager.mZolaEventMap,    mManager.mZolaFirstEventSeen, mManager.mHmpMode};
+        return {
+            mManager.mDefaultLevelMap, mManager.mCurrentLevelMap,    mManager.mKxLevelMap,
+            mManager.mJnLevelMap,      mManager.mZolaLevelMap,       mManager.mZolaFirstEventMap,
+            mManager.mZolaEventMap,    mManager.mZolaFirstEventSeen, mManager.mHmpMode};
     }
 
     int event(int cmdId, const std::vector<int>& pairs) {
@@ -74,8 +75,8 @@ protected:
     }
 
     int request(int clientId, const std::vector<int>& tags, const std::vector<int>& configs) {
-        return mManager.doPerfSetSchedLevel(clientId, static_cast<int>(tags.size()),
-                                            tags.data(), configs.data());
+        return mManager.doPerfSetSchedLevel(clientId, static_cast<int>(tags.size()), tags.data(),
+                                            configs.data());
     }
 
     // Groups and levels of the only doSchedLevelAction call so far, as one table.
@@ -116,6 +117,7 @@ TEST_P(SchedDecodeTest, DecodesPackedValue) {
     EXPECT_EQ(mManager.getSchedLevel(GetParam().config), GetParam().level);
 }
 
+// clang-format off
 INSTANTIATE_TEST_SUITE_P(
     Rows, SchedDecodeTest,
     ::testing::Values(DecodeRow{3 * 65536 + 10, 3, -10},  // top-app at -10
@@ -131,6 +133,7 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST_F(SchedLevelManagerTest, IndexOnTheScale) {
     EXPECT_EQ(mManager.getIndex(-20), 0);
+    // clang-format on
     EXPECT_EQ(mManager.getIndex(0), 2);
     EXPECT_EQ(mManager.getIndex(40), 6);
     EXPECT_EQ(mManager.getIndex(5), -1);
@@ -250,6 +253,7 @@ std::vector<int> withPair(std::vector<int> pairs, size_t index, int tag) {
     return pairs;
 }
 
+// clang-format off
 INSTANTIATE_TEST_SUITE_P(
     Rows, SchedRejectedEventTest,
     ::testing::Values(
@@ -282,6 +286,7 @@ INSTANTIATE_TEST_SUITE_P(
         RejectedEventRow{"DefaultsNinePairs", 5376, nineEasPairs(), -1, ANDROID_LOG_DEBUG,
                          "cmdId(5376) (duration=0): group num is invalid, max group num is 8!"}),
     [](const ::testing::TestParamInfo<RejectedEventRow>& info) { return info.param.name; });
+// clang-format on
 
 TEST_F(SchedLevelManagerTest, NullActionIsRejected) {
     EXPECT_EQ(mManager.doEventSchedLevel(nullptr), -1);
@@ -390,6 +395,7 @@ TEST_P(SchedMergeTest, MergesGroupLevels) {
     EXPECT_EQ(snapshot().current[53], row.expected);
 }
 
+// clang-format off
 INSTANTIATE_TEST_SUITE_P(
     Rows, SchedMergeTest,
     ::testing::Values(
@@ -403,6 +409,7 @@ INSTANTIATE_TEST_SUITE_P(
         MergeRow{"UnsetZolaPassesThrough", 0, 10, 10, -100, -100},
         MergeRow{"JnAloneLowers", 10, 20, 0, 40, 0}),
     [](const ::testing::TestParamInfo<MergeRow>& info) { return info.param.name; });
+// clang-format on
 
 TEST_F(SchedLevelManagerTest, DirectHandOverReportsFailureOnceAndKeepsTheMerge) {
     mExecutor.setResult(Op::SchedLevel, kFailed);
@@ -539,6 +546,7 @@ TEST_P(SchedStepTest, MovesOneStepCappedByTheDefault) {
     EXPECT_EQ(table[53], row.expected);
 }
 
+// clang-format off
 INSTANTIATE_TEST_SUITE_P(
     Rows, SchedStepTest,
     ::testing::Values(StepRow{"UpToTheDefault", 0, 40, +1, 0},
@@ -550,6 +558,7 @@ INSTANTIATE_TEST_SUITE_P(
                       StepRow{"OffScaleUpGoesToTheBottom", 0, 25, +1, -20},
                       StepRow{"OffScaleDownGoesToTheBottom", 0, 25, -1, -20}),
     [](const ::testing::TestParamInfo<StepRow>& info) { return info.param.name; });
+// clang-format on
 
 TEST_F(SchedLevelManagerTest, PairsBeforeABadValueStayAndAreSentLater) {
     easDefaults();
@@ -565,8 +574,7 @@ TEST_F(SchedLevelManagerTest, PairsBeforeABadValueStayAndAreSentLater) {
 TEST_F(SchedLevelManagerTest, InvalidClientIdTakesNoLock) {
     mManager.mLock.lock();
     auto pending = std::async(std::launch::async, [this] { return request(4, {42}, {20}); });
-    const bool finished =
-        pending.wait_for(std::chrono::seconds(5)) == std::future_status::ready;
+    const bool finished = pending.wait_for(std::chrono::seconds(5)) == std::future_status::ready;
     mManager.mLock.unlock();
     EXPECT_TRUE(finished);
     EXPECT_EQ(pending.get(), -1);
@@ -617,6 +625,7 @@ std::vector<int> repeated(int value, int n) {
     return std::vector<int>(static_cast<size_t>(n), value);
 }
 
+// clang-format off
 INSTANTIATE_TEST_SUITE_P(
     Rows, SchedRejectedRequestTest,
     ::testing::Values(
@@ -662,6 +671,7 @@ INSTANTIATE_TEST_SUITE_P(
                            {packLevel(3, -10), 3 * 65536 + 61}, ANDROID_LOG_DEBUG,
                            "invalid sched Level(196669), clientId(1)", KxAfter::Top53AtMinus10}),
     [](const ::testing::TestParamInfo<RejectedRequestRow>& info) { return info.param.name; });
+// clang-format on
 
 TEST_F(SchedLevelManagerTest, FailedRequestIsRolledBackAndLoggedTwice) {
     easDefaults();

@@ -123,14 +123,14 @@ TEST_P(ServerSchedBadDefaultsTest, InitFailsAndReleasesEverything) {
 std::string easXml(const std::string& replaceFourth = "") {
     std::string xml;
     for (int tag = 51; tag <= 58; ++tag) {
-        const std::string name = tag == 54 && !replaceFourth.empty()
-                                     ? replaceFourth
-                                     : "t" + std::to_string(tag);
+        const std::string name =
+            tag == 54 && !replaceFourth.empty() ? replaceFourth : "t" + std::to_string(tag);
         xml += "<" + name + ">0</" + name + ">";
     }
     return xml;
 }
 
+// clang-format off
 INSTANTIATE_TEST_SUITE_P(
     Rows, ServerSchedBadDefaultsTest,
     ::testing::Values(
@@ -148,6 +148,7 @@ INSTANTIATE_TEST_SUITE_P(
                        "cmdId(5376) (duration=0) does not support other tags except sched "
                        "level!"}),
     [](const ::testing::TestParamInfo<BadDefaultsRow>& info) { return info.param.name; });
+// clang-format on
 
 // ---- Duration-0 events ----
 
@@ -176,9 +177,9 @@ TEST_F(ServerSchedTest, SceneLeaveRestoresOnlyWhatTheSceneEnterSet) {
 TEST_F(ServerSchedTest, RejectedOrFailedEventIsReportedAsActionFailure) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
     EXPECT_EQ(mServer->velmoraEvent(4501, "", 0, nullptr), 3);
-    EXPECT_TRUE(LogCapture::has(
-        ANDROID_LOG_DEBUG, "cmdId(4501) (duration=0) does not support other tags except sched "
-                           "level!"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_DEBUG,
+                                "cmdId(4501) (duration=0) does not support other tags except sched "
+                                "level!"));
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4501"));
 
     const std::string before = easDumpText();
@@ -199,15 +200,14 @@ TEST_F(ServerSchedTest, ClientRequestsMergeAcrossClients) {
     ASSERT_EQ(sent().size(), 3u);
     // Top-app: the lowest client wins. Foreground: KX above the default has no say, ZOLA does.
     EXPECT_EQ(sent()[2].values, std::vector<int>({0, 0, -20, 0, 30, 0, 0, 0}));
-    EXPECT_TRUE(LogCapture::has(
-        ANDROID_LOG_INFO, "setConfig clientId=1, tagLen=2, tags[1]=42, configs[1]=" +
-                              std::to_string(packLevel(5, 20))));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO,
+                                "setConfig clientId=1, tagLen=2, tags[1]=42, configs[1]=" +
+                                    std::to_string(packLevel(5, 20))));
 
-    EXPECT_EQ(easDumpText(),
-              easDump(easLevels(0), easLevels(0, {{53, -20}, {55, 30}}),
-                      easLevels(0, {{53, -10}, {55, 20}}), easLevels(0, {{53, -20}}),
-                      easLevels(0, {{55, 30}})) +
-                  "\n");
+    EXPECT_EQ(easDumpText(), easDump(easLevels(0), easLevels(0, {{53, -20}, {55, 30}}),
+                                     easLevels(0, {{53, -10}, {55, 20}}), easLevels(0, {{53, -20}}),
+                                     easLevels(0, {{55, 30}})) +
+                                 "\n");
 }
 
 TEST_F(ServerSchedTest, StepAndResetOfAClient) {
