@@ -21,10 +21,10 @@ constexpr int kFirstEasGroupTag = VELMORA_TAG_GROUP_BOOST;
 constexpr int kLevelOffset = 20;
 
 constexpr int kCmdDefaultSchedLevel = 5376;
-// Scene pair of the ZOLA source: 4114 enters a scene, 4113 leaves it and may only move groups
-// still at what the first 4114 set, so it never undoes another event's later change.
-constexpr int kCmdZolaSceneEnter = 4114;
-constexpr int kCmdZolaSceneLeave = 4113;
+// The first 4114 ever seen is kept as a reference. 4113 only moves groups that still hold
+// that reference level, so it never undoes a later change made by another event.
+constexpr int kCmdZolaReference = 4114;
+constexpr int kCmdZolaFollower = 4113;
 
 constexpr int kClientKx = 1;
 constexpr int kClientJn = 2;
@@ -210,8 +210,8 @@ int SchedLevelManager::doEventSchedLevel(const Action* action) {
     updateCurrentMapLocked(&count, groups, levels);
     const int ret = sendToPlatform(count, groups, levels);
     if (ret != 0) {
-        // The first-4114 record is kept on purpose: that scene did start, even if the
-        // platform refused its levels.
+        // The 4114 reference is kept on purpose: the event did happen, even if the platform
+        // refused its levels, and a later 4113 must compare against it.
         VLOGD("doSchedLevelAction failed!");
         copyLevels(zolaBackup, mZolaLevelMap);
         copyLevels(currentBackup, mCurrentLevelMap);
@@ -222,13 +222,13 @@ int SchedLevelManager::doEventSchedLevel(const Action* action) {
 }
 
 int SchedLevelManager::updateSchedLevelMapIfNeeded(const Action* action) {
-    if (action->mCmdId == kCmdZolaSceneEnter) {
+    if (action->mCmdId == kCmdZolaReference) {
         if (!mZolaFirstEventSeen) {
             updateZolaSchedValue(action, mZolaFirstEventMap);
             mZolaFirstEventSeen = true;
         }
         updateZolaSchedValue(action, mZolaEventMap);
-    } else if (action->mCmdId == kCmdZolaSceneLeave) {
+    } else if (action->mCmdId == kCmdZolaFollower) {
         const int pairNum = pairCount(*action);
         for (int i = 0; i < pairNum; ++i) {
             const int tag = action->mTagValues[2 * i];

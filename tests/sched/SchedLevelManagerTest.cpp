@@ -337,9 +337,9 @@ TEST_F(SchedLevelManagerTest, EventOverwritesLevelsTheZolaClientSet) {
     EXPECT_EQ(onlySent(), easLevels(ZOLA_SCHED_LEVEL_NONE, {{53, 30}}));
 }
 
-TEST_F(SchedLevelManagerTest, SceneLeaveOnlyMovesGroupsStillAtTheFirstSceneEnterLevels) {
+TEST_F(SchedLevelManagerTest, FollowerOnlyMovesGroupsStillAtTheFirstReferenceLevels) {
     easDefaults();
-    ASSERT_EQ(event(4114, {53, 20}), 0);  // recorded as the first scene enter
+    ASSERT_EQ(event(4114, {53, 20}), 0);  // kept as the reference
     ASSERT_EQ(event(4500, {54, 30}), 0);  // another event moves 54 meanwhile
     mExecutor.clear();
 
@@ -348,20 +348,20 @@ TEST_F(SchedLevelManagerTest, SceneLeaveOnlyMovesGroupsStillAtTheFirstSceneEnter
     EXPECT_EQ(onlySent(), easLevels(ZOLA_SCHED_LEVEL_NONE, {{53, 0}, {54, 30}, {55, 10}}));
 }
 
-TEST_F(SchedLevelManagerTest, OnlyTheFirstSceneEnterIsRemembered) {
+TEST_F(SchedLevelManagerTest, OnlyTheFirstReferenceEventIsKept) {
     easDefaults();
     ASSERT_EQ(event(4114, {53, 20}), 0);
     ASSERT_EQ(event(4114, {53, 30}), 0);
     EXPECT_EQ(snapshot().zolaFirst, allGroups(ZOLA_SCHED_LEVEL_NONE, {{53, 20}}));
     mExecutor.clear();
 
-    // 53 now holds the second enter's level, so the leave has nothing to move.
+    // 53 now holds the second 4114's level, so 4113 has nothing to move.
     EXPECT_EQ(event(4113, {53, 0}), 0);
     EXPECT_EQ(sendCount(), 0u);
     EXPECT_EQ(snapshot().zola[53], 30);
 }
 
-TEST_F(SchedLevelManagerTest, SceneLeaveBeforeAnyEnterWritesUnsetGroups) {
+TEST_F(SchedLevelManagerTest, FollowerBeforeAnyReferenceWritesUnsetGroups) {
     easDefaults();
     EXPECT_EQ(event(4113, {53, 10}), 0);
     EXPECT_EQ(onlySent()[53], 10);
@@ -443,7 +443,7 @@ TEST_F(SchedLevelManagerTest, FailedEventIsRolledBackAndLoggedTwice) {
     EXPECT_EQ(sendCount(), 1u);
 }
 
-TEST_F(SchedLevelManagerTest, FailedFirstSceneEnterStillCountsAsRecorded) {
+TEST_F(SchedLevelManagerTest, FailedFirstReferenceEventStillCountsAsRecorded) {
     easDefaults();
     mExecutor.setResult(Op::SchedLevel, kFailed);
     ASSERT_EQ(event(4114, {53, 20}), kFailed);
@@ -452,7 +452,7 @@ TEST_F(SchedLevelManagerTest, FailedFirstSceneEnterStillCountsAsRecorded) {
     EXPECT_EQ(t.zolaFirst[53], 20);
     EXPECT_EQ(t.zolaEvent[53], ZOLA_SCHED_LEVEL_NONE);
 
-    // A second enter does not replace the record, so a leave finds 53 moved and skips it.
+    // A second 4114 does not replace the reference, so 4113 finds 53 moved and skips it.
     mExecutor.setResult(Op::SchedLevel, 0);
     ASSERT_EQ(event(4114, {53, 30}), 0);
     mExecutor.clear();

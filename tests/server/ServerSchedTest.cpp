@@ -15,11 +15,12 @@ namespace {
 const char* const kProbeCommand =
     "<cmd id=\"4116\" name=\"probe\"><act><duration>8</duration><t1>1000</t1></act></cmd>";
 
-// Duration-0 commands of the tests: two scene enter/leave events and two ordinary ones.
+// Duration-0 commands of the tests: the reference/follower pair 4114/4113, an ordinary event
+// and one with a frequency tag among its groups.
 const char* const kSchedCommands =
-    "<cmd id=\"4114\" name=\"scene_enter\"><act><duration>0</duration>"
+    "<cmd id=\"4114\" name=\"zola_reference\"><act><duration>0</duration>"
     "<t53>20</t53><t54>10</t54></act></cmd>"
-    "<cmd id=\"4113\" name=\"scene_leave\"><act><duration>0</duration>"
+    "<cmd id=\"4113\" name=\"zola_follower\"><act><duration>0</duration>"
     "<t53>0</t53><t54>0</t54></act></cmd>"
     "<cmd id=\"4500\" name=\"top_app_up\"><act><duration>0</duration><t53>30</t53></act></cmd>"
     "<cmd id=\"4501\" name=\"bad_tag\"><act><duration>0</duration><t53>30</t53><t42>1</t42>"
@@ -163,7 +164,7 @@ TEST_F(ServerSchedTest, EventReachesThePlatformOnlyWhenItChangesALevel) {
     EXPECT_EQ(sent().size(), 1u);
 }
 
-TEST_F(ServerSchedTest, SceneLeaveRestoresOnlyWhatTheSceneEnterSet) {
+TEST_F(ServerSchedTest, FollowerMovesOnlyGroupsStillAtTheReference) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
     ASSERT_EQ(mServer->velmoraEvent(4114, "", 0, nullptr), 0);  // 53 -> 20, 54 -> 10
     ASSERT_EQ(mServer->velmoraEvent(4500, "", 0, nullptr), 0);  // 53 -> 30 meanwhile
