@@ -216,8 +216,8 @@ int FreqClientManager::readMaxFreq() {
     return 0;
 }
 
-int FreqClientManager::doPerfEventConfig(int cmdId, int tagLen, const int* tags,
-                                         const int* configs, int onOff) {
+int FreqClientManager::doPerfEventConfig(int cmdId, int tagLen, const int* tags, const int* configs,
+                                         int onOff) {
     // The server never sends more; refusing keeps the fixed result array in bounds.
     if (tagLen > MAX_EVENT_TAGS) {
         VLOGE("too many tags %d, cmdId is %d", tagLen, cmdId);
@@ -255,9 +255,10 @@ int FreqClientManager::doPerfEventConfig(int cmdId, int tagLen, const int* tags,
     const int g1 = valueOr0(effective, VELMORA_TAG_GPU_MIN_FREQ);
     const int g2 = valueOr0(effective, VELMORA_TAG_GPU_MAX_FREQ);
     if (!isFreqValValid(l1, l2) || !isFreqValValid(b1, b2) || !isFreqValValid(g1, g2)) {
-        VLOGI("freq is invalid(min > freq), cmdId is %d, (l_cpu(%d,%d), b_cpu(%d, %d), "
-              "gpu(%d, %d))",
-              cmdId, l1, l2, b1, b2, g1, g2);
+        VLOGI(
+            "freq is invalid(min > freq), cmdId is %d, (l_cpu(%d,%d), b_cpu(%d, %d), "
+            "gpu(%d, %d))",
+            cmdId, l1, l2, b1, b2, g1, g2);
         return -1;
     }
     if (onOff == 0) {

@@ -96,13 +96,13 @@ public:
     // Only the constructor calls it, before the object is shared.
     void initFreqMap() NO_THREAD_SAFETY_ANALYSIS;
 
-    VelmoraPlat* mPlatPtr;  // not owned
+    VelmoraPlat* mPlatPtr;         // not owned
     std::set<int32_t> mConfigSet;  // the merged tags; fixed at construction
     // Guarded by mLock.
-    TagMap mKxConfigMap GUARDED_BY(mLock);    // raw last accepted request, -1 never set
+    TagMap mKxConfigMap GUARDED_BY(mLock);  // raw last accepted request, -1 never set
     TagMap mJnConfigMap GUARDED_BY(mLock);
     TagMap mZolaConfigMap GUARDED_BY(mLock);
-    TagMap mMinConfigMap GUARDED_BY(mLock);   // merged client value per merged tag
+    TagMap mMinConfigMap GUARDED_BY(mLock);  // merged client value per merged tag
     EventMap mLittleMinFreqMap GUARDED_BY(mLock);
     EventMap mLittleMaxFreqMap GUARDED_BY(mLock);
     EventMap mBigMinFreqMap GUARDED_BY(mLock);

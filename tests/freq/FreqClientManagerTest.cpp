@@ -87,9 +87,8 @@ TEST_P(TaskForkMinValueTest, ZeroWinsThenOne) {
 }
 INSTANTIATE_TEST_SUITE_P(Rows, TaskForkMinValueTest,
                          ::testing::Values(RuleRow{-1, -1, -1}, RuleRow{-1, 0, 0},
-                                           RuleRow{-1, 1, 1}, RuleRow{0, -1, 0},
-                                           RuleRow{0, 0, 0}, RuleRow{0, 1, 0},
-                                           RuleRow{1, -1, 1}, RuleRow{1, 0, 0},
+                                           RuleRow{-1, 1, 1}, RuleRow{0, -1, 0}, RuleRow{0, 0, 0},
+                                           RuleRow{0, 1, 0}, RuleRow{1, -1, 1}, RuleRow{1, 0, 0},
                                            RuleRow{1, 1, 1}));
 
 TEST_F(FreqManagerTest, FloorAboveCapIsTheOnlyInvalidPair) {
@@ -190,7 +189,7 @@ struct RejectRow {
     int platformResult;  // what its set-config answers
     Pairs pairs;
     int expected;
-    const char* log;     // error line expected
+    const char* log;  // error line expected
     bool reachesPlatform;
 };
 
@@ -213,12 +212,10 @@ INSTANTIATE_TEST_SUITE_P(
     Rows, FreqClientRejectTest,
     ::testing::Values(
         // A negative value anywhere stops the request before the platform.
-        RejectRow{"NegativeCap", true, 0, {{kL, 1000000}, {kB, -3}}, -1,
-                  "invalid config value(-3)", false},
-        RejectRow{"NegativePassThrough", true, 0, {{3, -1}}, -1, "invalid config value(-1)",
-                  false},
-        RejectRow{"NoExecutor", false, 0, {{kL, 1000000}}, -1, "doPerfSetConfig failed!",
-                  false},
+        RejectRow{
+            "NegativeCap", true, 0, {{kL, 1}, {kB, -3}}, -1, "invalid config value(-3)", false},
+        RejectRow{"NegativePassThrough", true, 0, {{3, -1}}, -1, "invalid config value(-1)", false},
+        RejectRow{"NoExecutor", false, 0, {{kL, 1000000}}, -1, "doPerfSetConfig failed!", false},
         // The platform's own failure is handed back as is.
         RejectRow{"PlatformFails", true, 7, {{kL, 1000000}}, 7, "doPerfSetConfig failed!", true}),
     [](const ::testing::TestParamInfo<RejectRow>& info) { return info.param.name; });
@@ -270,8 +267,8 @@ TEST_F(FreqManagerTest, TopFrequenciesAreReadOnceAndReportsFollowMergedValues) {
     const auto reads = mExec.calls(Op::GetConfig);
     ASSERT_EQ(reads.size(), 1u);
     EXPECT_EQ(reads[0].tags, (Ints{22, 24, 26}));
-    EXPECT_EQ(reportBodies(), (Strings{",1,1500,,,2>", ",3,1500,1209,,6>", ",3,1800,,,4>",
-                                       ",2,-1,-1,,0>"}));
+    EXPECT_EQ(reportBodies(),
+              (Strings{",1,1500,,,2>", ",3,1500,1209,,6>", ",3,1800,,,4>", ",2,-1,-1,,0>"}));
 }
 
 TEST_F(FreqManagerTest, FailedTopFrequencyReadIsRetriedWithoutReporting) {

@@ -48,13 +48,11 @@ protected:
             tags.push_back(p.first);
             values.push_back(p.second);
         }
-        return mgr.doPerfSetConfig(id, static_cast<int>(pairs.size()), tags.data(),
-                                   values.data(), onOff);
+        return mgr.doPerfSetConfig(id, static_cast<int>(pairs.size()), tags.data(), values.data(),
+                                   onOff);
     }
     int client(int id, const Pairs& pairs) { return send(mMgr, id, pairs, nullptr); }
-    int event(int cmdId, int onOff, const Pairs& pairs) {
-        return send(mMgr, cmdId, pairs, &onOff);
-    }
+    int event(int cmdId, int onOff, const Pairs& pairs) { return send(mMgr, cmdId, pairs, &onOff); }
     void enableUpload() {
         const int tag = VELMORA_TAG_FEATURE_SWITCH;
         const int word = FREQ_INFO_UPLOAD_BIT;
@@ -76,11 +74,19 @@ protected:
 
     Snapshot snapshot() {
         android::Mutex::Autolock lock(mMgr.mLock);
-        Snapshot s{mMgr.mKxConfigMap,      mMgr.mJnConfigMap,     mMgr.mZolaConfigMap,
-                   mMgr.mMinConfigMap,     mMgr.mLittleMinFreqMap, mMgr.mLittleMaxFreqMap,
-                   mMgr.mBigMinFreqMap,    mMgr.mBigMaxFreqMap,   mMgr.mGpuMinFreqMap,
-                   mMgr.mGpuMaxFreqMap,    {},                    mMgr.mMaxFreqRead,
-                   mMgr.mUploadEnabled};
+        Snapshot s;
+        s.kx = mMgr.mKxConfigMap;
+        s.jn = mMgr.mJnConfigMap;
+        s.zola = mMgr.mZolaConfigMap;
+        s.min = mMgr.mMinConfigMap;
+        s.littleMin = mMgr.mLittleMinFreqMap;
+        s.littleMax = mMgr.mLittleMaxFreqMap;
+        s.bigMin = mMgr.mBigMinFreqMap;
+        s.bigMax = mMgr.mBigMaxFreqMap;
+        s.gpuMin = mMgr.mGpuMinFreqMap;
+        s.gpuMax = mMgr.mGpuMaxFreqMap;
+        s.maxFreqRead = mMgr.mMaxFreqRead;
+        s.uploadEnabled = mMgr.mUploadEnabled;
         for (int i = 0; i < FreqInfoUpload::kTrackedTags; ++i) {
             s.maxFreq[i] = mMgr.mFreqInfoUpload.mMaxFreq[i];
         }

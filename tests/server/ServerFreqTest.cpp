@@ -164,10 +164,11 @@ TEST_F(ServerFreqTest, FreqListDumpShowsEachClientsRawRequest) {
     EXPECT_EQ(dump("--freqlist"),
               "KX set freq is:\ntag=little cpu max,        value=1800000\n" + rest +
                   "tag=fork on big cluster,   value=1\n"
-                  "JN set freq is:\ntag=little cpu max,        value=1200000\n" + rest +
+                  "JN set freq is:\ntag=little cpu max,        value=1200000\n" +
+                  rest +
                   "tag=fork on big cluster,   value=-1\n"
-                  "ZOLA set freq is:\ntag=little cpu max,        value=-1\n" + rest +
-                  "tag=fork on big cluster,   value=-1\n\n");
+                  "ZOLA set freq is:\ntag=little cpu max,        value=-1\n" +
+                  rest + "tag=fork on big cluster,   value=-1\n\n");
 }
 
 }  // namespace
