@@ -52,6 +52,10 @@ struct BadLine {
     const char* error;
 };
 
+void PrintTo(const BadLine& bad, std::ostream* os) {
+    *os << bad.line;
+}
+
 class TraceParserErrorTest : public testing::TestWithParam<BadLine> {};
 
 TEST_P(TraceParserErrorTest, NamesFileAndLine) {
