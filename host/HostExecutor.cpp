@@ -20,9 +20,12 @@ constexpr const char* kProbeSource = "probe";
 
 // Kind of a command as far as its lifetime goes; also the timeline category of its instants.
 const char* categoryOf(int cmdId) {
-    if (cmdId >= 4118 && cmdId <= 4352) return "scene";
-    if (cmdId >= 12288 && cmdId <= 13568) return "onoff";
-    if (cmdId == 20480 || cmdId == 20481) return "memlat";
+    if (cmdId >= 4118 && cmdId <= 4352)
+        return "scene";
+    if (cmdId >= 12288 && cmdId <= 13568)
+        return "onoff";
+    if (cmdId == 20480 || cmdId == 20481)
+        return "memlat";
     return "action";
 }
 
@@ -109,8 +112,8 @@ int HostExecutor::doAction(const Action* action, unsigned int payloadNum, const 
     const int ret = mResolver.replaceSource(source, requestsOf(*action));
     if (timed) {
         mTimers.arm(cmdId, action->mDuration);
-        mTimeline.recordInstant(category, describe(*action) + " for " +
-                                              std::to_string(action->mDuration) + " ms");
+        mTimeline.recordInstant(
+            category, describe(*action) + " for " + std::to_string(action->mDuration) + " ms");
     } else if (mApplied.count(cmdId) == 0) {
         mTimeline.recordInstant(category, describe(*action) + " on");
     }

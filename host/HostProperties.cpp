@@ -59,8 +59,8 @@ std::vector<std::string> HostProperties::configDirs() const {
 
 std::string HostProperties::findConfigFile(const std::string& suffix) const {
     for (const auto& dir : configDirs()) {
-        const std::string path = dir.empty() || dir.back() == '/' ? dir + suffix
-                                                                  : dir + "/" + suffix;
+        const std::string path =
+            dir.empty() || dir.back() == '/' ? dir + suffix : dir + "/" + suffix;
         struct stat st;
         if (stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode)) {
             return path;
@@ -76,8 +76,7 @@ extern "C" int property_get(const char* key, char* value, const char* defaultVal
         return 0;
     }
     std::string answer;
-    if (key == nullptr ||
-        !velmora::HostEnvironment::get().properties().get(key, &answer)) {
+    if (key == nullptr || !velmora::HostEnvironment::get().properties().get(key, &answer)) {
         answer = defaultValue != nullptr ? defaultValue : "";
     }
     snprintf(value, VELMORA_PROPERTY_VALUE_MAX, "%s", answer.c_str());

@@ -51,8 +51,7 @@ NodeMap::NodeMap() {
     add("ddr.min", std::string(kDdrFreq) + "min_freq", NodeKind::Floor, "200000000");
     // IPA: trip point 0 switches the governor on, trip point 1 is the control temperature.
     add("ipa.switch_temp", std::string(kThermal) + "trip_point_0_temp", NodeKind::Value, "65000");
-    add("ipa.control_temp", std::string(kThermal) + "trip_point_1_temp", NodeKind::Value,
-        "85000");
+    add("ipa.control_temp", std::string(kThermal) + "trip_point_1_temp", NodeKind::Value, "85000");
     add("ipa.sustainable_power", std::string(kThermal) + "sustainable_power", NodeKind::Value,
         "3500");
     add("sched.fork_on_big", "proc/sys/kernel/sched_fork_on_big_cluster", NodeKind::Value, "0");
@@ -120,19 +119,22 @@ int NodeMap::parse(const std::string& text, const std::string& origin, std::stri
         }
         const std::string where = origin + ":" + std::to_string(lineNo) + ": ";
         if (!(words >> path)) {
-            if (error != nullptr) *error = where + "missing path for node '" + key + "'";
+            if (error != nullptr)
+                *error = where + "missing path for node '" + key + "'";
             return -1;
         }
         words >> seed;
         if (words >> extra) {
-            if (error != nullptr) *error = where + "unexpected text '" + extra + "'";
+            if (error != nullptr)
+                *error = where + "unexpected text '" + extra + "'";
             return -1;
         }
         if (!path.empty() && path[0] == '/') {
             path.erase(0, path.find_first_not_of('/'));
         }
         if (path.empty() || path.find("..") != std::string::npos) {
-            if (error != nullptr) *error = where + "bad path for node '" + key + "'";
+            if (error != nullptr)
+                *error = where + "bad path for node '" + key + "'";
             return -1;
         }
         auto it = mNodes.begin();
@@ -140,7 +142,8 @@ int NodeMap::parse(const std::string& text, const std::string& origin, std::stri
             ++it;
         }
         if (it == mNodes.end()) {
-            if (error != nullptr) *error = where + "unknown node '" + key + "'";
+            if (error != nullptr)
+                *error = where + "unknown node '" + key + "'";
             return -1;
         }
         it->path = path;
@@ -154,7 +157,8 @@ int NodeMap::parse(const std::string& text, const std::string& origin, std::stri
 int NodeMap::load(const std::string& path, std::string* error) {
     std::ifstream file(path);
     if (!file) {
-        if (error != nullptr) *error = path + ": cannot open node map";
+        if (error != nullptr)
+            *error = path + ": cannot open node map";
         return -1;
     }
     std::stringstream content;

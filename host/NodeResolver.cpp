@@ -9,8 +9,7 @@ namespace velmora {
 
 NodeResolver::NodeResolver(const NodeMap& nodes, DeviceTree& tree) : mNodes(nodes), mTree(tree) {}
 
-int NodeResolver::set(const std::string& key, const std::string& source,
-                      const std::string& value) {
+int NodeResolver::set(const std::string& key, const std::string& source, const std::string& value) {
     mRequests[key][source] = {value, ++mSeq};
     return resolve(key);
 }

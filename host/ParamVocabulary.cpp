@@ -45,10 +45,8 @@ struct TextTerm {
 };
 
 const TextTerm kTextTerms[] = {
-    {"little_governor", "cpu.little.governor"},
-    {"big_governor", "cpu.big.governor"},
-    {"gpu_governor", "gpu.governor"},
-    {"mem_latency_ratio_b", "memlat.ratio_b"},
+    {"little_governor", "cpu.little.governor"}, {"big_governor", "cpu.big.governor"},
+    {"gpu_governor", "gpu.governor"},           {"mem_latency_ratio_b", "memlat.ratio_b"},
     {"mem_latency_ratio_l", "memlat.ratio_l"},
 };
 
@@ -150,8 +148,8 @@ Action* ParamVocabulary::toAction(const RawXmlData& record) {
             continue;
         }
         if (!parseInt(text, &value)) {
-            VLOGE("config: cmdId=%d (%s): <%s> value '%s' is not an integer, ignored",
-                  record.cmdId, record.name.c_str(), name.c_str(), text.c_str());
+            VLOGE("config: cmdId=%d (%s): <%s> value '%s' is not an integer, ignored", record.cmdId,
+                  record.name.c_str(), name.c_str(), text.c_str());
             continue;
         }
         action->mTagValues.push_back(tag);

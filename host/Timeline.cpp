@@ -16,11 +16,21 @@ std::string jsonEscape(const std::string& in) {
     out.reserve(in.size() + 2);
     for (char c : in) {
         switch (c) {
-            case '"': out += "\\\""; break;
-            case '\\': out += "\\\\"; break;
-            case '\n': out += "\\n"; break;
-            case '\r': out += "\\r"; break;
-            case '\t': out += "\\t"; break;
+            case '"':
+                out += "\\\"";
+                break;
+            case '\\':
+                out += "\\\\";
+                break;
+            case '\n':
+                out += "\\n";
+                break;
+            case '\r':
+                out += "\\r";
+                break;
+            case '\t':
+                out += "\\t";
+                break;
             default:
                 if (static_cast<unsigned char>(c) < 0x20) {
                     char buf[8];
@@ -120,8 +130,10 @@ std::vector<Timeline::NodeSummary> Timeline::summary() const {
                 s.numeric = false;
                 continue;
             }
-            if (first || v < s.min) s.min = v;
-            if (first || v > s.max) s.max = v;
+            if (first || v < s.min)
+                s.min = v;
+            if (first || v > s.max)
+                s.max = v;
             first = false;
         }
         out.push_back(s);
@@ -153,17 +165,20 @@ int Timeline::changes(const std::string& key) const {
 std::string Timeline::chromeJson() const {
     std::lock_guard<std::mutex> lock(mLock);
     std::string out = "{\"displayTimeUnit\":\"ms\",\"traceEvents\":[\n";
-    out += "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":1,\"tid\":0,"
-           "\"args\":{\"name\":\"device nodes\"}},\n";
-    out += "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":2,\"tid\":0,"
-           "\"args\":{\"name\":\"events\"}}";
+    out +=
+        "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":1,\"tid\":0,"
+        "\"args\":{\"name\":\"device nodes\"}},\n";
+    out +=
+        "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":2,\"tid\":0,"
+        "\"args\":{\"name\":\"events\"}}";
     for (const auto& track : mTracks) {
         for (const auto& sample : track.samples) {
             double v = 0;
             out += ",\n";
             if (parseNodeNumber(sample.text, &v)) {
-                out += "{\"name\":\"" + jsonEscape(track.key) + "\",\"ph\":\"C\",\"ts\":" +
-                       std::to_string(sample.us) + ",\"pid\":" + std::to_string(kNodePid) +
+                out += "{\"name\":\"" + jsonEscape(track.key) +
+                       "\",\"ph\":\"C\",\"ts\":" + std::to_string(sample.us) +
+                       ",\"pid\":" + std::to_string(kNodePid) +
                        ",\"tid\":0,\"args\":{\"value\":" + formatNumber(v) + "}}";
             } else {
                 // Text nodes (governors) have no counter value: an instant on the node track.
@@ -176,9 +191,9 @@ std::string Timeline::chromeJson() const {
     }
     for (const auto& instant : mInstants) {
         out += ",\n{\"name\":\"" + jsonEscape(instant.name) + "\",\"cat\":\"" +
-               jsonEscape(instant.category) + "\",\"ph\":\"i\",\"s\":\"g\",\"ts\":" +
-               std::to_string(instant.us) + ",\"pid\":" + std::to_string(kEventPid) +
-               ",\"tid\":0}";
+               jsonEscape(instant.category) +
+               "\",\"ph\":\"i\",\"s\":\"g\",\"ts\":" + std::to_string(instant.us) +
+               ",\"pid\":" + std::to_string(kEventPid) + ",\"tid\":0}";
     }
     out += "\n]}\n";
     return out;
@@ -187,13 +202,15 @@ std::string Timeline::chromeJson() const {
 bool Timeline::writeChromeJson(const std::string& path, std::string* error) const {
     std::ofstream file(path, std::ios::trunc);
     if (!file) {
-        if (error != nullptr) *error = "cannot write " + path;
+        if (error != nullptr)
+            *error = "cannot write " + path;
         return false;
     }
     file << chromeJson();
     file.close();
     if (!file) {
-        if (error != nullptr) *error = "write failed: " + path;
+        if (error != nullptr)
+            *error = "write failed: " + path;
         return false;
     }
     return true;

@@ -210,7 +210,8 @@ TEST(HostExecutorRealTime, TimerThreadRevertsWithoutAnyCaller) {
     std::string gpuMin;
     for (int i = 0; i < 200; ++i) {
         ASSERT_TRUE(tree.read("gpu.min", &gpuMin));
-        if (gpuMin == "257000000") break;
+        if (gpuMin == "257000000")
+            break;
         usleep(10000);
     }
     EXPECT_EQ("257000000", gpuMin);

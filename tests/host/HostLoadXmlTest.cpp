@@ -56,8 +56,8 @@ TEST_F(HostLoadXmlTest, NamedParametersBecomeTagPairs) {
     EXPECT_EQ("cold", action->mName);
     EXPECT_EQ(1500, action->mDuration);
     EXPECT_EQ(9, action->mParamNum);
-    EXPECT_EQ((std::vector<int32_t>{1, 1804800, 5, 2419200, 7, 500, 10, 800, 18, 80000, 20, 1,
-                                    57, -10, 101, 150, 33, 7}),
+    EXPECT_EQ((std::vector<int32_t>{1, 1804800, 5, 2419200, 7, 500, 10, 800, 18, 80000, 20, 1, 57,
+                                    -10, 101, 150, 33, 7}),
               action->mTagValues);
     EXPECT_TRUE(action->mParams.empty());
     // The head stands for the command and carries no parameters.
@@ -74,8 +74,8 @@ TEST_F(HostLoadXmlTest, GovernorScenesAndMemoryLatencyKeepStringPairs) {
     const Action* gov = first(4230);
     ASSERT_NE(nullptr, gov);
     EXPECT_EQ(3, gov->mParamNum);
-    EXPECT_EQ((std::vector<std::string>{"priority", "40", "gpu_governor", "performance",
-                                        "big_max", "1804800"}),
+    EXPECT_EQ((std::vector<std::string>{"priority", "40", "gpu_governor", "performance", "big_max",
+                                        "1804800"}),
               gov->mParams);
     EXPECT_TRUE(gov->mTagValues.empty());
     EXPECT_EQ((std::vector<std::string>{"mem_latency_ratio_b", "0.6"}), first(20481)->mParams);

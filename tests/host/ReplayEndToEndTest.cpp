@@ -20,14 +20,16 @@ public:
     explicit JsonChecker(const std::string& text) : mText(text) {}
     bool valid() {
         skip();
-        if (!value()) return false;
+        if (!value())
+            return false;
         skip();
         return mPos == mText.size();
     }
 
 private:
     void skip() {
-        while (mPos < mText.size() && isspace(static_cast<unsigned char>(mText[mPos]))) ++mPos;
+        while (mPos < mText.size() && isspace(static_cast<unsigned char>(mText[mPos])))
+            ++mPos;
     }
     bool eat(char c) {
         skip();
@@ -38,25 +40,32 @@ private:
         return false;
     }
     bool string() {
-        if (!eat('"')) return false;
+        if (!eat('"'))
+            return false;
         while (mPos < mText.size() && mText[mPos] != '"') {
-            if (static_cast<unsigned char>(mText[mPos]) < 0x20) return false;
+            if (static_cast<unsigned char>(mText[mPos]) < 0x20)
+                return false;
             mPos += mText[mPos] == '\\' ? 2 : 1;
         }
         return eat('"');
     }
     bool number() {
         const size_t start = mPos;
-        while (mPos < mText.size() && strchr("+-0123456789.eE", mText[mPos]) != nullptr) ++mPos;
+        while (mPos < mText.size() && strchr("+-0123456789.eE", mText[mPos]) != nullptr)
+            ++mPos;
         return mPos > start;
     }
     bool value() {
         skip();
-        if (mPos >= mText.size()) return false;
+        if (mPos >= mText.size())
+            return false;
         const char c = mText[mPos];
-        if (c == '{') return sequence('{', '}', true);
-        if (c == '[') return sequence('[', ']', false);
-        if (c == '"') return string();
+        if (c == '{')
+            return sequence('{', '}', true);
+        if (c == '[')
+            return sequence('[', ']', false);
+        if (c == '"')
+            return string();
         for (const char* word : {"true", "false", "null"}) {
             if (mText.compare(mPos, strlen(word), word) == 0) {
                 mPos += strlen(word);
@@ -67,10 +76,13 @@ private:
     }
     bool sequence(char open, char close, bool object) {
         eat(open);
-        if (eat(close)) return true;
+        if (eat(close))
+            return true;
         do {
-            if (object && (!string() || !eat(':'))) return false;
-            if (!value()) return false;
+            if (object && (!string() || !eat(':')))
+                return false;
+            if (!value())
+                return false;
         } while (eat(','));
         return eat(close);
     }
@@ -104,7 +116,8 @@ protected:
         static std::vector<Timeline::NodeSummary> summary;
         summary = HostEnvironment::get().timeline().summary();
         for (const auto& s : summary) {
-            if (s.key == key) return &s;
+            if (s.key == key)
+                return &s;
         }
         return nullptr;
     }
@@ -166,10 +179,11 @@ TEST_F(ReplayEndToEndTest, ScenesAndTimedBoostsWereAppliedAndUndone) {
     EXPECT_EQ("1", node("memlat.ratio_b"));
     const auto scenes = HostEnvironment::get().timeline().instants("scene");
     std::vector<std::string> names;
-    for (const auto& s : scenes) names.push_back(s.name);
-    for (const char* expected : {"4118 video_playback on", "4118 video_playback off",
-                                 "4119 game on", "4119 game off", "4224 game_big_performance on",
-                                 "4230 game_gpu_performance off"}) {
+    for (const auto& s : scenes)
+        names.push_back(s.name);
+    for (const char* expected :
+         {"4118 video_playback on", "4118 video_playback off", "4119 game on", "4119 game off",
+          "4224 game_big_performance on", "4230 game_gpu_performance off"}) {
         EXPECT_NE(names.end(), std::find(names.begin(), names.end(), expected)) << expected;
     }
     const auto actions = HostEnvironment::get().timeline().instants("action");
@@ -183,8 +197,8 @@ TEST_F(ReplayEndToEndTest, ScenesAndTimedBoostsWereAppliedAndUndone) {
 TEST_F(ReplayEndToEndTest, ReportLinesWentToTheEventLogAndTimeline) {
     const auto lines = HostEnvironment::get().eventLog().lines();
     ASSERT_EQ(4u, lines.size());
-    const char* tails[] = {",1,1497,2016,700000,4>", ",3,1401,1804,600000,4>",
-                           ",2,-1,-1,-1,0>", ",1,,2419,,1>"};
+    const char* tails[] = {",1,1497,2016,700000,4>", ",3,1401,1804,600000,4>", ",2,-1,-1,-1,0>",
+                           ",1,,2419,,1>"};
     for (size_t i = 0; i < lines.size(); ++i) {
         EXPECT_EQ(0u, lines[i].find("#ARG1:<")) << lines[i];
         EXPECT_EQ(lines[i].size() - strlen(tails[i]), lines[i].rfind(tails[i])) << lines[i];
@@ -199,7 +213,8 @@ TEST_F(ReplayEndToEndTest, TimelineIsChromeJsonWithTheExpectedTracks) {
     EXPECT_TRUE(JsonChecker(json).valid());
     EXPECT_EQ(0u, json.find("{\"displayTimeUnit\":\"ms\",\"traceEvents\":["));
     for (const auto& node : HostEnvironment::get().nodeMap().nodes()) {
-        if (node.kind == NodeKind::Text) continue;
+        if (node.kind == NodeKind::Text)
+            continue;
         EXPECT_NE(std::string::npos, json.find("{\"name\":\"" + node.key + "\",\"ph\":\"C\""))
             << node.key;
     }

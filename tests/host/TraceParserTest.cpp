@@ -10,20 +10,20 @@ namespace {
 TEST(TraceParserTest, EveryCallKindParses) {
     std::vector<TraceCall> calls;
     std::string error;
-    ASSERT_EQ(0, TraceParser::parseText(
-                     "# header\n"
-                     "@1500 event 4116 0 msg=\"pid=12|tid=34\"   # probe\n"
-                     "event 20480 0 msg=\"pid=1|tid=2|ratio_b=0.5 ratio_l=0.7\"\n"
-                     "event 20225 0x50000\n"
-                     "setconfig 1 2=1497600 5=-1\n"
-                     "getconfig 22 24\n"
-                     "dump --freqlist\n"
-                     "reload\n"
-                     "policy cold 1200\n"
-                     "sleep 250\n"
-                     "@3000\n"
-                     "\n",
-                     "t.trace", &calls, &error))
+    ASSERT_EQ(0,
+              TraceParser::parseText("# header\n"
+                                     "@1500 event 4116 0 msg=\"pid=12|tid=34\"   # probe\n"
+                                     "event 20480 0 msg=\"pid=1|tid=2|ratio_b=0.5 ratio_l=0.7\"\n"
+                                     "event 20225 0x50000\n"
+                                     "setconfig 1 2=1497600 5=-1\n"
+                                     "getconfig 22 24\n"
+                                     "dump --freqlist\n"
+                                     "reload\n"
+                                     "policy cold 1200\n"
+                                     "sleep 250\n"
+                                     "@3000\n"
+                                     "\n",
+                                     "t.trace", &calls, &error))
         << error;
     ASSERT_EQ(10u, calls.size());
     EXPECT_EQ(TraceCall::Kind::Event, calls[0].kind);
@@ -85,7 +85,9 @@ INSTANTIATE_TEST_SUITE_P(
         BadLine{"setconfig 1", "minute.trace:2: 'setconfig' takes 2..64 argument(s), got 1"},
         BadLine{"reload now", "minute.trace:2: 'reload' takes 0 argument(s), got 1"},
         BadLine{"event 4116 0 msg=\"pid=1", "minute.trace:2: unterminated quote"}),
-    [](const testing::TestParamInfo<BadLine>& info) { return "case" + std::to_string(info.index); });
+    [](const testing::TestParamInfo<BadLine>& info) {
+        return "case" + std::to_string(info.index);
+    });
 
 TEST(TraceParserTest, MissingFileIsNamed) {
     std::vector<TraceCall> calls;

@@ -18,7 +18,8 @@ constexpr auto kProbeDrainLimit = std::chrono::milliseconds(1000);
 
 std::string directoryOf(const std::string& path) {
     const size_t slash = path.find_last_of('/');
-    if (slash == std::string::npos) return ".";
+    if (slash == std::string::npos)
+        return ".";
     return slash == 0 ? "/" : path.substr(0, slash);
 }
 
@@ -62,8 +63,8 @@ int ReplaySession::setUp() {
     for (const auto& property : mOptions.properties) {
         env.properties().set(property.first, property.second);
     }
-    const std::string root = mOptions.deviceRoot.empty() ? HostEnvironment::defaultSimulatedRoot()
-                                                         : mOptions.deviceRoot;
+    const std::string root =
+        mOptions.deviceRoot.empty() ? HostEnvironment::defaultSimulatedRoot() : mOptions.deviceRoot;
     if (env.useDeviceRoot(root, /*fresh=*/true) != 0) {
         fprintf(mErr, "velmora-replay: device root %s is not usable\n", root.c_str());
         return kSetupFailed;
@@ -90,7 +91,8 @@ int ReplaySession::setUp() {
 }
 
 void ReplaySession::echo(const TraceCall& call, const std::string& result) {
-    if (mOptions.quiet) return;
+    if (mOptions.quiet)
+        return;
     const int64_t ms = HostEnvironment::get().clock().nowMs();
     fprintf(mOut, "[%7lld.%03lld] %s:%d %s -> %s\n", static_cast<long long>(ms / 1000),
             static_cast<long long>(ms % 1000), call.file.c_str(), call.line, call.source.c_str(),
@@ -116,10 +118,9 @@ int ReplaySession::perform(const TraceCall& call) {
             echo(call, "ok");
             return 0;
         case TraceCall::Kind::Event:
-            status = mServer->velmoraEvent(
-                call.id, call.hasMsg ? call.text.c_str() : nullptr,
-                static_cast<unsigned int>(call.payload.size()),
-                call.payload.empty() ? nullptr : call.payload.data());
+            status = mServer->velmoraEvent(call.id, call.hasMsg ? call.text.c_str() : nullptr,
+                                           static_cast<unsigned int>(call.payload.size()),
+                                           call.payload.empty() ? nullptr : call.payload.data());
             break;
         case TraceCall::Kind::Reload:
             status = mServer->velmoraEvent(kReloadCmdId, nullptr, 0, nullptr);
@@ -130,8 +131,8 @@ int ReplaySession::perform(const TraceCall& call) {
             break;
         case TraceCall::Kind::GetConfig: {
             std::vector<int> values(call.tags.size(), -1);
-            status = mServer->velmoraGetConfig(static_cast<int>(call.tags.size()),
-                                               call.tags.data(), values.data());
+            status = mServer->velmoraGetConfig(static_cast<int>(call.tags.size()), call.tags.data(),
+                                               values.data());
             for (size_t i = 0; i < values.size(); ++i) {
                 result += std::to_string(call.tags[i]) + "=" + std::to_string(values[i]) + " ";
             }
@@ -145,7 +146,8 @@ int ReplaySession::perform(const TraceCall& call) {
             return 0;
     }
     ++mCalls;
-    if (status != 0) ++mFailed;
+    if (status != 0)
+        ++mFailed;
     env.timeline().recordInstant("call", call.source + " -> " + std::to_string(status));
     echo(call, result + std::to_string(status));
     return status;
@@ -159,7 +161,8 @@ int ReplaySession::replayFile() {
         return kBadInput;
     }
     const int setup = setUp();
-    if (setup != kOk) return setup;
+    if (setup != kOk)
+        return setup;
     for (const auto& call : calls) {
         perform(call);
     }
@@ -168,13 +171,15 @@ int ReplaySession::replayFile() {
 
 int ReplaySession::replayInteractive() {
     const int setup = setUp();
-    if (setup != kOk) return setup;
+    if (setup != kOk)
+        return setup;
     int result = kOk;
     char buffer[4096];
     int lineNo = 0;
     while (fgets(buffer, sizeof(buffer), mInput) != nullptr) {
         std::string line(buffer);
-        if (!line.empty() && line.back() == '\n') line.pop_back();
+        if (!line.empty() && line.back() == '\n')
+            line.pop_back();
         std::vector<TraceCall> calls;
         std::string error;
         if (TraceParser::parseLine(line, "<stdin>", ++lineNo, &calls, &error) != 0) {
@@ -182,14 +187,16 @@ int ReplaySession::replayInteractive() {
             result = kBadInput;  // keep going: a typo should not end the session
             continue;
         }
-        for (const auto& call : calls) perform(call);
+        for (const auto& call : calls)
+            perform(call);
     }
     return result;
 }
 
 void ReplaySession::waitForProbeBoosts() {
     auto* plat = mServer != nullptr ? dynamic_cast<HostPlatform*>(mServer->mPlatPtr) : nullptr;
-    if (plat == nullptr) return;
+    if (plat == nullptr)
+        return;
     const auto limit = std::chrono::steady_clock::now() + kProbeDrainLimit;
     while (plat->executor()->boostedThreads() != 0 && std::chrono::steady_clock::now() < limit) {
         std::this_thread::sleep_for(std::chrono::milliseconds(5));
@@ -199,7 +206,8 @@ void ReplaySession::waitForProbeBoosts() {
 }
 
 void ReplaySession::tearDown() {
-    if (mServer == nullptr) return;
+    if (mServer == nullptr)
+        return;
     waitForProbeBoosts();
     mServer.reset();
 }
@@ -222,7 +230,8 @@ std::string ReplaySession::summaryText() const {
 
 int ReplaySession::run() {
     const int result = mOptions.interactive ? replayInteractive() : replayFile();
-    if (mServer == nullptr) return result;
+    if (mServer == nullptr)
+        return result;
     tearDown();
     HostEnvironment& env = HostEnvironment::get();
     fprintf(mOut, "\n%d host calls, %d with a nonzero status, %zu report lines\n\n", mCalls,

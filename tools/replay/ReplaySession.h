@@ -18,24 +18,24 @@ class VelmoraServer;
 namespace velmora {
 
 struct ReplayOptions {
-    std::string tracePath;                 // ignored when interactive
-    bool interactive = false;              // read calls from `input` until end of file
-    std::vector<std::string> configDirs;   // default: the trace's directory
-    std::string deviceRoot;                // default: a fresh simulated device in /tmp
-    std::string nodeMapPath;               // node map overrides, optional
-    double speed = 1.0;                    // trace ms per real ms
-    bool fast = false;                     // virtual time: no waiting at all
+    std::string tracePath;                // ignored when interactive
+    bool interactive = false;             // read calls from `input` until end of file
+    std::vector<std::string> configDirs;  // default: the trace's directory
+    std::string deviceRoot;               // default: a fresh simulated device in /tmp
+    std::string nodeMapPath;              // node map overrides, optional
+    double speed = 1.0;                   // trace ms per real ms
+    bool fast = false;                    // virtual time: no waiting at all
     std::string timelinePath = "velmora-timeline.json";
     std::string eventLogPath = "velmora-events.log";
     std::vector<std::pair<std::string, std::string>> properties;
-    bool quiet = false;                    // no per-call lines
+    bool quiet = false;  // no per-call lines
 };
 
 class ReplaySession {
 public:
     // Exit codes of run().
     static constexpr int kOk = 0;
-    static constexpr int kBadInput = 1;   // unknown call, malformed number, missing file
+    static constexpr int kBadInput = 1;  // unknown call, malformed number, missing file
     static constexpr int kSetupFailed = 2;
 
     ReplaySession(ReplayOptions options, FILE* out, FILE* err, FILE* input = stdin);

@@ -72,7 +72,8 @@ public:
         : mWhere(file + ":" + std::to_string(lineNo) + ": "), mError(error) {}
 
     bool fail(const std::string& message) {
-        if (mError != nullptr) *mError = mWhere + message;
+        if (mError != nullptr)
+            *mError = mWhere + message;
         return false;
     }
     bool intArg(const std::string& text, const std::string& what, int* value) {
@@ -140,10 +141,12 @@ int TraceParser::parseLine(const std::string& line, const std::string& file, int
     };
     if (verb == "sleep") {
         call.kind = TraceCall::Kind::Sleep;
-        if (!argc(1, 1) || !p.msArg(args[0], "sleep", &call.sleepMs)) return -1;
+        if (!argc(1, 1) || !p.msArg(args[0], "sleep", &call.sleepMs))
+            return -1;
     } else if (verb == "event") {
         call.kind = TraceCall::Kind::Event;
-        if (!argc(1, 64) || !p.intArg(args[0], "command id", &call.id)) return -1;
+        if (!argc(1, 64) || !p.intArg(args[0], "command id", &call.id))
+            return -1;
         for (size_t k = 1; k < args.size(); ++k) {
             if (args[k].compare(0, 4, "msg=") == 0) {
                 call.hasMsg = true;
@@ -151,15 +154,18 @@ int TraceParser::parseLine(const std::string& line, const std::string& file, int
                 continue;
             }
             int v = 0;
-            if (!p.intArg(args[k], "payload", &v)) return -1;
+            if (!p.intArg(args[k], "payload", &v))
+                return -1;
             call.payload.push_back(v);
         }
     } else if (verb == "reload") {
         call.kind = TraceCall::Kind::Reload;
-        if (!argc(0, 0)) return -1;
+        if (!argc(0, 0))
+            return -1;
     } else if (verb == "setconfig") {
         call.kind = TraceCall::Kind::SetConfig;
-        if (!argc(2, 64) || !p.intArg(args[0], "client id", &call.id)) return -1;
+        if (!argc(2, 64) || !p.intArg(args[0], "client id", &call.id))
+            return -1;
         for (size_t k = 1; k < args.size(); ++k) {
             const size_t eq = args[k].find('=');
             if (eq == std::string::npos) {
@@ -176,19 +182,23 @@ int TraceParser::parseLine(const std::string& line, const std::string& file, int
         }
     } else if (verb == "getconfig") {
         call.kind = TraceCall::Kind::GetConfig;
-        if (!argc(1, 64)) return -1;
+        if (!argc(1, 64))
+            return -1;
         for (const auto& arg : args) {
             int tag = 0;
-            if (!p.intArg(arg, "tag", &tag)) return -1;
+            if (!p.intArg(arg, "tag", &tag))
+                return -1;
             call.tags.push_back(tag);
         }
     } else if (verb == "dump") {
         call.kind = TraceCall::Kind::Dump;
-        if (!argc(1, 1)) return -1;
+        if (!argc(1, 1))
+            return -1;
         call.text = args[0];
     } else if (verb == "policy") {
         call.kind = TraceCall::Kind::Policy;
-        if (!argc(2, 2) || !p.intArg(args[1], "policy duration", &call.id)) return -1;
+        if (!argc(2, 2) || !p.intArg(args[1], "policy duration", &call.id))
+            return -1;
         call.text = args[0];
     } else {
         p.fail("unknown call '" + verb + "'");
@@ -215,7 +225,8 @@ int TraceParser::parseFile(const std::string& path, std::vector<TraceCall>* call
                            std::string* error) {
     std::ifstream file(path);
     if (!file) {
-        if (error != nullptr) *error = path + ": cannot open trace";
+        if (error != nullptr)
+            *error = path + ": cannot open trace";
         return -1;
     }
     std::stringstream content;

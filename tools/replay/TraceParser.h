@@ -27,15 +27,15 @@ struct TraceCall {
     Kind kind = Kind::Stamp;
     std::string file;
     int line = 0;
-    int64_t atMs = -1;          // "@<ms>" prefix, -1 when absent
-    int64_t sleepMs = 0;        // sleep
-    int id = 0;                 // event: cmdId; setconfig: clientId; policy: duration
-    std::vector<int> payload;   // event
-    bool hasMsg = false;        // event: msg= given (null message otherwise)
-    std::string text;           // event: msg; dump: option; policy: name
-    std::vector<int> tags;      // setconfig, getconfig
-    std::vector<int> values;    // setconfig
-    std::string source;         // the line as written, for the echo
+    int64_t atMs = -1;         // "@<ms>" prefix, -1 when absent
+    int64_t sleepMs = 0;       // sleep
+    int id = 0;                // event: cmdId; setconfig: clientId; policy: duration
+    std::vector<int> payload;  // event
+    bool hasMsg = false;       // event: msg= given (null message otherwise)
+    std::string text;          // event: msg; dump: option; policy: name
+    std::vector<int> tags;     // setconfig, getconfig
+    std::vector<int> values;   // setconfig
+    std::string source;        // the line as written, for the echo
 };
 
 class TraceParser {
