@@ -2,6 +2,7 @@
 #include "config/Action.h"
 #include "config/VelmoraParser.h"
 #include "freq/FreqClientManager.h"
+#include "freq/FreqTags.h"
 #include "platform/OnDemandBoostServer.h"
 #include "platform/PerfExecutor.h"
 #include "platform/VelmoraLog.h"
@@ -27,11 +28,10 @@ constexpr int kOnOffLast = 13568;
 
 // Notification word: bit 18 lets launch policies replace action durations.
 constexpr int kPolicyEnableBit = 0x40000;
-constexpr int kFeatureSwitchTag = 10000;
 // On/off pairs with this tag are carried out by the platform, not the frequency manager.
 constexpr int kPlatformOnOffTag = 10;
 // Most frequency pairs an on/off command may hand to the frequency manager.
-constexpr int kMaxOnOffFreqPairs = 43;
+constexpr int kMaxOnOffFreqPairs = MAX_EVENT_TAGS;
 
 }  // namespace
 
@@ -98,7 +98,7 @@ int VelmoraServer::doNotificationEvent(int cmdId, unsigned int payloadNum, const
             return 0;
         }
         mPolicyEnabled = (payload[0] & kPolicyEnableBit) != 0;
-        const int tag = kFeatureSwitchTag;
+        const int tag = VELMORA_TAG_FEATURE_SWITCH;
         return velmoraSetConfig(0, 1, &tag, payload);
     }
     if (cmdId == kCmdClientRestart) {
