@@ -1,5 +1,7 @@
 #include "probe/ProbeHandler.h"
 
+#include <unistd.h>
+
 #include "compat/BoundedString.h"
 #include "platform/VelmoraLog.h"
 #include "probe/ProbeThread.h"
@@ -10,6 +12,9 @@ constexpr int32_t kBoostDelayMs = 8;
 constexpr int kStateBoost = 0;
 constexpr int kStateUnboost = -1;
 constexpr int kBadPayload = 2;
+// The worker lets go within microseconds of stopping; 100 ms covers a descheduled worker.
+constexpr int kReleasePolls = 1000;
+constexpr useconds_t kReleasePollUs = 100;
 
 }  // namespace
 
@@ -19,17 +24,29 @@ ProbeHandler::ProbeHandler(VelmoraPlat* plat, Action* action) : mBoostDelayMs(kB
 }
 
 ProbeHandler::~ProbeHandler() {
-    // The worker's loop would otherwise run on for the life of the process and read this
-    // handler (mBoostDelayMs) and the platform object after they are gone: the server deletes
-    // both, and tests create and delete servers all the time. Stopping it here is the last
-    // moment at which the handler is still whole.
+    // Left alone, the worker would run on for the life of the process and go on reading this
+    // handler (mBoostDelayMs) and the platform object after the server has deleted both; a
+    // host may delete and recreate the server at any time. Stopping it here, and waiting for
+    // it, is the last moment at which the handler is still whole. The platform object is
+    // already gone when the server deletes us, so the server should stop the worker before it
+    // deletes the platform (stopProbeThread()).
     stopProbeThread();
     mProbeThreadPtr.clear();
 }
 
 void ProbeHandler::stopProbeThread() {
-    if (mProbeThreadPtr != nullptr) {
-        mProbeThreadPtr->shutdown();
+    if (mProbeThreadPtr == nullptr) {
+        return;
+    }
+    mProbeThreadPtr->shutdown();
+    // The worker's loop lets go of its own strong reference just after it reports that it has
+    // stopped. Wait for that, so that our reference is the last one: the worker (its action
+    // chain included) is then destroyed on the thread that drops it, before the server's
+    // deletion returns, rather than later on a detached thread that may by then be running
+    // code of an unloaded library. Bounded: should anything else still hold a reference, it
+    // simply goes last.
+    for (int i = 0; i < kReleasePolls && mProbeThreadPtr->getStrongCount() > 1; ++i) {
+        usleep(kReleasePollUs);
     }
 }
 

@@ -92,9 +92,7 @@ protected:
 
     // Queue views, read under the worker's lock. -1: no entry; 0: withdrawn.
     int64_t waitTimestamp(uint32_t tid) { return timestampIn(&ProbeThread::mWaitQueue, tid); }
-    int64_t boostedTimestamp(uint32_t tid) {
-        return timestampIn(&ProbeThread::mBoostedQueue, tid);
-    }
+    int64_t boostedTimestamp(uint32_t tid) { return timestampIn(&ProbeThread::mBoostedQueue, tid); }
     // The same with the worker's lock already held by the caller; the analysis cannot follow
     // the lock through thread(), hence the opt-out.
     int64_t waitTimestampLocked(uint32_t tid) NO_THREAD_SAFETY_ANALYSIS {

@@ -10,6 +10,13 @@ namespace {
 
 class ProbeHandlerTest : public ProbeFixture {};
 
+// An action record that counts its destructions, to see who frees the probe action chain.
+struct CountedAction : Action {
+    explicit CountedAction(int* destroyed) : mDestroyed(destroyed) {}
+    ~CountedAction() override { ++*mDestroyed; }
+    int* mDestroyed;
+};
+
 struct RejectCase {
     const char* name;
     const char* msg;
@@ -28,8 +35,7 @@ TEST_P(ProbeHandlerRejectTest, ReturnsStatusLogsAndQueuesNothing) {
     const RejectCase& c = GetParam();
     startHandler();
     const int state = c.state;
-    EXPECT_EQ(mHandler->handle(c.msg, c.payloadNum, c.nullPayload ? nullptr : &state),
-              c.expected);
+    EXPECT_EQ(mHandler->handle(c.msg, c.payloadNum, c.nullPayload ? nullptr : &state), c.expected);
     EXPECT_EQ(LogCapture::count(c.prio, c.log), 1);
     EXPECT_EQ(queuedCount(), 0u);
     EXPECT_TRUE(mExecutor.calls().empty());
@@ -117,6 +123,24 @@ TEST_F(ProbeHandlerTest, UpdateReplacesActionWithoutCap) {
     const auto action = mExecutor.calls(Op::DoAction)[0];
     EXPECT_EQ(action.duration, 5000);
     EXPECT_EQ(action.tagValues, (std::vector<int>{1, 2000}));
+}
+
+TEST_F(ProbeHandlerTest, ActionChainsAreFreedOnUpdateAndWithHandler) {
+    int first = 0;
+    int second = 0;
+    Action* chain = new CountedAction(&first);
+    chain->mNext = new CountedAction(&first);
+    startHandler(chain);
+
+    Action* replacement = new CountedAction(&second);
+    replacement->mNext = new CountedAction(&second);
+    EXPECT_EQ(mHandler->updateProbeThread(replacement), 0);
+    EXPECT_EQ(first, 2);
+    EXPECT_EQ(second, 0);
+
+    // Gone by the time the handler's deletion returns, not later on the worker.
+    mHandler.reset();
+    EXPECT_EQ(second, 2);
 }
 
 TEST_F(ProbeHandlerTest, WithoutWorkerEventsAreIgnoredAndUpdateFails) {

@@ -221,8 +221,7 @@ TEST_P(ProbeActionCapTest, StartupActionDurationIsCappedAt100) {
 
 INSTANTIATE_TEST_SUITE_P(Durations, ProbeActionCapTest,
                          ::testing::Values(std::make_pair(8, 8), std::make_pair(100, 100),
-                                           std::make_pair(101, 100),
-                                           std::make_pair(5000, 100)));
+                                           std::make_pair(101, 100), std::make_pair(5000, 100)));
 
 }  // namespace
 }  // namespace fake

@@ -153,7 +153,8 @@ TEST_F(ServerProbeTest, ReloadRacesWithProbeEventsAndWorker) {
                 // process are boosted on the calling thread instead of the worker.
                 const int pid = 100 + p * 100 + i / 10;
                 const int tid = i % 10 == 0 ? pid : 1000 + p * 1000 + i;
-                const std::string msg = "pid=" + std::to_string(pid) + "|tid=" + std::to_string(tid);
+                const std::string msg =
+                    "pid=" + std::to_string(pid) + "|tid=" + std::to_string(tid);
                 const int state = i % 3 == 2 ? -1 : 0;
                 failures += mServer->velmoraEvent(kProbe, msg.c_str(), 1, &state) != 0;
                 usleep(i % 4 == 0 ? 2000 : 200);
