@@ -1,0 +1,115 @@
+#include "tools/lint/CommandClass.h"
+
+namespace velmora {
+
+DispatchClass CommandClass::classify(int cmdId, bool hasAction, int duration) {
+    // Ids from 20224 up are taken apart before any parse; 20481 parses but ignores duration.
+    if (cmdId == kMemoryLatency) {
+        return DispatchClass::kMemoryLatency;
+    }
+    if (cmdId >= kFirstNotification) {
+        return DispatchClass::kNeverRead;
+    }
+    if (cmdId == kProbeCmdId) {
+        return DispatchClass::kProbe;
+    }
+    if (!hasAction) {
+        return DispatchClass::kNoAction;
+    }
+    if (duration < 0) {
+        return DispatchClass::kDisabled;
+    }
+    if (isScene(cmdId)) {
+        return cmdId >= kFirstGovernorScene ? DispatchClass::kGovernorScene
+                                            : DispatchClass::kSpecialScene;
+    }
+    if (isOnOff(cmdId)) {
+        return DispatchClass::kOnOff;
+    }
+    if (duration == 0) {
+        return cmdId == kStartupCmdId ? DispatchClass::kStartupLevels : DispatchClass::kSchedLevel;
+    }
+    return DispatchClass::kTimedAction;
+}
+
+const char* CommandClass::name(DispatchClass dispatchClass) {
+    switch (dispatchClass) {
+        case DispatchClass::kMemoryLatency:
+            return "memory latency";
+        case DispatchClass::kNeverRead:
+            return "never read";
+        case DispatchClass::kProbe:
+            return "probe boost";
+        case DispatchClass::kNoAction:
+            return "no action";
+        case DispatchClass::kDisabled:
+            return "disabled";
+        case DispatchClass::kSpecialScene:
+            return "special scene";
+        case DispatchClass::kGovernorScene:
+            return "governor scene";
+        case DispatchClass::kOnOff:
+            return "on/off";
+        case DispatchClass::kStartupLevels:
+            return "start-up levels";
+        case DispatchClass::kSchedLevel:
+            return "sched levels";
+        case DispatchClass::kTimedAction:
+            break;
+    }
+    return "timed action";
+}
+
+std::string CommandClass::effect(DispatchClass dispatchClass, int cmdId, int duration) {
+    switch (dispatchClass) {
+        case DispatchClass::kMemoryLatency:
+            return "payload 0/-1 applies/withdraws the pairs through the platform";
+        case DispatchClass::kNeverRead:
+            return cmdId == kMemoryLatencyFromText
+                       ? "events take their ratios from the event text, this entry is unused"
+                       : "events with this id never read the configuration";
+        case DispatchClass::kProbe:
+            return "probed threads get the pairs for " + std::to_string(duration) + " ms";
+        case DispatchClass::kNoAction:
+        case DispatchClass::kDisabled:
+            return "events do nothing and return 0";
+        case DispatchClass::kSpecialScene:
+        case DispatchClass::kGovernorScene:
+            return "payload 0/-1 switches the scene on/off; the highest priority on is applied";
+        case DispatchClass::kOnOff:
+            return duration > 0 ? "payload 0/-1 hands the action to the platform"
+                                : "payload 0/-1 sets/clears frequency limits as client " +
+                                      std::to_string(cmdId);
+        case DispatchClass::kStartupLevels:
+            return "sent at start-up: records the default group levels";
+        case DispatchClass::kSchedLevel:
+            return "sets scheduling-group levels";
+        case DispatchClass::kTimedAction:
+            break;
+    }
+    std::string text = "the platform applies the pairs and reverts them after " +
+                       std::to_string(duration) + " ms";
+    if (cmdId == 4098 || cmdId == 4099) {
+        text += "; the launch policy \"";
+        text += cmdId == 4099 ? "cold" : "winswitch";
+        text += "\" may replace the duration";
+    }
+    return text;
+}
+
+int CommandClass::builtInPriority(int cmdId) {
+    switch (cmdId) {
+        case 4118:
+            return 100;
+        case 4119:
+            return 200;
+        case 4120:
+            return 20;
+        case 4121:
+            return 70;
+        default:
+            return 0;
+    }
+}
+
+}  // namespace velmora

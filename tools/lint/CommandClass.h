@@ -1,0 +1,54 @@
+// How the server dispatches a configured command: by its id first (memory latency, probe,
+// notification ids, special scenes, on/off commands), then by the duration of the action it
+// parses (negative: nothing; 0: scheduling levels; positive: a timed action), in the order the
+// event entry point tests them. Stateless.
+#pragma once
+
+#include <string>
+
+namespace velmora {
+
+enum class DispatchClass {
+    kMemoryLatency,   // 20481: applied on and off through the platform, whatever the duration
+    kNeverRead,       // 20480 and the other ids from 20224 up: events never read the configuration
+    kProbe,           // 4116: the probe boost applied to probed threads
+    kNoAction,        // no usable action: events parse a default action and do nothing
+    kDisabled,        // negative duration: events do nothing
+    kSpecialScene,    // 4118..4223
+    kGovernorScene,   // 4224..4352
+    kOnOff,           // 12288..13568
+    kStartupLevels,   // 5376 with duration 0: the default scheduling-group levels
+    kSchedLevel,      // duration 0: scheduling-group levels
+    kTimedAction,     // positive duration: a platform action for that many ms
+};
+
+class CommandClass {
+public:
+    static constexpr int kStartupCmdId = 5376;
+    static constexpr int kProbeCmdId = 4116;
+    static constexpr int kFirstScene = 4118;
+    static constexpr int kFirstGovernorScene = 4224;
+    static constexpr int kLastScene = 4352;
+    // Configured priorities are read for scenes up to this id only.
+    static constexpr int kLastScenePriorityRead = 4351;
+    static constexpr int kFirstOnOff = 12288;
+    static constexpr int kLastOnOff = 13568;
+    static constexpr int kFirstNotification = 20224;
+    static constexpr int kMemoryLatencyFromText = 20480;
+    static constexpr int kMemoryLatency = 20481;
+
+    // The class of command `cmdId` whose dispatched record has `duration`; `hasAction` is
+    // false when the command has no usable action.
+    static DispatchClass classify(int cmdId, bool hasAction, int duration);
+    // A short name of the class, e.g. "special scene".
+    static const char* name(DispatchClass dispatchClass);
+    // What an event of the class does, for the --explain listing.
+    static std::string effect(DispatchClass dispatchClass, int cmdId, int duration);
+
+    static bool isScene(int cmdId) { return cmdId >= kFirstScene && cmdId <= kLastScene; }
+    static bool isOnOff(int cmdId) { return cmdId >= kFirstOnOff && cmdId <= kLastOnOff; }
+    // Built-in priority of a special scene, 0 when it has none.
+    static int builtInPriority(int cmdId);
+};
+
+}  // namespace velmora

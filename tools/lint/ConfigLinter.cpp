@@ -1,0 +1,35 @@
+#include "tools/lint/ConfigLinter.h"
+
+#include <vector>
+
+#include "tools/lint/CommandRules.h"
+#include "tools/lint/Explainer.h"
+#include "tools/lint/LoadChecker.h"
+#include "tools/lint/LoaderRun.h"
+#include "tools/lint/LocatedConfig.h"
+
+namespace velmora {
+
+ConfigLinter::ConfigLinter(std::string path, LintOptions options)
+    : mPath(std::move(path)), mOptions(options), mDiagnostics(mPath) {}
+
+int ConfigLinter::run(std::ostream& out) {
+    LoaderRun loader;
+    loader.run(mPath);
+    LocatedConfig located;
+    located.load(mPath);
+
+    std::vector<CheckedCommand> commands;
+    LoadChecker loadChecker(located, loader, mDiagnostics);
+    if (loadChecker.check(&commands)) {
+        CommandRules rules(mDiagnostics, located.rootLine());
+        rules.check(commands);
+        if (mOptions.explain) {
+            Explainer(out).explain(commands);
+        }
+    }
+    mDiagnostics.print(out);
+    return mDiagnostics.exitStatus(mOptions.werror);
+}
+
+}  // namespace velmora

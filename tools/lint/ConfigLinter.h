@@ -1,0 +1,39 @@
+// Checks one command configuration file the way the server would read it: loads it with the
+// library's loader and the platform layer's conversion (LoaderRun), reads it a second time for
+// line numbers (LocatedConfig), then reports load-level findings (LoadChecker, with
+// ConversionChecker per action) and what the server does with each command (CommandRules), and
+// on request lists how every command is dispatched (Explainer).
+//
+// One object per file; not thread safe (a load swaps liblog's process-wide logger).
+#pragma once
+
+#include <ostream>
+#include <string>
+
+#include "tools/lint/Diagnostics.h"
+
+namespace velmora {
+
+struct LintOptions {
+    bool explain = false;  // list every command's dispatch before the findings
+    bool werror = false;   // warnings make the exit status 1
+};
+
+class ConfigLinter {
+public:
+    ConfigLinter(std::string path, LintOptions options);
+
+    // Checks the file and prints the listing (with --explain) and then the findings to `out`.
+    // Returns the exit status: Diagnostics::kClean, kWarningsAsErrors or kErrors.
+    // REQUIRES: the file exists and is readable (the command line checks it first).
+    int run(std::ostream& out);
+
+    const Diagnostics& diagnostics() const { return mDiagnostics; }
+
+private:
+    std::string mPath;
+    LintOptions mOptions;
+    Diagnostics mDiagnostics;
+};
+
+}  // namespace velmora

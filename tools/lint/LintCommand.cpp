@@ -1,0 +1,85 @@
+#include "tools/lint/LintCommand.h"
+
+#include <sys/stat.h>
+
+#include <cerrno>
+#include <cstring>
+#include <fstream>
+
+#include "tools/lint/ConfigLinter.h"
+
+namespace velmora {
+
+namespace {
+
+constexpr const char* kProgram = "velmora-lint";
+
+// Empty when `path` is a readable regular file, else why not.
+std::string unreadableReason(const std::string& path) {
+    struct stat info {};
+    if (stat(path.c_str(), &info) != 0) {
+        return strerror(errno);
+    }
+    if (S_ISDIR(info.st_mode)) {
+        return "is a directory";
+    }
+    std::ifstream in(path);
+    if (!in) {
+        return "cannot be read";
+    }
+    return std::string();
+}
+
+}  // namespace
+
+void LintCommand::printUsage(std::ostream& to) {
+    to << "usage: " << kProgram << " [--explain] [--werror] CONFIG.xml\n"
+       << "Checks a command configuration the way the server loads and dispatches it and\n"
+       << "reports findings as FILE:LINE: error|warning|note: MESSAGE.\n"
+       << "  --explain   list how every command is dispatched (class, duration, pairs)\n"
+       << "  --werror    exit 1 when there are warnings (and no errors)\n"
+       << "Exit status: 0 clean (notes allowed), 1 warnings with --werror, 2 errors or a\n"
+       << "usage error.\n";
+}
+
+int LintCommand::run(const std::vector<std::string>& args, std::ostream& out,
+                     std::ostream& err) {
+    LintOptions options;
+    std::string path;
+    bool pathGiven = false;
+    for (const std::string& arg : args) {
+        if (arg == "--explain") {
+            options.explain = true;
+        } else if (arg == "--werror") {
+            options.werror = true;
+        } else if (arg == "--help" || arg == "-h") {
+            printUsage(out);
+            return 0;
+        } else if (arg.size() > 1 && arg[0] == '-') {
+            err << kProgram << ": unknown option " << arg << '\n';
+            printUsage(err);
+            return kUsageError;
+        } else if (pathGiven) {
+            err << kProgram << ": more than one configuration given (" << path << ", " << arg
+                << ")\n";
+            return kUsageError;
+        } else {
+            path = arg;
+            pathGiven = true;
+        }
+    }
+    if (!pathGiven || path.empty()) {
+        err << kProgram << ": no configuration file given\n";
+        printUsage(err);
+        return kUsageError;
+    }
+    const std::string reason = unreadableReason(path);
+    if (!reason.empty()) {
+        err << kProgram << ": " << path << ": " << reason << '\n';
+        return kUsageError;
+    }
+    ConfigLinter linter(path, options);
+    return linter.run(out);
+}
+
+}  // namespace velmora

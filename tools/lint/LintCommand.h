@@ -1,0 +1,28 @@
+// The velmora-lint command line: options, the file argument and usage errors, then one
+// ConfigLinter run. main() only forwards its arguments here, so tests drive the whole program
+// (output and exit status) without starting a process.
+//
+//   velmora-lint [--explain] [--werror] CONFIG.xml
+//
+// Findings and the listing go to `out`; usage errors to `err`. Stateless.
+#pragma once
+
+#include <ostream>
+#include <string>
+#include <vector>
+
+namespace velmora {
+
+class LintCommand {
+public:
+    // Exit status of a usage error (no file, unreadable file, unknown option), the same as for
+    // a configuration with errors: either way the file was not shown to be usable.
+    static constexpr int kUsageError = 2;
+
+    // `args` are the arguments after the program name. Returns the exit status.
+    static int run(const std::vector<std::string>& args, std::ostream& out, std::ostream& err);
+
+    static void printUsage(std::ostream& to);
+};
+
+}  // namespace velmora
