@@ -45,7 +45,11 @@ VelmoraServer::~VelmoraServer() {
 
 void VelmoraServer::releaseComponents() {
     // The platform goes first although the managers point at it: their destructors never call
-    // into the platform.
+    // into the platform. The probe worker is the exception, it calls the platform on its own
+    // thread until it is stopped, so it is stopped (and waited for) before the platform goes.
+    if (mProbeHandler != nullptr) {
+        mProbeHandler->stopProbeThread();
+    }
     delete mPlatPtr;
     mPlatPtr = nullptr;
     delete mFreqClientPtr;
