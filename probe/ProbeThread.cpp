@@ -178,7 +178,8 @@ bool ProbeHandler::ProbeThread::threadLoop() {
     // The lock is taken per index so that host threads never wait for a whole pass. Only this
     // thread removes entries, and it walks from the end, so an index below the size read here
     // stays valid; host threads may add entries meanwhile and shift later ones, which at worst
-    // defers them to the next pass.
+    // defers them to the next pass. The size itself is read under the lock too, since host
+    // threads add entries at any time.
     size_t count;
     mLock.lock();
     count = mWaitQueue.size();
@@ -199,8 +200,8 @@ bool ProbeHandler::ProbeThread::threadLoop() {
                 }
             } else {
                 // Deliberately the last pending item visited (the smallest thread id), not
-                // the minimum over all: a later item that falls due meanwhile waits for this
-                // one and is boosted in the same pass.
+                // the minimum over all: an item with a larger id that falls due earlier waits
+                // for this one and is boosted in the same pass.
                 sleepMs = delayMs - (now - item->timestamp) / kNsPerMs;
             }
         }
@@ -234,7 +235,7 @@ bool ProbeHandler::ProbeThread::threadLoop() {
     }
     mLock.unlock();
     // With only boosted items left sleepMs is 0 and the loop polls until they expire or are
-    // withdrawn: a withdrawal then reaches the queue without an extra wake-up.
+    // withdrawn: CPU time traded for a lifetime that ends on time without a timed wait.
     usleep(static_cast<useconds_t>(sleepMs * 1000));
     return true;
 }
