@@ -1,0 +1,198 @@
+// velmora-lint as a program: the example configuration, the --explain listing, --werror,
+// findings in line order, and usage errors.
+#include <gtest/gtest.h>
+
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "tests/lint/LintTestSupport.h"
+#include "tools/lint/LintCommand.h"
+
+namespace velmora {
+namespace {
+
+using linttest::runLint;
+using linttest::ScratchDir;
+using linttest::withBase;
+
+const std::string kExample = VELMORA_SOURCE_DIR "/examples/xml/velmora_config_cust.xml";
+
+TEST(LintCommandTest, ExampleConfigurationIsClean) {
+    const auto result = runLint({"--werror"}, kExample);
+    EXPECT_EQ(result.status, 0);
+    EXPECT_EQ(result.out, "");
+    EXPECT_EQ(result.err, "");
+}
+
+TEST(LintCommandTest, ExplainListsEveryCommandsDispatch) {
+    ScratchDir dir;
+    const std::string config = withBase(
+        "<cmd id=\"4099\" name=\"cold\"><a><duration>1500</duration><big_min>2419200</big_min>"
+        "</a><a><duration>10</duration></a></cmd>\n"
+        "<cmd id=\"4118\" name=\"video\"><a><big_max>1804800</big_max></a></cmd>\n"
+        "<cmd id=\"4224\" name=\"gov\"><a><priority>50</priority>"
+        "<big_governor>performance</big_governor></a></cmd>\n"
+        "<cmd id=\"12300\" name=\"floor\"><a><duration>0</duration><big_min>1209600</big_min>"
+        "<ddr_min>800000000</ddr_min></a></cmd>\n"
+        "<cmd id=\"4100\" name=\"off\"><a><duration>-1</duration></a></cmd>\n");
+    const auto result = runLint({"--explain"}, dir.write("config.xml", config));
+    const std::vector<std::string> expected = {
+        "5376 defaults (line 2): start-up levels, duration 0, 1 pair",
+        "    group_hmp(50)=10",
+        "    -> sent at start-up: records the default group levels",
+        "4116 probe (line 3): probe boost, duration 50, 1 pair",
+        "    big_min(4)=1497600",
+        "    -> probed threads get the pairs for 50 ms",
+        "4099 cold (line 4): timed action, duration 1500, 1 pair",
+        "    big_min(4)=2419200",
+        "    + 1 further action(s) passed along with it, never dispatched on their own",
+        "    -> the platform applies the pairs and reverts them after 1500 ms; the launch policy "
+        "\"cold\" may replace the duration",
+        "4118 video (line 5): special scene, priority 100, duration 0, 1 pair",
+        "    big_max(5)=1804800",
+        "    -> payload 0/-1 switches the scene on/off; the highest priority on is applied",
+        "4224 gov (line 6): governor scene, priority 50, duration 0, 2 pairs",
+        "    priority=\"50\" big_governor=\"performance\"",
+        "    -> payload 0/-1 switches the scene on/off; the highest priority on is applied",
+        "12300 floor (line 7): on/off, duration 0, 2 pairs",
+        "    big_min(4)=1209600 ddr_min(10)=800000000",
+        "    -> payload 0/-1 sets/clears frequency limits as client 12300; tag 10 goes to the "
+        "platform's own action",
+        "4100 off (line 8): disabled, duration -1, 0 pairs",
+        "    -> events do nothing and return 0",
+        "F:8: note: command 4100 is disabled (duration -1): its events do nothing",
+    };
+    EXPECT_EQ(result.outLines(), expected) << result.out;
+    EXPECT_EQ(result.status, 0);
+}
+
+TEST(LintCommandTest, ExplainMarksASceneThatIsAlwaysRefused) {
+    ScratchDir dir;
+    const auto result = runLint(
+        {"--explain"},
+        dir.write("c.xml", withBase("<cmd id=\"4130\" name=\"s\"><a><big_max>1</big_max></a>"
+                                    "</cmd>\n")));
+    const auto lines = result.outLines();
+    ASSERT_GE(lines.size(), 9u) << result.out;
+    EXPECT_EQ(lines[6], "4130 s (line 4): special scene, priority none, duration 0, 1 pair");
+    EXPECT_EQ(lines[8],
+              "    -> payload 0/-1 switches the scene on/off; the highest priority on is applied "
+              "(this one never: no valid priority)");
+    EXPECT_EQ(result.status, 2);
+}
+
+// Exit status by the worst finding, and --werror turning warnings (not notes) into status 1.
+struct StatusRow {
+    const char* name;
+    std::string body;
+    int plain;
+    int werror;
+};
+
+const StatusRow kStatusRows[] = {
+    {"Clean", "", 0, 0},
+    {"NoteOnly", "<cmd id=\"4099\"><a><duration>-5</duration></a></cmd>\n", 0, 0},
+    {"Warning", "<cmd id=\"4099\"><a><duration>5</duration><bogus>1</bogus></a></cmd>\n", 0, 1},
+    {"ErrorBeatsWarning",
+     "<cmd id=\"4099\"><a><duration>5</duration><bogus>1</bogus></a></cmd>\n<cmd/>\n", 2, 2},
+};
+
+void PrintTo(const StatusRow& row, std::ostream* os) {
+    *os << row.name;
+}
+
+class LintStatusTest : public testing::TestWithParam<StatusRow> {};
+
+TEST_P(LintStatusTest, ExitStatus) {
+    ScratchDir dir;
+    const std::string path = dir.write("c.xml", withBase(GetParam().body));
+    EXPECT_EQ(runLint({}, path).status, GetParam().plain);
+    EXPECT_EQ(runLint({"--werror"}, path).status, GetParam().werror);
+}
+
+INSTANTIATE_TEST_SUITE_P(Rows, LintStatusTest, testing::ValuesIn(kStatusRows),
+                         [](const testing::TestParamInfo<StatusRow>& info) {
+                             return info.param.name;
+                         });
+
+TEST(LintCommandTest, FindingsComeInLineOrder) {
+    ScratchDir dir;
+    // The missing start-up command is found last but concerns line 1; the duplicate's note
+    // stays with its warning although it names an earlier line.
+    const std::string config =
+        "<policy>\n"
+        "<cmd id=\"4116\"><a><duration>50</duration></a></cmd>\n"
+        "<cmd id=\"4099\"><a><duration>5</duration><bogus>1</bogus></a></cmd>\n"
+        "<cmd id=\"4116\"><a><duration>60</duration></a></cmd>\n"
+        "</policy>\n";
+    const auto result = runLint({}, dir.write("c.xml", config));
+    const std::vector<std::string> expected = {
+        "F:1: error: no start-up command 5376: the server's init fails (status 2) and the server "
+        "never runs",
+        "F:3: warning: unknown parameter <bogus> in command 4099: the host conversion leaves it "
+        "out",
+        "F:4: warning: duplicate command id 4116: the first definition wins, this one is ignored",
+        "F:2: note: the first definition of command 4116 is here",
+    };
+    EXPECT_EQ(result.outLines(), expected) << result.out;
+}
+
+// Usage errors: a message on stderr naming the problem, nothing on stdout, status 2.
+struct UsageRow {
+    const char* name;
+    std::vector<std::string> args;  // "DIR" stands for a scratch directory
+    std::string message;            // first line of stderr
+};
+
+const UsageRow kUsageRows[] = {
+    {"NoFile", {}, "velmora-lint: no configuration file given"},
+    {"UnknownOption", {"--fix", "c.xml"}, "velmora-lint: unknown option --fix"},
+    {"MissingFile", {"DIR/none.xml"}, "velmora-lint: DIR/none.xml: No such file or directory"},
+    {"Directory", {"DIR"}, "velmora-lint: DIR: is a directory"},
+    {"TwoFiles", {"DIR/a.xml", "DIR/b.xml"},
+     "velmora-lint: more than one configuration given (DIR/a.xml, DIR/b.xml)"},
+};
+
+void PrintTo(const UsageRow& row, std::ostream* os) {
+    *os << row.name;
+}
+
+class LintUsageTest : public testing::TestWithParam<UsageRow> {};
+
+TEST_P(LintUsageTest, FailsWithAMessage) {
+    ScratchDir dir;
+    auto expand = [&](std::string text) {
+        for (size_t at = text.find("DIR"); at != std::string::npos; at = text.find("DIR")) {
+            text.replace(at, 3, dir.path());
+        }
+        return text;
+    };
+    std::vector<std::string> args;
+    for (const auto& arg : GetParam().args) {
+        args.push_back(expand(arg));
+    }
+    dir.write("a.xml", withBase(""));
+    dir.write("b.xml", withBase(""));
+    std::ostringstream out;
+    std::ostringstream err;
+    EXPECT_EQ(LintCommand::run(args, out, err), LintCommand::kUsageError);
+    EXPECT_EQ(out.str(), "");
+    EXPECT_EQ(err.str().substr(0, err.str().find('\n')), expand(GetParam().message));
+}
+
+INSTANTIATE_TEST_SUITE_P(Rows, LintUsageTest, testing::ValuesIn(kUsageRows),
+                         [](const testing::TestParamInfo<UsageRow>& info) {
+                             return info.param.name;
+                         });
+
+TEST(LintCommandTest, HelpGoesToStdoutWithStatusZero) {
+    std::ostringstream out;
+    std::ostringstream err;
+    EXPECT_EQ(LintCommand::run({"--help"}, out, err), 0);
+    EXPECT_EQ(out.str().rfind("usage: velmora-lint", 0), 0u);
+    EXPECT_EQ(err.str(), "");
+}
+
+}  // namespace
+}  // namespace velmora

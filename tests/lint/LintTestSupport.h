@@ -1,0 +1,44 @@
+// Helpers for the checker's tests: configurations written to a scratch directory and runs of
+// the whole command line with its output and exit status.
+#pragma once
+
+#include <string>
+#include <vector>
+
+namespace velmora {
+namespace linttest {
+
+// What one run of velmora-lint printed and returned. The configuration's path is replaced by
+// "F" in both texts, so expectations read "F:12: warning: ...".
+struct LintResult {
+    int status = -1;
+    std::string out;
+    std::string err;
+    std::vector<std::string> outLines() const;
+};
+
+// A scratch directory removed with everything in it at the end of the test.
+class ScratchDir {
+public:
+    ScratchDir();
+    ~ScratchDir();
+    ScratchDir(const ScratchDir&) = delete;
+    ScratchDir& operator=(const ScratchDir&) = delete;
+
+    // Writes `text` to `name` in the directory; returns its path.
+    std::string write(const std::string& name, const std::string& text) const;
+    const std::string& path() const { return mPath; }
+
+private:
+    std::string mPath;
+};
+
+// The start of a configuration whose start-up and probe commands are fine (lines 1 to 3); the
+// body given to withBase starts on line 4.
+std::string withBase(const std::string& body);
+
+// Runs velmora-lint with `options` followed by `configPath`.
+LintResult runLint(const std::vector<std::string>& options, const std::string& configPath);
+
+}  // namespace linttest
+}  // namespace velmora
