@@ -1,4 +1,5 @@
 // Client configuration requests, queries and the debug dump.
+#include <errno.h>
 #include <unistd.h>
 
 #include <utils/String8.h>
@@ -15,6 +16,24 @@ namespace {
 constexpr int kTagSchedLevelStep = 40;
 constexpr int kTagSetSchedLevel = 42;
 constexpr size_t kMaxDumpArgLength = 512;
+
+// Writes the reply with write(2) rather than dprintf: glibc's dprintf loses its 8 KiB stream
+// buffer whenever the write fails (a descriptor the host closed, a reader that went away), and
+// a dump is the one entry point that writes to a descriptor the host hands in.
+void writeAll(int fd, const char* text, size_t length) {
+    while (length > 0) {
+        const ssize_t n = write(fd, text, length);
+        if (n < 0 && errno == EINTR) {
+            continue;
+        }
+        if (n <= 0) {
+            VLOGW("dump write failed, fd=%d, errno=%d\n", fd, errno);
+            return;
+        }
+        text += n;
+        length -= static_cast<size_t>(n);
+    }
+}
 
 }  // namespace
 
@@ -125,5 +144,6 @@ void VelmoraServer::dumpVelmoraServerInfo(int fd, const std::vector<std::string>
     } else {
         out.append("invalid parameter!\n");
     }
-    dprintf(fd, "%s\n", out.string());
+    out.append("\n");
+    writeAll(fd, out.string(), out.length());
 }
