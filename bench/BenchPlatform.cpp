@@ -1,0 +1,156 @@
+#include "bench/BenchPlatform.h"
+
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <atomic>
+
+#include "config/Action.h"
+#include "config/VelmoraLoadXml.h"
+#include "platform/OnDemandBoostServer.h"
+#include "platform/PlatformImports.h"
+
+namespace velmora {
+namespace bench {
+
+namespace {
+
+constexpr int kProbeCmdId = 4116;
+
+std::string gConfigPath;
+std::atomic<ProbeBoostHook> gProbeHook{nullptr};
+// Thread chosen by the last setProbeTid(tid, 0); the worker calls doAction right after it,
+// under its own lock, so no other boost comes in between.
+std::atomic<unsigned int> gProbeTid{0};
+
+class BenchPlatform : public VelmoraPlat {
+public:
+    BenchPlatform() { mExecutorPtr = &executor(); }
+};
+
+Action* convertRecord(const RawXmlData& raw) {
+    auto* action = new Action();
+    action->mCmdId = raw.cmdId;
+    action->mName = raw.name;
+    action->mDuration = 0;
+    int intPairs = 0;
+    int stringPairs = 0;
+    for (size_t i = 0; i < raw.names.size(); ++i) {
+        const std::string& name = raw.names[i];
+        const std::string& value = raw.values[i];
+        if (name == "duration") {
+            action->mDuration = atoi(value.c_str());
+        } else if (name.size() > 2 && name.compare(0, 2, "s_") == 0) {
+            action->mParams.push_back(name.substr(2));
+            action->mParams.push_back(value);
+            ++stringPairs;
+        } else if (name.size() > 1 && name[0] == 't') {
+            action->mTagValues.push_back(atoi(name.c_str() + 1));
+            action->mTagValues.push_back(atoi(value.c_str()));
+            ++intPairs;
+        }
+    }
+    action->mParamNum = stringPairs > 0 ? stringPairs : intPairs;
+    return action;
+}
+
+class BenchLoadXml : public VelmoraLoadXml {
+public:
+    ActionMap* createActionMap(RawXmlDataMap& rawMap) override {
+        auto* map = new ActionMap();
+        for (const auto& entry : rawMap) {
+            auto* head = new Action();
+            head->mCmdId = entry.second->cmdId;
+            head->mName = entry.second->name;
+            Action* tail = head;
+            for (const RawXmlData* rec = entry.second->next; rec != nullptr; rec = rec->next) {
+                tail->mNext = convertRecord(*rec);
+                tail = tail->mNext;
+            }
+            (*map)[entry.first] = head;
+        }
+        return map;
+    }
+};
+
+}  // namespace
+
+int NoopExecutor::doAction(const Action* action, unsigned int payloadNum, const int* payload) {
+    if (action != nullptr && action->mCmdId == kProbeCmdId && payloadNum == 1 &&
+        payload != nullptr && payload[0] == 0) {
+        const ProbeBoostHook hook = gProbeHook.load(std::memory_order_acquire);
+        if (hook != nullptr) {
+            hook(gProbeTid.load(std::memory_order_relaxed), pthread_self());
+        }
+    }
+    return 0;
+}
+
+int NoopExecutor::doPerfSetConfig(int, int, const int*, const int*) {
+    return 0;
+}
+
+int NoopExecutor::doPerfGetConfig(int, const int*, int*) {
+    return 0;
+}
+
+int NoopExecutor::doSchedLevelAction(int, const int*, const int*) {
+    return 0;
+}
+
+int NoopExecutor::setProbeTid(unsigned int tid, int state) {
+    if (state == 0) {
+        gProbeTid.store(tid, std::memory_order_relaxed);
+    }
+    return 0;
+}
+
+void setConfigPath(const std::string& path) {
+    gConfigPath = path;
+}
+
+void setProbeBoostHook(ProbeBoostHook hook) {
+    gProbeHook.store(hook, std::memory_order_release);
+}
+
+NoopExecutor& executor() {
+    static NoopExecutor instance;
+    return instance;
+}
+
+}  // namespace bench
+}  // namespace velmora
+
+VelmoraPlat* getPlat() {
+    return new velmora::bench::BenchPlatform();
+}
+
+VelmoraLoadXml* createVelmoraLoadXml() {
+    return new velmora::bench::BenchLoadXml();
+}
+
+OnDemandBoostServer* OnDemandBoostServer::getInstance() {
+    static OnDemandBoostServer instance;
+    return &instance;
+}
+
+int OnDemandBoostServer::getPolicy(const char*) {
+    return -1;
+}
+
+extern "C" int property_get(const char*, char* value, const char* defaultValue) {
+    snprintf(value, VELMORA_PROPERTY_VALUE_MAX, "%s", defaultValue != nullptr ? defaultValue : "");
+    return static_cast<int>(strlen(value));
+}
+
+extern "C" char* get_one_cfg_file(const char*, int, char* buf) {
+    if (velmora::bench::gConfigPath.empty()) {
+        return nullptr;
+    }
+    snprintf(buf, 128, "%s", velmora::bench::gConfigPath.c_str());
+    return buf;
+}
+
+extern "C" int __zklog_jank_print(int, int, const char*, ...) {
+    return 0;
+}
