@@ -28,8 +28,8 @@ ProbeHandler::~ProbeHandler() {
     // handler (mBoostDelayMs) and the platform object after the server has deleted both; a
     // host may delete and recreate the server at any time. Stopping it here, and waiting for
     // it, is the last moment at which the handler is still whole. The platform object is
-    // already gone when the server deletes us, so the server should stop the worker before it
-    // deletes the platform (stopProbeThread()).
+    // already gone when the server deletes us, which is why the server stops the worker
+    // (stopProbeThread()) before it deletes the platform; this call then does nothing.
     stopProbeThread();
     mProbeThreadPtr.clear();
 }

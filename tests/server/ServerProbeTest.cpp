@@ -36,15 +36,6 @@ std::string commandsWithProbe(int duration, int value) {
 
 class ServerProbeTest : public ServerTest {
 protected:
-    void TearDown() override {
-        // The server deletes the platform object before the probe handler; the worker must
-        // not be left running in between with the platform already freed.
-        if (mServer != nullptr && mServer->mProbeHandler != nullptr) {
-            mServer->mProbeHandler->stopProbeThread();
-        }
-        ServerTest::TearDown();
-    }
-
     int startWithProbe(int duration, int value) {
         writeCustConfig(policyXml(commandsWithProbe(duration, value)));
         mServer = std::make_unique<VelmoraServer>();
@@ -126,6 +117,21 @@ TEST_F(ServerProbeTest, StartupActionIsCappedReloadedOneIsNot) {
     const auto action = executor().calls(Op::DoAction)[1];
     EXPECT_EQ(action.duration, 500);
     EXPECT_EQ(action.tagValues, (std::vector<int>{1, 2000}));
+}
+
+// Releasing the components while a thread is boosted and another waits: the worker is gone
+// with them, so neither the pending boost nor the withdrawal ever reaches the platform.
+TEST_F(ServerProbeTest, ReleasingComponentsStopsPendingProbeWork) {
+    ASSERT_EQ(startServer(), 0);
+    executor().clear();
+    EXPECT_EQ(probe("pid=12|tid=34", 0), 0);
+    ASSERT_TRUE(executor().waitFor(Op::DoAction, 1, kBoostDelay + kTolerance));
+    EXPECT_EQ(probe("pid=12|tid=35", 0), 0);
+
+    mServer->deleteObject();
+    const size_t before = executor().calls(Op::ProbeTid).size();
+    EXPECT_FALSE(executor().waitFor(Op::ProbeTid, before + 1, 3 * kBoostDelay));
+    EXPECT_EQ(probe("pid=12|tid=34", -1), 4);
 }
 
 // Reloads replace the probe action while host threads queue, boost and withdraw threads and
