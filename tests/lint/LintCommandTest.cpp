@@ -150,7 +150,8 @@ const UsageRow kUsageRows[] = {
     {"UnknownOption", {"--fix", "c.xml"}, "velmora-lint: unknown option --fix"},
     {"MissingFile", {"DIR/none.xml"}, "velmora-lint: DIR/none.xml: No such file or directory"},
     {"Directory", {"DIR"}, "velmora-lint: DIR: is a directory"},
-    {"TwoFiles", {"DIR/a.xml", "DIR/b.xml"},
+    {"TwoFiles",
+     {"DIR/a.xml", "DIR/b.xml"},
      "velmora-lint: more than one configuration given (DIR/a.xml, DIR/b.xml)"},
 };
 

@@ -79,6 +79,10 @@ const Row kRows[] = {
      {"F:6: error: parameter <big_min> of command 4099 has no text: the loader drops the whole "
       "action"},
      2},
+    {"IdBeyondTheIntRangeWraps",
+     withBase("<cmd id=\"4294971395\"><a><duration>10</duration></a></cmd>\n"),
+     {"F:4: warning: id \"4294971395\" does not fit an int: the loader reads it as 4099"},
+     0},
     {"IdBelowFour",
      withBase("<cmd id=\"3\" name=\"a\"><a><duration>10</duration></a></cmd>\n"),
      {"F:4: warning: command id 3 is below 4: the platform cannot tell it from the client ids "

@@ -87,8 +87,8 @@ std::string CommandClass::effect(DispatchClass dispatchClass, int cmdId, int dur
         case DispatchClass::kTimedAction:
             break;
     }
-    std::string text = "the platform applies the pairs and reverts them after " +
-                       std::to_string(duration) + " ms";
+    std::string text =
+        "the platform applies the pairs and reverts them after " + std::to_string(duration) + " ms";
     if (cmdId == 4098 || cmdId == 4099) {
         text += "; the launch policy \"";
         text += cmdId == 4099 ? "cold" : "winswitch";

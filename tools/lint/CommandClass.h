@@ -9,17 +9,17 @@
 namespace velmora {
 
 enum class DispatchClass {
-    kMemoryLatency,   // 20481: applied on and off through the platform, whatever the duration
-    kNeverRead,       // 20480 and the other ids from 20224 up: events never read the configuration
-    kProbe,           // 4116: the probe boost applied to probed threads
-    kNoAction,        // no usable action: events parse a default action and do nothing
-    kDisabled,        // negative duration: events do nothing
-    kSpecialScene,    // 4118..4223
-    kGovernorScene,   // 4224..4352
-    kOnOff,           // 12288..13568
-    kStartupLevels,   // 5376 with duration 0: the default scheduling-group levels
-    kSchedLevel,      // duration 0: scheduling-group levels
-    kTimedAction,     // positive duration: a platform action for that many ms
+    kMemoryLatency,  // 20481: applied on and off through the platform, whatever the duration
+    kNeverRead,      // 20480 and the other ids from 20224 up: events never read the configuration
+    kProbe,          // 4116: the probe boost applied to probed threads
+    kNoAction,       // no usable action: events parse a default action and do nothing
+    kDisabled,       // negative duration: events do nothing
+    kSpecialScene,   // 4118..4223
+    kGovernorScene,  // 4224..4352
+    kOnOff,          // 12288..13568
+    kStartupLevels,  // 5376 with duration 0: the default scheduling-group levels
+    kSchedLevel,     // duration 0: scheduling-group levels
+    kTimedAction,    // positive duration: a platform action for that many ms
 };
 
 class CommandClass {

@@ -22,9 +22,8 @@ constexpr const char* kPriorityKey = "priority";
 constexpr int kMaxProbeDurationMs = 100;
 
 const char* const kEasGroupNames[kEasGroupCount] = {
-    "group_boost",      "group_vip",
-    "group_top_app",    "group_root",
-    "group_foreground", "group_system_background",
+    "group_boost",          "group_vip",        "group_top_app",
+    "group_root",           "group_foreground", "group_system_background",
     "group_key_background", "group_background",
 };
 
@@ -123,8 +122,7 @@ void CommandRules::checkStartup(const CheckedCommand* command) {
     if (duration != 0) {
         mDiagnostics.error(durationLine(*record),
                            "start-up command 5376 needs duration 0, not " + str(duration) +
-                               (duration < 0 ? ": it is disabled"
-                                             : ": it runs as a timed action") +
+                               (duration < 0 ? ": it is disabled" : ": it runs as a timed action") +
                                " and init installs no default group levels");
         return;
     }
@@ -231,9 +229,9 @@ void CommandRules::checkCommand(const CheckedCommand& command) {
             break;
         case DispatchClass::kDisabled:
             if (command.id != CommandClass::kStartupCmdId) {
-                mDiagnostics.note(durationLine(*record), "command " + id + " is disabled (duration " +
-                                                             str(duration) +
-                                                             "): its events do nothing");
+                mDiagnostics.note(durationLine(*record),
+                                  "command " + id + " is disabled (duration " + str(duration) +
+                                      "): its events do nothing");
             }
             break;
         case DispatchClass::kSpecialScene:
@@ -348,8 +346,8 @@ void CommandRules::checkScenePriority(const CheckedCommand& command, const Check
     const std::string source = governor ? "<priority>" : "priority (tag 101)";
     if (!given) {
         if (builtIn == 0) {
-            mDiagnostics.error(record.located->line, kind + id + " has no " + source +
-                                                         ": every switch is refused (-1)");
+            mDiagnostics.error(record.located->line,
+                               kind + id + " has no " + source + ": every switch is refused (-1)");
         }
         return;
     }

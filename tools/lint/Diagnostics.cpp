@@ -33,8 +33,9 @@ void Diagnostics::attachNote(int line, const std::string& message) {
 }
 
 int Diagnostics::count(Severity severity) const {
-    return static_cast<int>(std::count_if(mFindings.begin(), mFindings.end(),
-                                          [&](const Diagnostic& d) { return d.severity == severity; }));
+    return static_cast<int>(
+        std::count_if(mFindings.begin(), mFindings.end(),
+                      [&](const Diagnostic& d) { return d.severity == severity; }));
 }
 
 void Diagnostics::printOne(std::ostream& out, const Diagnostic& finding) const {

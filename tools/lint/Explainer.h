@@ -1,6 +1,6 @@
-// The --explain listing: for every command the server holds, in document order, how an event of it is
-// dispatched (class, duration, priority of scenes) and which pairs the dispatched record carries,
-// so a reader sees what the device will do with the configuration:
+// The --explain listing: for every command the server holds, in document order, how an event of it
+// is dispatched (class, duration, priority of scenes) and which pairs the dispatched record
+// carries, so a reader sees what the device will do with the configuration:
 //
 //   4099 cold_launch (line 33): timed action, duration 1500, 2 pairs
 //       little_min(1)=1804800 big_min(4)=2419200

@@ -42,8 +42,7 @@ void LintCommand::printUsage(std::ostream& to) {
        << "usage error.\n";
 }
 
-int LintCommand::run(const std::vector<std::string>& args, std::ostream& out,
-                     std::ostream& err) {
+int LintCommand::run(const std::vector<std::string>& args, std::ostream& out, std::ostream& err) {
     LintOptions options;
     std::string path;
     bool pathGiven = false;

@@ -1,5 +1,6 @@
 #include "tools/lint/LoadChecker.h"
 
+#include <cstdlib>
 #include <set>
 
 #include "tools/lint/ConversionChecker.h"
@@ -34,8 +35,8 @@ bool sameParams(const RawXmlData& record, const LocatedAction& action) {
 }  // namespace
 
 void LoadChecker::disagree(int line, const std::string& what) {
-    mDiagnostics.error(line, "the checker and the library's loader disagree: " + what +
-                                 " (please report this)");
+    mDiagnostics.error(
+        line, "the checker and the library's loader disagree: " + what + " (please report this)");
 }
 
 bool LoadChecker::check(std::vector<CheckedCommand>* commands) {
@@ -52,9 +53,9 @@ bool LoadChecker::check(std::vector<CheckedCommand>* commands) {
     }
     for (const auto& entry : mLoader.rawMap()) {
         if (effective.count(entry.first) == 0) {
-            disagree(mLocated.rootLine(),
-                     "the loader holds command " + std::to_string(entry.first) +
-                         " but no element defines it");
+            disagree(mLocated.rootLine(), "the loader holds command " +
+                                              std::to_string(entry.first) +
+                                              " but no element defines it");
         }
     }
     if (mLoader.rawMap().empty()) {
@@ -115,6 +116,12 @@ void LoadChecker::checkCommandElement(const LocatedCommand& command) {
         return;
     }
     const std::string id = std::to_string(command.id);
+    // tinyxml2 converts with sscanf: text beyond the int range wraps instead of failing.
+    if (strtoll(command.idText.c_str(), nullptr, 10) != command.id) {
+        mDiagnostics.warning(command.line, "id \"" + command.idText +
+                                               "\" does not fit an int: the loader reads it as " +
+                                               id);
+    }
     const LocatedCommand* first = mLocated.firstWithId(command.id);
     if (first != &command) {
         mDiagnostics.warning(command.line, "duplicate command id " + id +
@@ -145,8 +152,8 @@ void LoadChecker::reportDroppedAction(const LocatedCommand& command, const Locat
             return;
         }
     }
-    disagree(action.line, "the loader dropped an action of command " + id +
-                              " whose parameters all have text");
+    disagree(action.line,
+             "the loader dropped an action of command " + id + " whose parameters all have text");
 }
 
 CheckedCommand LoadChecker::checkActions(const LocatedCommand& command) {
@@ -170,8 +177,8 @@ CheckedCommand LoadChecker::checkActions(const LocatedCommand& command) {
             continue;
         }
         if (converted == nullptr) {
-            disagree(action.line, "the conversion left out an action of command " +
-                                      std::to_string(command.id));
+            disagree(action.line,
+                     "the conversion left out an action of command " + std::to_string(command.id));
             break;
         }
         checked.records.push_back(conversion.check(command.id, action, *converted));

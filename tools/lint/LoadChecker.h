@@ -23,8 +23,8 @@ namespace velmora {
 
 // One converted record of a command (the server dispatches the first one).
 struct CheckedRecord {
-    const Action* action = nullptr;           // owned by the LoaderRun
-    const LocatedAction* located = nullptr;   // owned by the LocatedConfig
+    const Action* action = nullptr;               // owned by the LoaderRun
+    const LocatedAction* located = nullptr;       // owned by the LocatedConfig
     std::vector<const LocatedParam*> pairParams;  // element of each pair, index for index
     const LocatedParam* durationParam = nullptr;  // element that set mDuration, or null
 };

@@ -12,7 +12,7 @@ namespace velmora {
 
 namespace {
 
-std::mutex gSinkLock;                      // guards gSink
+std::mutex gSinkLock;                       // guards gSink
 std::vector<std::string>* gSink = nullptr;  // where captureLogger appends; null: dropped
 
 void captureLogger(const struct __android_logger_data* /*data*/, const char* message) {
