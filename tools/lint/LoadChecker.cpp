@@ -118,9 +118,9 @@ void LoadChecker::checkCommandElement(const LocatedCommand& command) {
     const std::string id = std::to_string(command.id);
     // tinyxml2 converts with sscanf: text beyond the int range wraps instead of failing.
     if (strtoll(command.idText.c_str(), nullptr, 10) != command.id) {
-        mDiagnostics.warning(command.line, "id \"" + command.idText +
-                                               "\" does not fit an int: the loader reads it as " +
-                                               id);
+        mDiagnostics.warning(
+            command.line,
+            "id \"" + command.idText + "\" does not fit an int: the loader reads it as " + id);
     }
     const LocatedCommand* first = mLocated.firstWithId(command.id);
     if (first != &command) {
