@@ -1,5 +1,8 @@
 // Client configuration requests, queries and the debug dump.
 #include <errno.h>
+#include <pthread.h>
+#include <signal.h>
+#include <time.h>
 #include <unistd.h>
 
 #include <utils/String8.h>
@@ -33,6 +36,30 @@ void writeAll(int fd, const char* text, size_t length) {
         text += n;
         length -= static_cast<size_t>(n);
     }
+}
+
+// A reader that went away (a dump tool interrupted by its user) makes a pipe write raise
+// SIGPIPE, whose default action ends the whole host process. The signal is blocked on this
+// thread around the write; one that the write raised is taken back before the old mask
+// returns, one that was already pending is left alone.
+void writeReply(int fd, const char* text, size_t length) {
+    sigset_t pipeSet;
+    sigset_t oldSet;
+    sigset_t pending;
+    sigemptyset(&pipeSet);
+    sigaddset(&pipeSet, SIGPIPE);
+    pthread_sigmask(SIG_BLOCK, &pipeSet, &oldSet);
+    sigemptyset(&pending);
+    sigpending(&pending);
+    const bool wasPending = sigismember(&pending, SIGPIPE) == 1;
+    writeAll(fd, text, length);
+    sigemptyset(&pending);
+    sigpending(&pending);
+    if (!wasPending && sigismember(&pending, SIGPIPE) == 1) {
+        const struct timespec noWait = {0, 0};
+        sigtimedwait(&pipeSet, nullptr, &noWait);
+    }
+    pthread_sigmask(SIG_SETMASK, &oldSet, nullptr);
 }
 
 }  // namespace
@@ -145,5 +172,5 @@ void VelmoraServer::dumpVelmoraServerInfo(int fd, const std::vector<std::string>
         out.append("invalid parameter!\n");
     }
     out.append("\n");
-    writeAll(fd, out.string(), out.length());
+    writeReply(fd, out.string(), out.length());
 }
