@@ -23,7 +23,6 @@ namespace fake {
 namespace {
 
 constexpr int kOn = 0;
-constexpr int kOff = -1;
 constexpr int kScene = 4118;
 constexpr int kTimed = 4098;
 constexpr int kKxCap = 1200000;
