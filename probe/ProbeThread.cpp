@@ -215,9 +215,15 @@ bool ProbeHandler::ProbeThread::threadLoop() {
             const sp<ProbeItem> item = mBoostedQueue.valueAt(i);
             if (item->timestamp == 0) {
                 mBoostedQueue.removeItemsAt(i);
-            } else if (now - item->timestamp >= kBoostLifetimeNs && item->tid != 0) {
+            } else if (now - item->timestamp >= kBoostLifetimeNs) {
                 // Only marked here; the entry goes on a later pass like any withdrawal.
-                moveItemToUnboostQueue(item->tid);
+                if (item->tid != 0) {
+                    moveItemToUnboostQueue(item->tid);
+                } else {
+                    // Thread 0 was never boosted on the platform, so there is nothing to
+                    // withdraw; it still has to expire, or the loop would poll forever.
+                    item->timestamp = 0;
+                }
             }
         }
         if (i > 0) {

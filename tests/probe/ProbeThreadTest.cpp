@@ -102,10 +102,11 @@ TEST_F(ProbeThreadTest, ThreadIdZeroIsMovedButNeverSentByWorker) {
     const int64_t boostedAt = boostedTimestamp(0);
     EXPECT_EQ(waitTimestamp(0), -1);
 
-    // Past its lifetime the entry is still there: the worker never withdraws thread 0.
+    // Past its lifetime the entry expires like any other, without a withdrawal on the
+    // platform, and the worker goes back to waiting instead of polling for it forever.
+    ASSERT_TRUE(waitUntil([&] { return boostedTimestamp(0) == -1; }, kBoostLifetime + kTolerance));
     const auto expiry = Clock::time_point(std::chrono::nanoseconds(boostedAt)) + kBoostLifetime;
-    waitUntil([&] { return Clock::now() > expiry + 4 * kBoostDelay; }, kBoostLifetime + kTolerance);
-    EXPECT_EQ(boostedTimestamp(0), boostedAt);
+    EXPECT_GE(Clock::now(), expiry);
     EXPECT_TRUE(mExecutor.calls().empty());
 }
 
