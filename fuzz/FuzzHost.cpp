@@ -7,6 +7,7 @@
 #include <cstdlib>
 
 #include "host/HostEnvironment.h"
+#include "probe/ProbeHandler.h"
 #include "server/VelmoraServer.h"
 
 namespace velmora {
@@ -15,6 +16,20 @@ namespace fuzz {
 namespace {
 
 void dropLine(const struct __android_logger_data* /*data*/, const char* /*message*/) {}
+
+VelmoraServer* gServer = nullptr;
+
+// At exit: stop the probe worker, then release the components (the platform's destructor stops
+// the host layer's timer thread). The server object itself stays, as a host's would.
+void stopServer() {
+    if (gServer == nullptr) {
+        return;
+    }
+    if (gServer->mProbeHandler != nullptr) {
+        gServer->mProbeHandler->stopProbeThread();
+    }
+    gServer->deleteObject();
+}
 
 void mkdirs(const std::string& dir) {
     for (size_t pos = 1; pos != std::string::npos;) {
@@ -61,6 +76,10 @@ VelmoraServer& server(const char* name) {
             fprintf(stderr, "fuzz: server init failed with %d\n", ret);
             abort();
         }
+        gServer = s;
+        // Registered after the host environment exists, so it runs before the environment's
+        // destructor: the probe worker and the host layer's timer thread must be gone by then.
+        atexit(stopServer);
         return s;
     }();
     return *instance;
