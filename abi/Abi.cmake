@@ -1,0 +1,23 @@
+# Interface checks, as CTest tests of every build that has tests:
+#   abi.<arch>          scripts/check-abi: field and virtual-slot layout of the host-facing types
+#                       and the exported symbols of libvelmora.so, against abi/<arch>/
+#   android_bp.sources  scripts/check-android-bp: Android.bp builds the sources of `velmora`
+# Included at the end of the top-level CMakeLists.
+if(NOT BUILD_TESTING)
+    return()
+endif()
+
+# Sanitizer builds export instrumentation symbols of their own; the reference describes the
+# plain library.
+if(VELMORA_SANITIZE STREQUAL "" AND CMAKE_SYSTEM_PROCESSOR MATCHES "^(x86_64|aarch64)$")
+    add_test(NAME abi.${CMAKE_SYSTEM_PROCESSOR}
+             COMMAND ${PROJECT_SOURCE_DIR}/scripts/check-abi ${PROJECT_BINARY_DIR}
+                     ${CMAKE_SYSTEM_PROCESSOR})
+endif()
+
+find_package(Python3 COMPONENTS Interpreter QUIET)
+if(Python3_Interpreter_FOUND)
+    add_test(NAME android_bp.sources
+             COMMAND ${Python3_EXECUTABLE} ${PROJECT_SOURCE_DIR}/scripts/check-android-bp
+                     ${PROJECT_BINARY_DIR})
+endif()
