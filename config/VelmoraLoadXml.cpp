@@ -1,9 +1,9 @@
 #include "config/VelmoraLoadXml.h"
 
-#include <ctype.h>
 #include <tinyxml2.h>
 
 #include "compat/BoundedString.h"
+#include "config/DecimalText.h"
 #include "platform/PlatformImports.h"
 #include "platform/VelmoraLog.h"
 
@@ -21,31 +21,10 @@ constexpr const char* kCustConfigSuffix = "xml/velmora_config_cust.xml";
 // A command keeps at most this many action elements; later ones are ignored.
 constexpr int kMaxActionsPerCommand = 3;
 
-// Reads a decimal integer attribute. Newer tinyxml2 releases also accept hexadecimal text
-// such as "0x10"; configurations written for devices must not depend on that, so only
-// decimal text counts as an integer here.
+// Reads an integer attribute written in decimal (see DecimalText.h).
 bool queryDecimalAttribute(const tinyxml2::XMLElement* element, const char* name, int* out) {
-    const char* text = element->Attribute(name);
-    if (text == nullptr) {
-        return false;
-    }
-    const char* p = text;
-    while (isspace(static_cast<unsigned char>(*p))) {
-        ++p;
-    }
-    if (*p == '+' || *p == '-') {
-        ++p;
-    }
-    if (!isdigit(static_cast<unsigned char>(*p))) {
-        return false;
-    }
-    while (isdigit(static_cast<unsigned char>(*p))) {
-        ++p;
-    }
-    while (isspace(static_cast<unsigned char>(*p))) {
-        ++p;
-    }
-    return *p == '\0' && element->QueryIntAttribute(name, out) == tinyxml2::XML_SUCCESS;
+    return velmora::isDecimalText(element->Attribute(name)) &&
+           element->QueryIntAttribute(name, out) == tinyxml2::XML_SUCCESS;
 }
 
 }  // namespace

@@ -70,6 +70,24 @@ void ServerTest::writeCloudConfig(const std::string& incremental, const std::str
     env().incremental = incremental;
 }
 
+std::string ServerTest::dump(const std::string& option) {
+    int fds[2];
+    if (pipe(fds) != 0) {
+        ADD_FAILURE() << "pipe failed";
+        return "";
+    }
+    mServer->dumpVelmoraServerInfo(fds[1], {option});
+    close(fds[1]);
+    std::string text;
+    char buf[4096];
+    ssize_t n;
+    while ((n = read(fds[0], buf, sizeof(buf))) > 0) {
+        text.append(buf, static_cast<size_t>(n));
+    }
+    close(fds[0]);
+    return text;
+}
+
 int ServerTest::startServer(const std::string& extraCommands) {
     writeCustConfig(policyXml(std::string(kStartupCommands) + extraCommands));
     mServer = std::make_unique<VelmoraServer>();

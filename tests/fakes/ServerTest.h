@@ -34,6 +34,9 @@ protected:
     // server and runs init. Returns init's status.
     int startServer(const std::string& extraCommands = "");
 
+    // What the server writes to a descriptor for one dump option.
+    std::string dump(const std::string& option);
+
     FakeEnv& env() { return FakeEnv::get(); }
     FakeExecutor& executor() { return FakeEnv::get().executor; }
 

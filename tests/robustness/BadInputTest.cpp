@@ -50,23 +50,6 @@ protected:
         LogCapture::clear();
     }
 
-    std::string dump(const std::string& option) {
-        int fds[2];
-        if (pipe(fds) != 0) {
-            ADD_FAILURE() << "pipe failed";
-            return "";
-        }
-        mServer->dumpVelmoraServerInfo(fds[1], {option});
-        close(fds[1]);
-        std::string text;
-        char buf[4096];
-        ssize_t n;
-        while ((n = read(fds[0], buf, sizeof(buf))) > 0) {
-            text.append(buf, static_cast<size_t>(n));
-        }
-        close(fds[0]);
-        return text;
-    }
 
     // What was accepted before is still in force: the client cap is listed, the scene is still
     // current, and the configured timed action still runs.

@@ -39,20 +39,7 @@ protected:
     }
 
     // What the server writes for "--easgrouplist".
-    std::string easDumpText() {
-        int fds[2];
-        EXPECT_EQ(pipe(fds), 0);
-        mServer->dumpVelmoraServerInfo(fds[1], {"--easgrouplist"});
-        close(fds[1]);
-        std::string text;
-        char buf[512];
-        ssize_t n;
-        while ((n = read(fds[0], buf, sizeof(buf))) > 0) {
-            text.append(buf, static_cast<size_t>(n));
-        }
-        close(fds[0]);
-        return text;
-    }
+    std::string easDumpText() { return dump("--easgrouplist"); }
 
     std::vector<ExecutorCall> sent() { return executor().calls(Op::SchedLevel); }
 };

@@ -178,23 +178,6 @@ protected:
         ServerTest::TearDown();
     }
 
-    std::string dump(const std::string& option) {
-        int fds[2];
-        if (pipe(fds) != 0) {
-            ADD_FAILURE() << "pipe failed";
-            return "";
-        }
-        mServer->dumpVelmoraServerInfo(fds[1], {option});
-        close(fds[1]);
-        std::string text;
-        char buf[1024];
-        ssize_t n;
-        while ((n = read(fds[0], buf, sizeof(buf))) > 0) {
-            text.append(buf, static_cast<size_t>(n));
-        }
-        close(fds[0]);
-        return text;
-    }
 
     std::string mVariantB;
 };

@@ -1,5 +1,7 @@
 #include "tools/lint/LocatedConfig.h"
 
+#include "config/DecimalText.h"
+
 #include <ctype.h>
 #include <tinyxml2.h>
 
@@ -31,7 +33,7 @@ LocatedCommand locateCommand(const tinyxml2::XMLElement* element) {
     command.hasIdAttribute = id != nullptr;
     command.idText = id != nullptr ? id : "";
     // The same two steps as the loader: the text must be decimal, then tinyxml2 converts it.
-    command.idIsDecimal = id != nullptr && LocatedConfig::isDecimalText(id) &&
+    command.idIsDecimal = id != nullptr && isDecimalText(id) &&
                           element->QueryIntAttribute("id", &command.id) == tinyxml2::XML_SUCCESS;
     const char* name = element->Attribute("name");
     command.name = name != nullptr ? name : "unknown";
@@ -43,26 +45,6 @@ LocatedCommand locateCommand(const tinyxml2::XMLElement* element) {
 }
 
 }  // namespace
-
-bool LocatedConfig::isDecimalText(const char* text) {
-    const char* p = text;
-    while (isspace(static_cast<unsigned char>(*p))) {
-        ++p;
-    }
-    if (*p == '+' || *p == '-') {
-        ++p;
-    }
-    if (!isdigit(static_cast<unsigned char>(*p))) {
-        return false;
-    }
-    while (isdigit(static_cast<unsigned char>(*p))) {
-        ++p;
-    }
-    while (isspace(static_cast<unsigned char>(*p))) {
-        ++p;
-    }
-    return *p == '\0';
-}
 
 bool LocatedConfig::load(const std::string& path) {
     // Entity processing on, like the loader, so that texts compare equal.

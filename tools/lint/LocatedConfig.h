@@ -55,10 +55,6 @@ public:
     // The located command that defines `id` for the loader (the first one with it), or null.
     const LocatedCommand* firstWithId(int id) const;
 
-    // True for the decimal integer text the loader accepts as an attribute: blanks, an
-    // optional sign, digits, blanks. (tinyxml2 itself would also take "0x10".)
-    static bool isDecimalText(const char* text);
-
 private:
     std::string mXmlError;
     int mErrorLine = 0;
