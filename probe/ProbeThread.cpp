@@ -1,6 +1,7 @@
 #include "probe/ProbeThread.h"
 
-#include <unistd.h>
+#include <errno.h>
+#include <time.h>
 #include <utils/Timers.h>
 
 #include "config/Action.h"
@@ -23,6 +24,14 @@ constexpr int32_t kProbeThreadPriority = -2;
 
 constexpr int kStateBoost = 0;
 constexpr int kStateUnboost = -1;
+
+// Sleeps the whole time even when a signal interrupts the sleep: waking early would boost a
+// larger thread id that falls due before the smallest one, ahead of the pass meant for both.
+void sleepWholeMs(int64_t ms) {
+    struct timespec left = {static_cast<time_t>(ms / 1000), static_cast<long>(ms % 1000) * 1000000};
+    while (nanosleep(&left, &left) != 0 && errno == EINTR) {
+    }
+}
 
 int64_t monotonicNow() {
     return systemTime(SYSTEM_TIME_MONOTONIC);
@@ -242,6 +251,6 @@ bool ProbeHandler::ProbeThread::threadLoop() {
     mLock.unlock();
     // With only boosted items left sleepMs is 0 and the loop polls until they expire or are
     // withdrawn: CPU time traded for a lifetime that ends on time without a timed wait.
-    usleep(static_cast<useconds_t>(sleepMs * 1000));
+    sleepWholeMs(sleepMs);
     return true;
 }
