@@ -21,7 +21,7 @@ const char* const kSchedCommands =
     "<cmd id=\"4114\" name=\"zola_reference\"><act><duration>0</duration>"
     "<t53>20</t53><t54>10</t54></act></cmd>"
     "<cmd id=\"4113\" name=\"zola_follower\"><act><duration>0</duration>"
-    "<t53>0</t53><t54>0</t54></act></cmd>"
+    "<t53>0</t53><t54>0</t54><t55>10</t55></act></cmd>"
     "<cmd id=\"4500\" name=\"top_app_up\"><act><duration>0</duration><t53>30</t53></act></cmd>"
     "<cmd id=\"4501\" name=\"bad_tag\"><act><duration>0</duration><t53>30</t53><t42>1</t42>"
     "</act></cmd>";
@@ -45,10 +45,31 @@ protected:
 };
 
 TEST_F(ServerSchedTest, EasDefaultsAreInstalledAtStartUpWithoutPlatformCall) {
-    ASSERT_EQ(startServer(kSchedCommands), 0);
+    // Distinct levels for tags 56 and 57: the dump lists key-background before
+    // system-background, against the tag order.
+    std::string pairs;
+    for (int tag = 51; tag <= 58; ++tag) {
+        const int level = tag == 56 ? 6 : tag == 57 ? 7 : 0;
+        pairs += "<t" + std::to_string(tag) + ">" + std::to_string(level) + "</t" +
+                 std::to_string(tag) + ">";
+    }
+    writeCustConfig(policyXml(startupWith(pairs)));
+    mServer = std::make_unique<VelmoraServer>();
+    ASSERT_EQ(mServer->init(), 0);
     EXPECT_TRUE(sent().empty());
-    const auto zeros = easLevels(0);
-    EXPECT_EQ(easDumpText(), easDump(zeros, zeros, zeros, zeros, zeros) + "\n");
+    const std::string text = easDumpText();
+    EXPECT_EQ(text.substr(0, text.find("current eas group value is:\n")),
+              "default eas group value is:\n"
+              "group=boost,             value=0\n"
+              "group=vip,               value=0\n"
+              "group=top-app,           value=0\n"
+              "group=root,              value=0\n"
+              "group=foreground,        value=0\n"
+              "group=key-background,    value=7\n"
+              "group=system-background, value=6\n"
+              "group=background,        value=0\n");
+    const auto defaults = easLevels(0, {{56, 6}, {57, 7}});
+    EXPECT_EQ(text, easDump(defaults, defaults, defaults, defaults, defaults) + "\n");
 }
 
 TEST_F(ServerSchedTest, HmpDefaultDrivesTheSingleGroup) {
@@ -149,6 +170,8 @@ TEST_F(ServerSchedTest, EventReachesThePlatformOnlyWhenItChangesALevel) {
 
     EXPECT_EQ(mServer->velmoraEvent(4500, "", 0, nullptr), 0);
     EXPECT_EQ(sent().size(), 1u);
+    const auto zola = easLevels(-100, {{53, 30}});
+    EXPECT_EQ(easDumpText(), easDump(easLevels(0), zola, easLevels(0), easLevels(0), zola) + "\n");
 }
 
 TEST_F(ServerSchedTest, FollowerMovesOnlyGroupsStillAtTheReference) {
@@ -159,7 +182,8 @@ TEST_F(ServerSchedTest, FollowerMovesOnlyGroupsStillAtTheReference) {
 
     EXPECT_EQ(mServer->velmoraEvent(4113, "", 0, nullptr), 0);
     ASSERT_EQ(sent().size(), 1u);
-    EXPECT_EQ(sent()[0].values, std::vector<int>({-100, -100, 30, 0, -100, -100, -100, -100}));
+    // 53 moved away from the reference and stays; 54 still at it and 55 unset in both move.
+    EXPECT_EQ(sent()[0].values, std::vector<int>({-100, -100, 30, 0, 10, -100, -100, -100}));
 }
 
 TEST_F(ServerSchedTest, RejectedOrFailedEventIsReportedAsActionFailure) {
