@@ -70,13 +70,13 @@ void ServerTest::writeCloudConfig(const std::string& incremental, const std::str
     env().incremental = incremental;
 }
 
-std::string ServerTest::dump(const std::string& option) {
+std::string ServerTest::dumpArgs(const std::vector<std::string>& args) {
     int fds[2];
     if (pipe(fds) != 0) {
         ADD_FAILURE() << "pipe failed";
         return "";
     }
-    mServer->dumpVelmoraServerInfo(fds[1], {option});
+    mServer->dumpVelmoraServerInfo(fds[1], args);
     close(fds[1]);
     std::string text;
     char buf[4096];

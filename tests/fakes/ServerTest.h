@@ -6,6 +6,7 @@
 
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "server/VelmoraServer.h"
 #include "tests/fakes/FakeEnv.h"
@@ -34,8 +35,9 @@ protected:
     // server and runs init. Returns init's status.
     int startServer(const std::string& extraCommands = "");
 
-    // What the server writes to a descriptor for one dump option.
-    std::string dump(const std::string& option);
+    // What the server writes to a descriptor for one dump option, or for any argument list.
+    std::string dump(const std::string& option) { return dumpArgs({option}); }
+    std::string dumpArgs(const std::vector<std::string>& args);
 
     FakeEnv& env() { return FakeEnv::get(); }
     FakeExecutor& executor() { return FakeEnv::get().executor; }

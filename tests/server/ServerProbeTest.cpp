@@ -64,7 +64,11 @@ TEST_F(ServerProbeTest, BoostsAfterDelayWithConfiguredActionAndWithdrawsOnReques
     EXPECT_EQ(tidCalls(), (TidCalls{{34, 0}}));
     const auto calls = executor().calls();
     ASSERT_EQ(calls.size(), 2u);
+    // The thread is selected before the action runs, neither before the delay nor long after.
+    EXPECT_EQ(calls[0].op, Op::ProbeTid);
     EXPECT_GE(calls[0].when - queued, kBoostDelay);
+    EXPECT_LE(calls[0].when - queued, kBoostDelay + kTolerance);
+    EXPECT_EQ(calls[1].op, Op::DoAction);
     EXPECT_EQ(calls[1].id, kProbe);
     EXPECT_EQ(calls[1].name, "probe");
     EXPECT_EQ(calls[1].duration, 8);

@@ -86,28 +86,6 @@ TEST_F(VelmoraServerInitTest, MissingProbeCommandKeepsServerRunning) {
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "init mProbeHandler failed!"));
 }
 
-TEST_F(VelmoraServerInitTest, DeleteObjectReleasesComponentsButStaysInitialised) {
-    ASSERT_EQ(startServer(), 0);
-    mServer->deleteObject();
-    EXPECT_EQ(env().platformsDeleted, 1);
-    EXPECT_EQ(mServer->velmoraEvent(4400, "", 0, nullptr), 4);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "isVelmoraEnable mPlatPtr failed!"));
-    const int tag = 2;
-    const int value = 1000;
-    EXPECT_EQ(mServer->velmoraSetConfig(1, 1, &tag, &value), 4);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "init mFreqClientPtr failed!"));
-    int out = 0;
-    EXPECT_EQ(mServer->velmoraGetConfig(1, &tag, &out), 4);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "init mPlatPtr failed!"));
-}
-
-TEST_F(VelmoraServerInitTest, VersionIsOneInEveryState) {
-    VelmoraServer server;
-    EXPECT_EQ(server.velmoraGetVersion(), 1);
-    ASSERT_EQ(startServer(), 0);
-    EXPECT_EQ(mServer->velmoraGetVersion(), 1);
-}
-
 TEST_F(VelmoraServerInitTest, DeleteActionPtrWalksTheChain) {
     VelmoraServer server;
     auto* head = new Action();

@@ -1,0 +1,93 @@
+// Fixture of the special-scene tests: the scene commands of the configuration, the platform's
+// view of scene switches as apply/withdraw steps, and the server's scene state read under its
+// mutex.
+#pragma once
+
+#include <map>
+#include <ostream>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "tests/fakes/ServerTest.h"
+
+namespace velmora {
+namespace fake {
+
+inline constexpr int kOn = 0;
+inline constexpr int kOff = -1;
+inline constexpr int kClientRestart = 20224;
+
+// One doAction call as the platform saw it.
+struct Step {
+    int cmdId;
+    std::vector<int> payload;
+    bool operator==(const Step& o) const { return cmdId == o.cmdId && payload == o.payload; }
+};
+
+inline std::ostream& operator<<(std::ostream& os, const Step& s) {
+    os << (s.payload == std::vector<int>{kOn}    ? "apply "
+           : s.payload == std::vector<int>{kOff} ? "withdraw "
+                                                 : "payload? ")
+       << s.cmdId;
+    return os;
+}
+
+inline Step apply(int cmdId) {
+    return {cmdId, {kOn}};
+}
+inline Step withdraw(int cmdId) {
+    return {cmdId, {kOff}};
+}
+using Steps = std::vector<Step>;
+
+inline std::string scene(int cmdId, const std::string& body = "", int duration = 0) {
+    return "<cmd id=\"" + std::to_string(cmdId) + "\" name=\"scene_" + std::to_string(cmdId) +
+           "\"><act><duration>" + std::to_string(duration) + "</duration>" + body + "</act></cmd>";
+}
+
+inline std::string govScene(int cmdId, int priority) {
+    return scene(cmdId, "<s_priority>" + std::to_string(priority) + "</s_priority>");
+}
+
+// Built-in scenes 4118 (100), 4119 (200), 4120 (20), 4121 (70); governor scenes 4230 and 4240
+// (50 each), 4250 (30) and 4260 (300, above 4119); 4130 is configured without a priority.
+inline const std::string kSceneCommands =
+    scene(4118, "<t1>1500</t1>") + scene(4119) + scene(4120) + scene(4121) + govScene(4230, 50) +
+    govScene(4240, 50) + govScene(4250, 30) + govScene(4260, 300) + scene(4130, "<t1>1</t1>");
+
+struct SceneState {
+    int cur;
+    std::set<int32_t> on;
+    std::map<int32_t, int32_t> prio;
+};
+
+inline SceneState snapshot(VelmoraServer* s) {
+    android::Mutex::Autolock lock(s->mMutex);
+    return {s->mCurSpecialCmdId, s->mOnEventSet, s->mPriorityMap};
+}
+
+class ServerSceneTest : public ServerTest {
+  protected:
+    void start(const std::string& extra = kSceneCommands) {
+        ASSERT_EQ(startServer(extra), 0);
+        executor().clear();
+        LogCapture::clear();
+    }
+    int on(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOn); }
+    int off(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOff); }
+    int restart() { return mServer->velmoraEvent(kClientRestart, "", 0, nullptr); }
+    // The doAction calls recorded since the last call, then forgets them.
+    Steps steps() {
+        Steps out;
+        for (const ExecutorCall& c : executor().calls(Op::DoAction)) {
+            out.push_back({c.id, c.payload});
+        }
+        executor().clear();
+        return out;
+    }
+    SceneState state() { return snapshot(mServer.get()); }
+};
+
+}  // namespace fake
+}  // namespace velmora
