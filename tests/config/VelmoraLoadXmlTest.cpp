@@ -63,37 +63,46 @@ TEST_F(VelmoraLoadXmlTest, CloudCopyForThisBuildWins) {
     EXPECT_EQ(LogCapture::countContaining("switch to cloud update config file : "), 1);
 }
 
-TEST_F(VelmoraLoadXmlTest, MissingPropertyFallsBackToCustomisationCopy) {
+// Every way the cloud copy can be unusable: the customisation copy is loaded instead, and the
+// reason is logged.
+struct FallbackRow {
+    const char* name;
+    std::string incremental;  // empty: the property is missing
+    const char* cloudXml;     // null: no cloud file for that build
+    const char* log;
+};
+
+class CloudFallbackTest : public VelmoraLoadXmlTest,
+                          public ::testing::WithParamInterface<FallbackRow> {};
+
+TEST_P(CloudFallbackTest, LoadsTheCustomisationCopy) {
+    const FallbackRow& row = GetParam();
     writeCustConfig(policyXml(kCustCommands));
+    if (row.cloudXml != nullptr) {
+        writeCloudConfig(row.incremental, row.cloudXml);
+    } else {
+        env().incremental = row.incremental;
+    }
     ASSERT_TRUE(load());
     EXPECT_EQ(mLoader.chains.count(4400), 1u);
-    EXPECT_TRUE(
-        LogCapture::has(ANDROID_LOG_ERROR, "get property ro.build.version.incremental failed!"));
+    EXPECT_EQ(mLoader.chains.count(4500), 0u);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, row.log)) << row.log;
     EXPECT_EQ(LogCapture::countContaining("switch to velmora config file : "), 1);
 }
 
-TEST_F(VelmoraLoadXmlTest, MissingCloudFileFallsBack) {
-    writeCustConfig(policyXml(kCustCommands));
-    env().incremental = "no-such-build";
-    ASSERT_TRUE(load());
-    EXPECT_EQ(mLoader.chains.count(4400), 1u);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "get cloud velmora_config_cust.xml failed!,ret:2"));
-}
-
-TEST_F(VelmoraLoadXmlTest, CloudCopyWithoutPolicyFallsBackWithStatusThree) {
-    writeCustConfig(policyXml(kCustCommands));
-    writeCloudConfig("b1", "<config><cmd id=\"4500\"/></config>");
-    ASSERT_TRUE(load());
-    EXPECT_EQ(mLoader.chains.count(4400), 1u);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "get cloud velmora_config_cust.xml failed!,ret:3"));
-
-    LogCapture::clear();
-    mLoader.chains.clear();
-    writeCloudConfig("b1", "<policy></policy>");
-    ASSERT_TRUE(load());
-    EXPECT_EQ(mLoader.chains.count(4400), 1u);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "get cloud velmora_config_cust.xml failed!,ret:3"));
-}
+INSTANTIATE_TEST_SUITE_P(
+    Rows, CloudFallbackTest,
+    ::testing::Values(
+        FallbackRow{"NoProperty", "", nullptr, "get property ro.build.version.incremental failed!"},
+        FallbackRow{"NoCloudFile", "no-such-build", nullptr,
+                    "get cloud velmora_config_cust.xml failed!,ret:2"},
+        FallbackRow{"NoPolicyElement", "b1", "<config><cmd id=\"4500\"/></config>",
+                    "get cloud velmora_config_cust.xml failed!,ret:3"},
+        FallbackRow{"EmptyPolicy", "b1", "<policy></policy>",
+                    "get cloud velmora_config_cust.xml failed!,ret:3"},
+        // The cloud path does not fit its buffer.
+        FallbackRow{"OverlongBuildName", std::string(120, 'v'), nullptr, "get file path failed!"}),
+    [](const ::testing::TestParamInfo<FallbackRow>& info) { return info.param.name; });
 
 TEST_F(VelmoraLoadXmlTest, CloudCopyWithoutValidCommandsHidesCustomisationCopy) {
     writeCustConfig(policyXml(kCustCommands));
@@ -102,20 +111,6 @@ TEST_F(VelmoraLoadXmlTest, CloudCopyWithoutValidCommandsHidesCustomisationCopy) 
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "empty rawXmlDataMap!!"));
     EXPECT_EQ(mLoader.conversions, 0);
     EXPECT_EQ(LogCapture::countContaining("switch to velmora config file"), 0);
-}
-
-TEST_F(VelmoraLoadXmlTest, CloudPathTooLongForItsBufferFallsBack) {
-    writeCustConfig(policyXml(kCustCommands));
-    env().incremental = std::string(120, 'v');
-    ASSERT_TRUE(load());
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "get file path failed!"));
-    EXPECT_EQ(mLoader.chains.count(4400), 1u);
-}
-
-TEST_F(VelmoraLoadXmlTest, MissingCustomisationCopyFails) {
-    EXPECT_FALSE(load());
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
-                                "velmora_config_cust.xml is not exit or file is invalid!"));
 }
 
 TEST_F(VelmoraLoadXmlTest, BrokenCustomisationCopyFails) {
@@ -189,13 +184,6 @@ TEST_F(VelmoraLoadXmlTest, TypeThatIsNotAnIntegerReadsAsZero) {
     writeCustConfig(policyXml("<cmd id=\"4400\"><a type=\"fast\"><k>1</k></a></cmd>"));
     ASSERT_TRUE(load());
     EXPECT_EQ(mLoader.chains.at(4400)[1].type, 0);
-}
-
-TEST_F(VelmoraLoadXmlTest, InnerLoadRejectsNullArguments) {
-    RawXmlDataMap map;
-    EXPECT_EQ(mLoader.innerLoad(nullptr, &map), 2);
-    EXPECT_EQ(mLoader.innerLoad("/nonexistent", nullptr), 2);
-    EXPECT_EQ(mLoader.innerLoad("/nonexistent/velmora.xml", &map), 2);
 }
 
 }  // namespace

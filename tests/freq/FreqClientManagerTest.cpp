@@ -1,5 +1,5 @@
-// FreqClientManager: tables at start, merge rules, client requests, the feature switch and the
-// statistics it feeds, and the frequency list dump.
+// FreqClientManager's client path: merge rules per tag, rejected requests and what they leave
+// behind, the feature switch and the statistics it feeds.
 #include "freq/FreqClientManager.h"
 
 #include "tests/freq/FreqManagerFixture.h"
@@ -16,113 +16,7 @@ constexpr int kB = VELMORA_TAG_BIG_CPU_MAX_FREQ;
 constexpr int kFork = VELMORA_TAG_FORK_ON_BIG_CLUSTER;
 constexpr int kIpaSwitch = VELMORA_TAG_IPA_SWITCH_TEMP;
 
-std::string dumpOf(FreqClientManager& mgr) {
-    android::String8 out;
-    mgr.dumpFreqList(out);
-    return out.string();
-}
-
-std::string clientDump(const char* header, int littleMax) {
-    return std::string(header) + " set freq is:\n" +
-           "tag=little cpu max,        value=" + std::to_string(littleMax) + "\n" +
-           "tag=big cpu max,           value=-1\n"
-           "tag=gpu max,               value=-1\n"
-           "tag=ipa switch temp,       value=-1\n"
-           "tag=ipa control temp,      value=-1\n"
-           "tag=ipa sustainable power, value=-1\n"
-           "tag=fork on big cluster,   value=-1\n";
-}
-
-// ---- Tables and dump -----------------------------------------------------------------------
-
-TEST_F(FreqManagerTest, FreshManagerDumpsEveryClientUnset) {
-    EXPECT_EQ(dumpOf(mMgr), clientDump("KX", -1) + clientDump("JN", -1) + clientDump("ZOLA", -1));
-    EXPECT_TRUE(mExec.calls().empty());
-    const Snapshot s = snapshot();
-    EXPECT_EQ(s.min, s.kx);
-    EXPECT_TRUE(s.littleMax.empty());
-    EXPECT_FALSE(s.uploadEnabled);
-}
-
-TEST_F(FreqManagerTest, DumpShowsTheRawAcceptedRequestOfThatClientOnly) {
-    ASSERT_EQ(client(2, {{kL, 1200000}}), 0);
-    ASSERT_EQ(client(1, {{kL, 1800000}}), 0);
-    EXPECT_EQ(dumpOf(mMgr),
-              clientDump("KX", 1800000) + clientDump("JN", 1200000) + clientDump("ZOLA", -1));
-}
-
-TEST_F(FreqManagerTest, InitConfigMapResetsMergedTagsOnly) {
-    FreqClientManager::TagMap table = {{kL, 5}, {kFork, 1}, {3, 9}};
-    mMgr.initConfigMap(table);
-    EXPECT_EQ(table.size(), 8u);
-    EXPECT_EQ(table[kL], -1);
-    EXPECT_EQ(table[kFork], -1);
-    EXPECT_EQ(table[3], 9);
-}
-
-// ---- Merge rules ---------------------------------------------------------------------------
-
-struct RuleRow {
-    int a;
-    int b;
-    int expected;
-};
-
-class ValidMinValueTest : public ::testing::TestWithParam<RuleRow> {};
-TEST_P(ValidMinValueTest, SmallestPositiveWins) {
-    FreqClientManager mgr(nullptr);
-    EXPECT_EQ(mgr.getValidMinValue(GetParam().a, GetParam().b), GetParam().expected);
-}
-INSTANTIATE_TEST_SUITE_P(Rows, ValidMinValueTest,
-                         ::testing::Values(RuleRow{-1, 0, 0}, RuleRow{0, -1, 0},
-                                           RuleRow{-1, -1, -1}, RuleRow{0, 700, 700},
-                                           RuleRow{900, 700, 700}, RuleRow{700, 900, 700},
-                                           RuleRow{700, 0, 700}, RuleRow{700, -1, 700},
-                                           RuleRow{-1, 700, 700}, RuleRow{0, 0, 0}));
-
-class TaskForkMinValueTest : public ::testing::TestWithParam<RuleRow> {};
-TEST_P(TaskForkMinValueTest, ZeroWinsThenOne) {
-    FreqClientManager mgr(nullptr);
-    EXPECT_EQ(mgr.getTaskForkMinValue(GetParam().a, GetParam().b), GetParam().expected);
-}
-INSTANTIATE_TEST_SUITE_P(Rows, TaskForkMinValueTest,
-                         ::testing::Values(RuleRow{-1, -1, -1}, RuleRow{-1, 0, 0},
-                                           RuleRow{-1, 1, 1}, RuleRow{0, -1, 0}, RuleRow{0, 0, 0},
-                                           RuleRow{0, 1, 0}, RuleRow{1, -1, 1}, RuleRow{1, 0, 0},
-                                           RuleRow{1, 1, 1}));
-
-TEST_F(FreqManagerTest, FloorAboveCapIsTheOnlyInvalidPair) {
-    EXPECT_FALSE(mMgr.isFreqValValid(5, 3));
-    EXPECT_TRUE(mMgr.isFreqValValid(5, 0));
-    EXPECT_TRUE(mMgr.isFreqValValid(0, 3));
-    EXPECT_TRUE(mMgr.isFreqValValid(3, 3));
-    EXPECT_TRUE(mMgr.isFreqValValid(-1, -1));
-}
-
-TEST_F(FreqManagerTest, OtherClientsOfAnUnknownIdAreNone) {
-    android::Mutex::Autolock lock(mMgr.mLock);
-    EXPECT_EQ(mMgr.getMinTagConfigs(4, kL), -1);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid clientId is 4"));
-    EXPECT_EQ(mMgr.getSceneConfig(kIpaSwitch), 0);
-    EXPECT_EQ(mMgr.mLittleMaxFreqMap.size(), 0u);
-}
-
 // ---- Client requests -----------------------------------------------------------------------
-
-TEST_F(FreqManagerTest, ClientCapMergesWithTheOtherClients) {
-    ASSERT_EQ(client(2, {{kL, 1200000}}), 0);
-    ASSERT_EQ(client(1, {{kL, 1800000}}), 0);
-    EXPECT_EQ(lastSent(1, {kL}), (Ints{1200000}));
-    ASSERT_EQ(client(3, {{kL, 1000000}}), 0);
-    EXPECT_EQ(lastSent(3, {kL}), (Ints{1000000}));
-    // JN withdraws: the smallest of KX and ZOLA remains.
-    ASSERT_EQ(client(2, {{kL, 0}}), 0);
-    EXPECT_EQ(lastSent(2, {kL}), (Ints{1000000}));
-    const Snapshot s = snapshot();
-    EXPECT_EQ(s.kx.at(kL), 1800000);
-    EXPECT_EQ(s.jn.at(kL), 0);
-    EXPECT_EQ(s.min.at(kL), 1000000);
-}
 
 TEST_F(FreqManagerTest, WithdrawnCapSendsZeroUnlessAnEventCaps) {
     ASSERT_EQ(client(1, {{kB, 0}, {kIpaSwitch, 0}}), 0);
@@ -248,13 +142,6 @@ TEST_F(FreqManagerTest, FeatureSwitchOnlyEverTurnsUploadOn) {
     EXPECT_TRUE(LogCapture::lines().empty());
 }
 
-TEST_F(FreqManagerTest, NoStatisticsUntilUploadIsEnabled) {
-    mExec.setConfigValue(VELMORA_TAG_LITTLE_CPU_TOP_FREQ, 1804800);
-    ASSERT_EQ(client(1, {{kL, 1000000}}), 0);
-    EXPECT_TRUE(mExec.calls(Op::GetConfig).empty());
-    EXPECT_TRUE(FakeEnv::get().jankLines().empty());
-}
-
 TEST_F(FreqManagerTest, TopFrequenciesAreReadOnceAndReportsFollowMergedValues) {
     mExec.setConfigValue(VELMORA_TAG_LITTLE_CPU_TOP_FREQ, 1804800);
     mExec.setConfigValue(VELMORA_TAG_BIG_CPU_TOP_FREQ, 2419200);
@@ -284,23 +171,6 @@ TEST_F(FreqManagerTest, FailedTopFrequencyReadIsRetriedWithoutReporting) {
     EXPECT_EQ(mExec.calls(Op::GetConfig).size(), 2u);
     // Big and GPU maxima stayed unknown (-1), so their unset values read as "not limited".
     EXPECT_EQ(reportBodies(), (Strings{",1,1100,-1,-1,4>"}));
-}
-
-TEST_F(FreqManagerTest, ReadMaxFreqFailureLeavesTheMaximaUntouched) {
-    android::Mutex::Autolock lock(mMgr.mLock);
-    mExec.setResult(Op::GetConfig, 5);
-    EXPECT_EQ(mMgr.readMaxFreq(), 5);
-    EXPECT_EQ(mMgr.mFreqInfoUpload.mMaxFreq[0], -1);
-    mPlat.mExecutorPtr = nullptr;
-    EXPECT_EQ(mMgr.readMaxFreq(), -1);
-    EXPECT_EQ(LogCapture::count(ANDROID_LOG_ERROR, "getConfig failed!"), 2);
-    mPlat.mExecutorPtr = &mExec;
-    mExec.setResult(Op::GetConfig, 0);
-    mExec.setConfigValue(VELMORA_TAG_GPU_TOP_FREQ, 2841600);
-    EXPECT_EQ(mMgr.readMaxFreq(), 0);
-    EXPECT_EQ(mMgr.mFreqInfoUpload.mMaxFreq[0], -1);  // the platform kept the preset
-    EXPECT_EQ(mMgr.mFreqInfoUpload.mMaxFreq[2], 2841600);
-    EXPECT_FALSE(mMgr.mMaxFreqRead);
 }
 
 }  // namespace

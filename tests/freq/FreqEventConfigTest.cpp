@@ -46,17 +46,6 @@ TEST_F(FreqManagerTest, EventCapsRespectTheClientsMergedCap) {
     EXPECT_EQ(snapshot().littleMax, (EventMap{{kA, 0}}));
 }
 
-TEST_F(FreqManagerTest, ClientCapsRespectActiveEventCapsUntilSwitchedOff) {
-    ASSERT_EQ(event(kA, kOn, {{kGMax, 600000}}), 0);
-    ASSERT_EQ(client(2, {{kGMax, 800000}}), 0);
-    EXPECT_EQ(lastSent(2, {kGMax}), (Ints{600000}));
-    EXPECT_EQ(snapshot().min.at(kGMax), 800000);
-    ASSERT_EQ(event(kA, kOff, {{kGMax, 600000}}), 0);
-    EXPECT_EQ(lastSent(kA, {kGMax}), (Ints{800000}));
-    ASSERT_EQ(client(2, {{kGMax, 900000}}), 0);
-    EXPECT_EQ(lastSent(2, {kGMax}), (Ints{900000}));
-}
-
 TEST_F(FreqManagerTest, FloorsOfSeveralEventsTakeTheLargest) {
     ASSERT_EQ(event(kA, kOn, {{kBMin, 1000000}}), 0);
     ASSERT_EQ(event(kB, kOn, {{kBMin, 1200000}}), 0);
@@ -79,17 +68,6 @@ TEST_F(FreqManagerTest, MixedRequestIsSentInRequestOrderWithTheCallersTags) {
     EXPECT_EQ(s.bigMax, (EventMap{{kA, 1900000}}));
     EXPECT_TRUE(s.gpuMin.empty());
     EXPECT_EQ(s.kx.at(kGMax), -1);  // events never touch the client tables
-}
-
-TEST_F(FreqManagerTest, FloorAboveCapIsRejectedBeforeAnythingIsStored) {
-    EXPECT_EQ(event(kA, kOn, {{kLMin, 2000000}, {kLMax, 1000000}}), -1);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO,
-                                "freq is invalid(min > freq), cmdId is 12288, (l_cpu(2000000,"
-                                "1000000), b_cpu(0, 0), gpu(0, 0))"));
-    EXPECT_TRUE(setCalls().empty());
-    const Snapshot s = snapshot();
-    EXPECT_TRUE(s.littleMin.empty());
-    EXPECT_TRUE(s.littleMax.empty());
 }
 
 TEST_F(FreqManagerTest, FloorOfOneEventAboveCapOfAnotherIsRejected) {
@@ -153,21 +131,6 @@ TEST_P(FreqEventTagTest, TagOutsideFloorsAndCapsRejectsTheWholeRequest) {
 // 0, 3 and 6 lie between the event tags; 9 and up are client-only or unknown.
 INSTANTIATE_TEST_SUITE_P(Tags, FreqEventTagTest,
                          ::testing::Values(0, 3, 6, 9, 17, 20, 10000, -1, -7));
-
-// ---- The event merge functions on hand-made tables -------------------------------------------
-
-TEST_F(FreqManagerTest, EventMergeFunctionsIgnoreTheCallersOwnEntry) {
-    android::Mutex::Autolock lock(mMgr.mLock);
-    const EventMap own = {{kA, 1500000}};
-    EXPECT_EQ(mMgr.getMinFreqFromMap(kA, kOff, kLMax, 1500000, own), 0);
-    EXPECT_EQ(mMgr.getMinFreqFromMap(kA, kOn, kLMax, 1700000, own), 1700000);
-    const EventMap floors = {{kA, 1200000}, {kB, 0}};
-    EXPECT_EQ(mMgr.getMaxFreqFromMap(kA, kOn, 800000, floors), 800000);
-    EXPECT_EQ(mMgr.getMaxFreqFromMap(kB, kOn, 800000, floors), 1200000);
-    EXPECT_EQ(mMgr.getMaxFreqFromMap(kB, kOff, 800000, EventMap{}), 0);
-    EXPECT_EQ(mMgr.getMinConfig(EventMap{{kA, 0}, {kB, -1}}), 0);
-    EXPECT_EQ(mMgr.getMinConfig(EventMap{{kA, 0}, {kB, 900}, {kC, 700}}), 700);
-}
 
 }  // namespace
 }  // namespace fake

@@ -18,13 +18,6 @@ using linttest::withBase;
 
 const std::string kExample = VELMORA_SOURCE_DIR "/examples/xml/velmora_config_cust.xml";
 
-TEST(LintCommandTest, ExampleConfigurationIsClean) {
-    const auto result = runLint({"--werror"}, kExample);
-    EXPECT_EQ(result.status, 0);
-    EXPECT_EQ(result.out, "");
-    EXPECT_EQ(result.err, "");
-}
-
 TEST(LintCommandTest, ExplainListsEveryCommandsDispatch) {
     ScratchDir dir;
     const std::string config = withBase(

@@ -13,32 +13,6 @@ using android::Mutex;
 
 class ProbeThreadTest : public ProbeFixture {};
 
-TEST_F(ProbeThreadTest, BoostsAfterDelayAndNotBefore) {
-    startHandler();
-    const auto queued = Clock::now();
-    {
-        Mutex::Autolock lock(thread().mLock);
-        thread().addItemToQueue(12, 34);
-    }
-    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 1, kBoostDelay + kTolerance));
-
-    EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{34, 0}}));
-    const auto boosted = tidCallTime(34, 0);
-    EXPECT_GE(boosted - queued, kBoostDelay);
-    EXPECT_LE(boosted - queued, kBoostDelay + kTolerance);
-
-    const auto calls = mExecutor.calls();
-    ASSERT_EQ(calls.size(), 2u);
-    EXPECT_EQ(calls[0].op, Op::ProbeTid);  // the thread is selected before the action runs
-    EXPECT_EQ(calls[1].op, Op::DoAction);
-    EXPECT_EQ(calls[1].id, 4116);
-    EXPECT_EQ(calls[1].name, "probe");
-    EXPECT_EQ(calls[1].tagValues, (std::vector<int>{1, 1000}));
-    EXPECT_EQ(calls[1].payload, (std::vector<int>{0}));
-    EXPECT_EQ(waitTimestamp(34), -1);
-    EXPECT_GT(boostedTimestamp(34), 0);
-}
-
 TEST_F(ProbeThreadTest, WithdrawsAfterLifetimeAndDropsEntry) {
     startHandler();
     const auto queued = Clock::now();

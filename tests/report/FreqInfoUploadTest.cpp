@@ -93,43 +93,6 @@ INSTANTIATE_TEST_SUITE_P(
                       NormalizeRow{kGpuMax + 1, kGpuMax, FreqInfoUpload::kEmptyField},
                       NormalizeRow{1000000, -1, FreqInfoUpload::kEmptyField}));  // max unknown
 
-TEST_F(FreqInfoUploadTest, ClientBitsFollowLimitingClients) {
-    mUpload.updateFreqClient(1, 2, 1000000);
-    mUpload.updateFreqClient(3, 8, 1000000);
-    for (int id = 1; id <= 3; ++id) {
-        mUpload.updateReason(id);
-    }
-    EXPECT_EQ(mUpload.mLimitedClients, 4u | 1u);
-    mUpload.updateFreqClient(2, 5, 1000000);
-    mUpload.updateReason(2);
-    EXPECT_EQ(mUpload.mLimitedClients, 7u);
-    mUpload.updateFreqClient(1, 2, kLittleMax);  // capped at the top frequency: not limiting
-    mUpload.updateReason(1);
-    mUpload.updateReason(4);  // unknown ids change nothing
-    mUpload.updateReason(0);
-    EXPECT_EQ(mUpload.mLimitedClients, 3u);
-    EXPECT_FALSE(mUpload.isFreqClientLimited(4));
-    EXPECT_TRUE(FakeEnv::get().jankLines().empty());
-}
-
-TEST_F(FreqInfoUploadTest, SlotRules) {
-    // updateFreqClient puts any tag other than 2 and 5 into the third slot ...
-    mUpload.updateFreqClient(2, 3, 700000);
-    EXPECT_EQ(mUpload.mClients[1].mFreq[2], 700000);
-    mUpload.updateFreqClient(7, 2, 1);  // ... and ignores unknown clients
-    EXPECT_EQ(mUpload.mClients[0].mFreq[0], -1);
-    // ... while origin data keeps tags 2, 5, 8 only, the later of two entries winning.
-    std::vector<int> tags = {3, 2, 5, 2, 20};
-    std::vector<int> values = {11, 900000, 800000, 950000, 1};
-    mUpload.updateOriginFreqData(1, 5, tags.data(), values.data());
-    EXPECT_EQ(mUpload.mClients[0].mFreq[0], 950000);
-    EXPECT_EQ(mUpload.mClients[0].mFreq[1], 800000);
-    EXPECT_EQ(mUpload.mClients[0].mFreq[2], -1);
-    mUpload.updateOriginFreqData(-2, 5, tags.data(), values.data());
-    mUpload.updateOriginFreqData(3, 0, tags.data(), values.data());
-    EXPECT_EQ(mUpload.mClients[2].mFreq[0], -1);
-}
-
 TEST_F(FreqInfoUploadTest, ReportsStartContinueAndEndOfLimiting) {
     request(2, {2}, {kLittleMax}, {kLittleMax});  // nothing limits: silence
     EXPECT_TRUE(reportBodies().empty());

@@ -1,0 +1,178 @@
+// Pieces of the stress test: the configuration under load, the operation mix's constants, the
+// watchdog that names a hanging thread, the model of what each client asked for last and the
+// expected "--freqlist" block.
+#pragma once
+
+#include <unistd.h>
+
+#include <atomic>
+#include <chrono>
+#include <condition_variable>
+#include <cstdio>
+#include <map>
+#include <mutex>
+#include <string>
+#include <thread>
+#include <vector>
+
+// The dumps read the managers' tables without their locks, and mDebugLog / mPolicyEnabled are
+// plain flags: deliberate on the device, reported as races by ThreadSanitizer. Under TSan those
+// operations run only before and after the concurrent phase, single-threaded.
+#if defined(__SANITIZE_THREAD__)
+#define VELMORA_STRESS_TSAN 1
+#elif defined(__has_feature)
+#if __has_feature(thread_sanitizer)
+#define VELMORA_STRESS_TSAN 1
+#endif
+#endif
+#ifndef VELMORA_STRESS_TSAN
+#define VELMORA_STRESS_TSAN 0
+#endif
+
+namespace velmora {
+namespace fake {
+
+
+using Clock = std::chrono::steady_clock;
+using std::chrono::milliseconds;
+
+inline constexpr int kOn = 0;
+inline constexpr int kOff = -1;
+inline constexpr int kProbe = 4116;
+inline constexpr int kReload = 20230;
+inline constexpr int kNotification = 20225;
+inline constexpr int kClientRestart = 20224;
+inline constexpr int kTimedAction = 4098;
+inline constexpr int kColdStart = 4099;
+
+inline constexpr int kMixedThreads = 4;
+inline constexpr int kOpsPerThread = VELMORA_STRESS_TSAN ? 600 : 2000;
+inline constexpr int kSceneSwitches = VELMORA_STRESS_TSAN ? 400 : 1500;
+inline constexpr int kMaxReloads = 300;
+// The concurrent phase ends at this deadline even when the counts are not reached.
+inline constexpr milliseconds kPhaseDeadline{1500};
+// Boosts live 256 ms; every one must be withdrawn well within this, even on a sanitized build.
+inline constexpr milliseconds kProbeDrainBound{5000};
+// No progress of any thread for this long is taken as a deadlock.
+inline constexpr milliseconds kWatchdogStall{20000};
+
+inline const std::vector<int> kScenes = {4118, 4119, 4120, 4121, 4122};
+inline const std::vector<int> kGovScenes = {4230, 4240, 4260};
+// Built-ins 4118 (100), 4119 (200), 4120 (20), 4121 (70); configured ones below.
+inline const std::map<int, int> kPriorities = {{4118, 100}, {4119, 200}, {4120, 20}, {4121, 70},
+                                        {4122, 150}, {4230, 50},  {4240, 50}, {4260, 300}};
+inline const std::vector<int> kFreqTags = {2, 5, 8};
+
+inline std::string cmd(int id, const std::string& name, const std::string& body) {
+    return "<cmd id=\"" + std::to_string(id) + "\" name=\"" + name + "\"><act>" + body +
+           "</act></cmd>";
+}
+
+// The configuration under load; the two reload variants differ in the timed actions' values.
+inline std::string commands(int variant) {
+    const std::string v = std::to_string(1000000 + variant);
+    return cmd(kTimedAction, "winswitch", "<duration>500</duration><t1>" + v + "</t1>") +
+           cmd(kColdStart, "cold", "<duration>1000</duration><t4>" + v + "</t4>") +
+           cmd(4114, "zola_ref", "<duration>0</duration><t51>10</t51><t53>-10</t53>") +
+           cmd(4113, "zola_follow", "<duration>0</duration><t51>20</t51><t53>0</t53>") +
+           cmd(4115, "zola_other", "<duration>0</duration><t52>30</t52>") +
+           cmd(12288, "little_cap", "<duration>0</duration><t2>1500000</t2>") +
+           cmd(12289, "big_cap_platform", "<duration>0</duration><t10>1</t10><t5>1900000</t5>") +
+           cmd(12290, "little_floor", "<duration>0</duration><t1>800000</t1>") +
+           cmd(20481, "memlat", "<duration>0</duration><t30>1</t30>") +
+           cmd(4118, "scene_4118", "<duration>0</duration><t1>1500</t1>") +
+           cmd(4119, "scene_4119", "<duration>0</duration><t2>2000</t2>") +
+           cmd(4120, "scene_4120", "<duration>0</duration><t1>1</t1>") +
+           cmd(4121, "scene_4121", "<duration>0</duration><t1>2</t1>") +
+           cmd(4122, "scene_4122", "<duration>0</duration><t101>150</t101>") +
+           cmd(4230, "gov_4230", "<duration>0</duration><s_priority>50</s_priority>") +
+           cmd(4240, "gov_4240", "<duration>0</duration><s_priority>50</s_priority>") +
+           cmd(4260, "gov_4260", "<duration>0</duration><s_priority>300</s_priority>");
+}
+
+inline bool isTsan() {
+    return VELMORA_STRESS_TSAN != 0;
+}
+
+// Per-thread progress for the watchdog: an operation counter and the operation in flight.
+struct Progress {
+    std::atomic<long> ops{0};
+    std::atomic<const char*> current{"idle"};
+};
+
+class Watchdog {
+public:
+    Watchdog(std::vector<Progress>& progress, std::vector<std::string> names)
+        : mProgress(progress), mNames(std::move(names)), mThread([this] { run(); }) {}
+    ~Watchdog() {
+        {
+            std::lock_guard<std::mutex> lock(mLock);
+            mDone = true;
+        }
+        mCond.notify_all();
+        mThread.join();
+    }
+
+private:
+    void run() {
+        std::vector<long> last(mProgress.size(), -1);
+        auto lastChange = Clock::now();
+        std::unique_lock<std::mutex> lock(mLock);
+        while (!mCond.wait_for(lock, milliseconds(200), [this] { return mDone; })) {
+            bool moved = false;
+            for (size_t i = 0; i < mProgress.size(); ++i) {
+                const long now = mProgress[i].ops.load();
+                moved = moved || now != last[i];
+                last[i] = now;
+            }
+            if (moved) {
+                lastChange = Clock::now();
+            } else if (Clock::now() - lastChange > kWatchdogStall) {
+                fprintf(stderr, "ServerStress watchdog: no thread made progress for %lld ms, "
+                                "probably a deadlock. Threads:\n",
+                        static_cast<long long>(kWatchdogStall.count()));
+                for (size_t i = 0; i < mProgress.size(); ++i) {
+                    fprintf(stderr, "  %s: %ld ops, in %s\n", mNames[i].c_str(),
+                            mProgress[i].ops.load(), mProgress[i].current.load());
+                }
+                fflush(stderr);
+                _exit(3);
+            }
+        }
+    }
+
+    std::vector<Progress>& mProgress;
+    std::vector<std::string> mNames;
+    std::mutex mLock;
+    std::condition_variable mCond;
+    bool mDone = false;
+    std::thread mThread;
+};
+
+// What the host asked for last, per client: the test serialises each client's requests with
+// its own lock so that "last" is well defined while the clients still race each other and
+// everything else.
+struct ClientModel {
+    std::mutex lock;
+    std::map<int, int> freq;   // tag -> last accepted value (-1 never set)
+    std::map<int, int> sched;  // group tag -> last accepted level
+};
+
+// Expected "--freqlist" block of one client that only ever sent tags 2, 5 and 8.
+inline std::string freqBlock(const char* name, const std::map<int, int>& freq) {
+    auto value = [&](int tag) {
+        auto it = freq.find(tag);
+        return std::to_string(it == freq.end() ? -1 : it->second);
+    };
+    return std::string(name) + " set freq is:\n" +
+           "tag=little cpu max,        value=" + value(2) + "\n" +
+           "tag=big cpu max,           value=" + value(5) + "\n" +
+           "tag=gpu max,               value=" + value(8) + "\n" +
+           "tag=ipa switch temp,       value=-1\n"
+           "tag=ipa control temp,      value=-1\n"
+           "tag=ipa sustainable power, value=-1\n"
+           "tag=fork on big cluster,   value=-1\n";
+}
+
+}  // namespace fake
+}  // namespace velmora
