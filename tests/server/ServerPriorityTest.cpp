@@ -199,6 +199,89 @@ TEST_F(ServerPriorityTest, FailedReloadKeepsThePriorities) {
     EXPECT_EQ(steps(), StepList({{4130, kOn}}));
 }
 
+// The selection functions on hand-made state: the return codes and tie-breaks of branches the
+// host's event sequences do not reach.
+TEST_F(ServerPriorityTest, PriorityReadersTakeTheLastMatchingPair) {
+    VelmoraServer server;
+    Action plain;
+    plain.mParamNum = 3;
+    plain.mTagValues = {101, 30, 7, 8, 101, 45};
+    EXPECT_EQ(server.getPriority(&plain), 45);
+    plain.mParamNum = 2;  // only the first two pairs count
+    EXPECT_EQ(server.getPriority(&plain), 30);
+    plain.mParamNum = 0;
+    EXPECT_EQ(server.getPriority(&plain), 0);
+
+    Action gov(4300, "", 0, 3, {"priority", "30", "prio", "99", "priority", "44"});
+    EXPECT_EQ(server.getInterPriority(&gov), 44);
+    EXPECT_EQ(server.getPriority(&gov), 0);
+    Action noKey(4300, "", 0, 1, {"priority ", "30"});
+    EXPECT_EQ(server.getInterPriority(&noKey), 0);
+}
+
+TEST_F(ServerPriorityTest, DecisionCodesOfOnAndOffEvents) {
+    VelmoraServer server;
+    VelmoraServer* s = &server;
+    android::Mutex::Autolock lock(s->mMutex);
+    // 0: apply alone; 1: does not outrank; 3: withdraw the previous one first.
+    EXPECT_EQ(s->doOnEvent(4118, 100, 0), 0);
+    s->mCurSpecialCmdId = 4118;
+    EXPECT_EQ(s->doOnEvent(4120, 20, 100), 1);
+    EXPECT_EQ(s->doOnEvent(4121, 100, 100), 1);
+    EXPECT_EQ(s->doOnEvent(4119, 200, 100), 3);
+    s->mCurSpecialCmdId = 4119;
+    EXPECT_EQ(s->mOnEventSet, std::set<int32_t>({4118, 4119, 4120, 4121}));
+
+    int next = -5;
+    int flag = -5;
+    // 2: the ended scene was not applied.
+    EXPECT_EQ(s->doOffEvent(4120, &next, &flag), 2);
+    EXPECT_EQ(next, -5);
+    // 3: the best remaining scene follows.
+    EXPECT_EQ(s->doOffEvent(4119, &next, &flag), 3);
+    EXPECT_EQ(next, 4118);
+    EXPECT_EQ(flag, 0);
+    EXPECT_EQ(s->mCurSpecialCmdId, 4118);
+    EXPECT_EQ(s->doOffEvent(4121, &next, &flag), 2);
+    // 0: nothing left, the ended scene is reported back.
+    flag = -5;
+    EXPECT_EQ(s->doOffEvent(4118, &next, &flag), 0);
+    EXPECT_EQ(next, 4118);
+    EXPECT_EQ(flag, -5);
+    EXPECT_EQ(s->mCurSpecialCmdId, 0);
+    EXPECT_TRUE(s->mOnEventSet.empty());
+}
+
+TEST_F(ServerPriorityTest, GovernorSelection) {
+    VelmoraServer server;
+    VelmoraServer* s = &server;
+    android::Mutex::Autolock lock(s->mMutex);
+    s->mPriorityMap[4230] = 50;
+    s->mPriorityMap[4240] = 50;
+    s->mPriorityMap[4250] = 80;
+    s->mOnEventSet = {4118, 4119, 4230, 4240};
+    s->mCurSpecialCmdId = 4118;
+    // Only under scene 4119, and only for governor scenes.
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 0);
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOffEvent(), 0);
+    s->mCurSpecialCmdId = 4119;
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4121), 0);
+    // A tie goes to the new scene when switching on, to the smaller cmdId otherwise.
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 4240);
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOffEvent(), 4230);
+    s->mOnEventSet.insert(4250);
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 4250);
+    EXPECT_EQ(s->getMaxGovPrioCmdIdInOffEvent(), 4250);
+    EXPECT_EQ(s->getCmdIdWithMaxPrio(false), 4119);
+    // A scene without priority still beats an empty choice.
+    s->mOnEventSet = {4300};
+    EXPECT_EQ(s->getCmdIdWithMaxPrio(true), 4300);
+    s->mOnEventSet = {4118};
+    EXPECT_EQ(s->getCmdIdWithMaxPrio(true), 0);
+    s->mOnEventSet.clear();
+    EXPECT_EQ(s->getCmdIdWithMaxPrio(false), 0);
+}
+
 }  // namespace
 }  // namespace fake
 }  // namespace velmora
