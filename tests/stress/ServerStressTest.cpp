@@ -101,8 +101,13 @@ TEST_F(ServerStressTest, EveryEntryPointUnderConcurrentReloads) {
     names.push_back("scene thread");
     names.push_back("reloader");
     const auto deadline = Clock::now() + kPhaseDeadline;
-    std::atomic<int> mixedRunning{kMixedThreads + 1};
     std::atomic<int> reloads{0};
+    // The host threads go on past their count until enough reloads have raced with them: on
+    // a loaded machine the counts alone can finish before the reloader got going.
+    auto keepGoing = [&](int i, int count) {
+        return (i < count || reloads.load() < kMinReloads) && Clock::now() < deadline;
+    };
+    std::atomic<int> mixedRunning{kMixedThreads + 1};
     std::atomic<int> totalOps{0};
 
     const auto phaseStart = Clock::now();
@@ -114,7 +119,7 @@ TEST_F(ServerStressTest, EveryEntryPointUnderConcurrentReloads) {
                 Progress& p = progress[t];
                 std::mt19937 rng(4242 + t);
                 const int devNull = open("/dev/null", O_WRONLY);
-                for (int i = 0; i < kOpsPerThread && Clock::now() < deadline; ++i, ++p.ops) {
+                for (int i = 0; keepGoing(i, kOpsPerThread); ++i, ++p.ops) {
                     const int pick = static_cast<int>(rng() % 100);
                     const int onOff = rng() % 2 ? kOn : kOff;
                     if (pick < 12) {
@@ -231,7 +236,7 @@ TEST_F(ServerStressTest, EveryEntryPointUnderConcurrentReloads) {
             std::mt19937 rng(77);
             std::vector<int> all = kScenes;
             all.insert(all.end(), kGovScenes.begin(), kGovScenes.end());
-            for (int i = 0; i < kSceneSwitches && Clock::now() < deadline; ++i, ++p.ops) {
+            for (int i = 0; keepGoing(i, kSceneSwitches); ++i, ++p.ops) {
                 if (i % 97 == 96) {
                     p.current = "client restart";
                     expectStatus("client restart",
@@ -280,7 +285,7 @@ TEST_F(ServerStressTest, EveryEntryPointUnderConcurrentReloads) {
         ADD_FAILURE() << f;
     }
     EXPECT_EQ(unexpected.load(), 0);
-    EXPECT_GT(reloads.load(), 10);
+    EXPECT_GE(reloads.load(), kMinReloads);
     EXPECT_GT(totalOps.load(), 400);
     // A reload swaps the whole table under the write lock: no command ever goes missing.
     EXPECT_EQ(LogCapture::countContaining("doParse failed"), 0);

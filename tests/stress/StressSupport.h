@@ -49,6 +49,8 @@ inline constexpr int kMixedThreads = 4;
 inline constexpr int kOpsPerThread = VELMORA_STRESS_TSAN ? 600 : 2000;
 inline constexpr int kSceneSwitches = VELMORA_STRESS_TSAN ? 400 : 1500;
 inline constexpr int kMaxReloads = 300;
+// Reloads that must have raced with the host threads before the concurrent phase may end.
+inline constexpr int kMinReloads = 12;
 // The concurrent phase ends at this deadline even when the counts are not reached.
 inline constexpr milliseconds kPhaseDeadline{1500};
 // Boosts live 256 ms; every one must be withdrawn well within this, even on a sanitized build.
