@@ -192,12 +192,11 @@ int SchedLevelManager::doEventSchedLevel(const Action* action) {
         }
     }
 
-    int count = 0;
-    int groups[kMaxGroupNum] = {};
-    int levels[kMaxGroupNum] = {};
     android::Mutex::Autolock lock(mLock);
     if (action->mCmdId == kCmdDefaultSchedLevel) {
         // Only recorded: the platform hears of the defaults with the next merge.
+        int groups[kMaxGroupNum] = {};
+        int levels[kMaxGroupNum] = {};
         return initDefaultSchedLevel(pairNum, action->mTagValues, groups, levels);
     }
 
@@ -207,12 +206,11 @@ int SchedLevelManager::doEventSchedLevel(const Action* action) {
     if (updateSchedLevelMapIfNeeded(action) == 0) {
         return 0;
     }
-    updateCurrentMapLocked(&count, groups, levels);
-    const int ret = sendToPlatform(count, groups, levels);
+    // A failed hand-over logs once inside, and once more after the rollback below.
+    const int ret = updateCurrentSchedlevel();
     if (ret != 0) {
         // The 4114 reference is kept on purpose: the event did happen, even if the platform
         // refused its levels, and a later 4113 must compare against it.
-        VLOGD("doSchedLevelAction failed!");
         copyLevels(zolaBackup, mZolaLevelMap);
         copyLevels(currentBackup, mCurrentLevelMap);
         copyLevels(eventBackup, mZolaEventMap);
@@ -291,7 +289,8 @@ int SchedLevelManager::updateCurrentSchedlevel() {
     int groups[kMaxGroupNum] = {};
     int levels[kMaxGroupNum] = {};
     updateCurrentMapLocked(&count, groups, levels);
-    const int ret = sendToPlatform(count, groups, levels);
+    PerfExecutor* executor = mPlatPtr != nullptr ? mPlatPtr->mExecutorPtr : nullptr;
+    const int ret = executor != nullptr ? executor->doSchedLevelAction(count, groups, levels) : -1;
     if (ret != 0) {
         VLOGD("doSchedLevelAction failed!");
     }
@@ -360,13 +359,9 @@ int SchedLevelManager::doPerfSetSchedLevel(int clientId, int tagLen, const int* 
     }
 
     // Handed over even when no level changed, so a client can re-assert its levels.
-    int count = 0;
-    int groups[kMaxGroupNum] = {};
-    int levels[kMaxGroupNum] = {};
-    updateCurrentMapLocked(&count, groups, levels);
-    const int ret = sendToPlatform(count, groups, levels);
+    // A failed hand-over logs once inside, and once more after the rollback below.
+    const int ret = updateCurrentSchedlevel();
     if (ret != 0) {
-        VLOGD("doSchedLevelAction failed!");
         copyLevels(tableBackup, *table);
         copyLevels(currentBackup, mCurrentLevelMap);
         VLOGD("doSchedLevelAction failed!");
@@ -407,14 +402,6 @@ void SchedLevelManager::dumpEasGroupList(android::String8& out) {
 
 void SchedLevelManager::printEasGroupList(LevelMap& table, android::String8& out) {
     velmora::EasGroupPrinter::print(table, mHmpMode, out);
-}
-
-int SchedLevelManager::sendToPlatform(int count, const int* groups, const int* levels) {
-    PerfExecutor* executor = mPlatPtr != nullptr ? mPlatPtr->mExecutorPtr : nullptr;
-    if (executor == nullptr) {
-        return -1;
-    }
-    return executor->doSchedLevelAction(count, groups, levels);
 }
 
 SchedLevelManager* getSchedLevel(VelmoraPlat* plat) {

@@ -124,10 +124,6 @@ public:
     bool mHmpMode GUARDED_BY(mLock);
 
     android::Mutex mLock;
-
-private:
-    // Executor hand-over shared by both entry points: -1 without executor.
-    int sendToPlatform(int count, const int* groups, const int* levels);
 };
 
 // Creates the manager for `plat`; the caller owns it.
