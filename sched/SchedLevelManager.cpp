@@ -4,10 +4,15 @@
 #include <cstdint>
 
 #include "config/Action.h"
+#include "config/CommandIds.h"
 #include "platform/PerfExecutor.h"
 #include "platform/VelmoraLog.h"
 #include "platform/VelmoraPlat.h"
 #include "sched/EasGroupPrinter.h"
+
+using velmora::kCmdDefaultSchedLevel;
+using velmora::kCmdZolaFollower;
+using velmora::kCmdZolaReference;
 
 namespace {
 
@@ -19,12 +24,6 @@ constexpr int kLastGroupTag = VELMORA_TAG_GROUP_BACKGROUND;
 constexpr int kFirstEasGroupTag = VELMORA_TAG_GROUP_BOOST;
 // Packed client levels are offset so that the low half stays non-negative.
 constexpr int kLevelOffset = 20;
-
-constexpr int kCmdDefaultSchedLevel = 5376;
-// The first 4114 ever seen is kept as a reference. 4113 only moves groups that still hold
-// that reference level, so it never undoes a later change made by another event.
-constexpr int kCmdZolaReference = 4114;
-constexpr int kCmdZolaFollower = 4113;
 
 constexpr int kClientKx = 1;
 constexpr int kClientJn = 2;

@@ -1,6 +1,7 @@
 #include "server/VelmoraServer.h"
 
 #include "config/Action.h"
+#include "config/CommandIds.h"
 #include "config/VelmoraLoadXml.h"
 #include "config/VelmoraParser.h"
 #include "freq/FreqClientManager.h"
@@ -8,6 +9,8 @@
 #include "platform/VelmoraPlat.h"
 #include "probe/ProbeHandler.h"
 #include "sched/SchedLevelManager.h"
+
+using namespace velmora;
 
 namespace {
 
@@ -20,10 +23,6 @@ void detachBorrowedChain(Action* probeAction) {
         probeAction->mNext = nullptr;
     }
 }
-
-// Start-up command whose duration-0 action carries the default scheduling-group levels.
-constexpr int kDefaultSchedLevelCmdId = 5376;
-constexpr int kProbeCmdId = 4116;
 
 }  // namespace
 
@@ -143,7 +142,7 @@ int VelmoraServer::init() {
     }
 
     mInitialized = true;
-    const int defaultRet = velmoraEvent(kDefaultSchedLevelCmdId, "", 0, nullptr);
+    const int defaultRet = velmoraEvent(kCmdDefaultSchedLevel, "", 0, nullptr);
     if (defaultRet != 0) {
         mInitialized = false;
         releaseComponents();
@@ -152,7 +151,7 @@ int VelmoraServer::init() {
     }
 
     Action* probeAction = new Action();
-    if (parseCommand(kProbeCmdId, probeAction) != 0) {
+    if (parseCommand(kCmdProbe, probeAction) != 0) {
         deleteActionPtr(probeAction);
         VLOGE("doParse probe event failed!");
         return 4;
@@ -168,7 +167,7 @@ int VelmoraServer::updateProbeHandler() {
     Action* action = new Action();
     VelmoraParser* parser = mPlatPtr != nullptr ? mPlatPtr->mParserPtr : nullptr;
     // Runs under the parser's write lock: parse without taking the read lock.
-    if (parser == nullptr || parser->doParseLocked(kProbeCmdId, action) != 0) {
+    if (parser == nullptr || parser->doParseLocked(kCmdProbe, action) != 0) {
         deleteActionPtr(action);
         VLOGE("updateProbeHandler:doParse probe event failed!");
         return 4;

@@ -16,8 +16,6 @@
 
 namespace {
 
-constexpr int kTagSchedLevelStep = 40;
-constexpr int kTagSetSchedLevel = 42;
 constexpr size_t kMaxDumpArgLength = 512;
 
 // Writes the reply with write(2) rather than dprintf: glibc's dprintf loses its 8 KiB stream
@@ -64,8 +62,7 @@ void writeReply(int fd, const char* text, size_t length) {
 
 }  // namespace
 
-int VelmoraServer::velmoraSetConfig(int clientId, int tagLen, const int* tags,
-                                    const int* configs) {
+int VelmoraServer::velmoraSetConfig(int clientId, int tagLen, const int* tags, const int* configs) {
     if (!mInitialized) {
         return 1;
     }
@@ -80,12 +77,12 @@ int VelmoraServer::velmoraSetConfig(int clientId, int tagLen, const int* tags,
     }
     if (clientId != 0) {
         for (int i = 0; i < tagLen; ++i) {
-            VLOGI("setConfig clientId=%d, tagLen=%d, tags[%d]=%d, configs[%d]=%d", clientId,
-                  tagLen, i, tags[i], i, configs[i]);
+            VLOGI("setConfig clientId=%d, tagLen=%d, tags[%d]=%d, configs[%d]=%d", clientId, tagLen,
+                  i, tags[i], i, configs[i]);
         }
     }
     for (int i = 0; i < tagLen; ++i) {
-        if (tags[i] != kTagSchedLevelStep && tags[i] != kTagSetSchedLevel) {
+        if (tags[i] != VELMORA_TAG_SCHED_LEVEL_STEP && tags[i] != VELMORA_TAG_SET_SCHED_LEVEL) {
             continue;
         }
         if (mSchedLevelPtr == nullptr) {

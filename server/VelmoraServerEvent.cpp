@@ -1,5 +1,6 @@
 // Event dispatch: velmoraEvent and the paths it takes inline.
 #include "config/Action.h"
+#include "config/CommandIds.h"
 #include "config/VelmoraParser.h"
 #include "freq/FreqClientManager.h"
 #include "freq/FreqTags.h"
@@ -11,20 +12,9 @@
 #include "sched/SchedLevelManager.h"
 #include "server/VelmoraServer.h"
 
-namespace {
+using namespace velmora;
 
-constexpr int kCmdMemLatencyRatio = 20480;
-constexpr int kCmdMemLatency = 20481;
-constexpr int kCmdProbe = 4116;
-constexpr int kCmdReload = 20230;
-constexpr int kCmdNotification = 20225;
-constexpr int kCmdClientRestart = 20224;
-constexpr int kCmdWinSwitch = 4098;
-constexpr int kCmdColdStart = 4099;
-constexpr int kSpecialSceneFirst = 4118;
-constexpr int kSpecialSceneLast = 4352;
-constexpr int kOnOffFirst = 12288;
-constexpr int kOnOffLast = 13568;
+namespace {
 
 // Notification word: bit 18 lets launch policies replace action durations.
 constexpr int kPolicyEnableBit = 0x40000;

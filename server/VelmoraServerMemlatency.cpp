@@ -5,15 +5,16 @@
 
 #include "compat/BoundedString.h"
 #include "config/Action.h"
+#include "config/CommandIds.h"
 #include "platform/PerfExecutor.h"
 #include "platform/VelmoraLog.h"
 #include "platform/VelmoraPlat.h"
 #include "server/VelmoraServer.h"
 
+using namespace velmora;
+
 namespace {
 
-constexpr int kCmdMemLatencyRatio = 20480;
-constexpr int kCmdMemLatency = 20481;
 // Each ratio keeps at most 510 characters: the buffer is 512 bytes but announced as 511.
 constexpr size_t kRatioBufferSize = 512;
 constexpr size_t kRatioBufferAnnounced = 511;

@@ -5,26 +5,22 @@
 #include <cstring>
 
 #include "config/Action.h"
+#include "config/CommandIds.h"
 #include "config/VelmoraParser.h"
 #include "platform/VelmoraPlat.h"
 #include "server/VelmoraServer.h"
 
+using namespace velmora;
+
 namespace {
 
-constexpr int kSceneFirst = 4118;
-// Configured priorities are read up to here; scene 4352 keeps whatever a lookup gave it.
-constexpr int kScenePriorityReadLast = 4351;
-constexpr int kGovSceneFirst = 4224;
-constexpr int kGovSceneLast = 4352;
-// A governor scene may be applied on its own while this scene is current.
-constexpr int kGovHostScene = 4119;
 constexpr int kPriorityTag = 101;
 constexpr const char* kPriorityKey = "priority";
 constexpr int kPriorityMin = 1;
 constexpr int kPriorityMax = 500;
 
 bool isGovScene(int cmdId) {
-    return cmdId >= kGovSceneFirst && cmdId <= kGovSceneLast;
+    return cmdId >= kGovSceneFirst && cmdId <= kSpecialSceneLast;
 }
 
 bool inPriorityRange(int prio) {
@@ -80,7 +76,7 @@ void VelmoraServer::setPriorityMap(int cmdId, Action* action) {
 }
 
 void VelmoraServer::initPriorityMap() {
-    for (int cmdId = kSceneFirst; cmdId <= kScenePriorityReadLast; ++cmdId) {
+    for (int cmdId = kSpecialSceneFirst; cmdId <= kScenePriorityReadLast; ++cmdId) {
         Action action;
         if (parseCommand(cmdId, &action) == 0) {
             setPriorityMap(cmdId, &action);
@@ -97,7 +93,7 @@ void VelmoraServer::updatePriorityMap() {
         return;
     }
     // The parser's write lock is held by the reload that called us.
-    for (int cmdId = kSceneFirst; cmdId <= kScenePriorityReadLast; ++cmdId) {
+    for (int cmdId = kSpecialSceneFirst; cmdId <= kScenePriorityReadLast; ++cmdId) {
         Action action;
         if (parser->doParseLocked(cmdId, &action) == 0) {
             setPriorityMap(cmdId, &action);

@@ -3,15 +3,16 @@
 // concurrent switches may reach the platform in either order. State is not rolled back when
 // the platform fails.
 #include "config/Action.h"
+#include "config/CommandIds.h"
 #include "platform/PerfExecutor.h"
 #include "platform/VelmoraLog.h"
 #include "platform/VelmoraPlat.h"
 #include "server/VelmoraServer.h"
 
+using namespace velmora;
+
 namespace {
 
-constexpr int kCmdClientRestart = 20224;
-constexpr int kGovHostScene = 4119;
 constexpr int kApply = 0;
 constexpr int kWithdraw = -1;
 

@@ -4,13 +4,13 @@ namespace velmora {
 
 DispatchClass CommandClass::classify(int cmdId, bool hasAction, int duration) {
     // Ids from 20224 up are taken apart before any parse; 20481 parses but ignores duration.
-    if (cmdId == kMemoryLatency) {
+    if (cmdId == kCmdMemLatency) {
         return DispatchClass::kMemoryLatency;
     }
-    if (cmdId >= kFirstNotification) {
+    if (cmdId >= kCmdClientRestart) {
         return DispatchClass::kNeverRead;
     }
-    if (cmdId == kProbeCmdId) {
+    if (cmdId == kCmdProbe) {
         return DispatchClass::kProbe;
     }
     if (!hasAction) {
@@ -20,14 +20,15 @@ DispatchClass CommandClass::classify(int cmdId, bool hasAction, int duration) {
         return DispatchClass::kDisabled;
     }
     if (isScene(cmdId)) {
-        return cmdId >= kFirstGovernorScene ? DispatchClass::kGovernorScene
-                                            : DispatchClass::kSpecialScene;
+        return cmdId >= kGovSceneFirst ? DispatchClass::kGovernorScene
+                                       : DispatchClass::kSpecialScene;
     }
     if (isOnOff(cmdId)) {
         return DispatchClass::kOnOff;
     }
     if (duration == 0) {
-        return cmdId == kStartupCmdId ? DispatchClass::kStartupLevels : DispatchClass::kSchedLevel;
+        return cmdId == kCmdDefaultSchedLevel ? DispatchClass::kStartupLevels
+                                              : DispatchClass::kSchedLevel;
     }
     return DispatchClass::kTimedAction;
 }
@@ -65,7 +66,7 @@ std::string CommandClass::effect(DispatchClass dispatchClass, int cmdId, int dur
         case DispatchClass::kMemoryLatency:
             return "payload 0/-1 applies/withdraws the pairs through the platform";
         case DispatchClass::kNeverRead:
-            return cmdId == kMemoryLatencyFromText
+            return cmdId == kCmdMemLatencyRatio
                        ? "events take their ratios from the event text, this entry is unused"
                        : "events with this id never read the configuration";
         case DispatchClass::kProbe:

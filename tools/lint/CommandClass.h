@@ -6,6 +6,8 @@
 
 #include <string>
 
+#include "config/CommandIds.h"
+
 namespace velmora {
 
 enum class DispatchClass {
@@ -24,19 +26,6 @@ enum class DispatchClass {
 
 class CommandClass {
 public:
-    static constexpr int kStartupCmdId = 5376;
-    static constexpr int kProbeCmdId = 4116;
-    static constexpr int kFirstScene = 4118;
-    static constexpr int kFirstGovernorScene = 4224;
-    static constexpr int kLastScene = 4352;
-    // Configured priorities are read for scenes up to this id only.
-    static constexpr int kLastScenePriorityRead = 4351;
-    static constexpr int kFirstOnOff = 12288;
-    static constexpr int kLastOnOff = 13568;
-    static constexpr int kFirstNotification = 20224;
-    static constexpr int kMemoryLatencyFromText = 20480;
-    static constexpr int kMemoryLatency = 20481;
-
     // The class of command `cmdId` whose dispatched record has `duration`; `hasAction` is
     // false when the command has no usable action.
     static DispatchClass classify(int cmdId, bool hasAction, int duration);
@@ -45,8 +34,8 @@ public:
     // What an event of the class does, for the --explain listing.
     static std::string effect(DispatchClass dispatchClass, int cmdId, int duration);
 
-    static bool isScene(int cmdId) { return cmdId >= kFirstScene && cmdId <= kLastScene; }
-    static bool isOnOff(int cmdId) { return cmdId >= kFirstOnOff && cmdId <= kLastOnOff; }
+    static bool isScene(int cmdId) { return cmdId >= kSpecialSceneFirst && cmdId <= kSpecialSceneLast; }
+    static bool isOnOff(int cmdId) { return cmdId >= kOnOffFirst && cmdId <= kOnOffLast; }
     // Built-in priority of a special scene, 0 when it has none.
     static int builtInPriority(int cmdId);
 };

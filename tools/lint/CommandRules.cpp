@@ -56,7 +56,7 @@ bool isOnOffTag(int tag) {
 int CommandRules::configuredPriority(int cmdId, const Action& action, bool* given, int* index) {
     *given = false;
     int priority = 0;
-    const bool governor = cmdId >= CommandClass::kFirstGovernorScene;
+    const bool governor = cmdId >= kGovSceneFirst;
     for (int i = 0; i < action.mParamNum; ++i) {
         if (governor && static_cast<size_t>(2 * i + 1) < action.mParams.size() &&
             action.mParams[2 * i] == kPriorityKey) {
@@ -80,7 +80,7 @@ int CommandRules::configuredPriority(int cmdId, const Action& action, bool* give
 int CommandRules::effectivePriority(const CheckedCommand& command) {
     const CheckedRecord* record = command.dispatched();
     bool given = false;
-    if (record != nullptr && command.id <= CommandClass::kLastScenePriorityRead) {
+    if (record != nullptr && command.id <= kScenePriorityReadLast) {
         const int priority = configuredPriority(command.id, *record->action, &given);
         if (given && isValidPriority(priority)) {
             return priority;
@@ -93,9 +93,9 @@ void CommandRules::check(const std::vector<CheckedCommand>& commands) {
     const CheckedCommand* startup = nullptr;
     const CheckedCommand* probe = nullptr;
     for (const auto& command : commands) {
-        if (command.id == CommandClass::kStartupCmdId) {
+        if (command.id == kCmdDefaultSchedLevel) {
             startup = &command;
-        } else if (command.id == CommandClass::kProbeCmdId) {
+        } else if (command.id == kCmdProbe) {
             probe = &command;
         }
         checkCommand(command);
@@ -221,14 +221,14 @@ void CommandRules::checkCommand(const CheckedCommand& command) {
                                      CommandClass::effect(dispatchClass, command.id, duration));
             break;
         case DispatchClass::kNoAction:
-            if (command.id != CommandClass::kStartupCmdId) {
+            if (command.id != kCmdDefaultSchedLevel) {
                 mDiagnostics.warning(command.line(), "command " + id +
                                                          " has no usable action: its events do "
                                                          "nothing");
             }
             break;
         case DispatchClass::kDisabled:
-            if (command.id != CommandClass::kStartupCmdId) {
+            if (command.id != kCmdDefaultSchedLevel) {
                 mDiagnostics.note(durationLine(*record),
                                   "command " + id + " is disabled (duration " + str(duration) +
                                       "): its events do nothing");
@@ -257,11 +257,11 @@ void CommandRules::checkCommand(const CheckedCommand& command) {
 void CommandRules::checkSchedLevels(const CheckedCommand& command, const CheckedRecord& record) {
     const Action& action = *record.action;
     const std::string id = str(command.id);
-    const std::string consequence = command.id == CommandClass::kStartupCmdId
+    const std::string consequence = command.id == kCmdDefaultSchedLevel
                                         ? "the server's init fails"
                                         : "every event fails (status 3)";
     if (action.mParamNum < 1 || action.mParamNum > kMaxGroupPairs) {
-        if (command.id != CommandClass::kStartupCmdId) {
+        if (command.id != kCmdDefaultSchedLevel) {
             mDiagnostics.error(durationLine(record),
                                "duration-0 command " + id + " has " + str(action.mParamNum) +
                                    " pairs: scheduling-level events take 1..8 group pairs; " +
@@ -327,9 +327,9 @@ void CommandRules::checkOnOff(const CheckedCommand& command, const CheckedRecord
 
 void CommandRules::checkScenePriority(const CheckedCommand& command, const CheckedRecord& record) {
     const std::string id = str(command.id);
-    const bool governor = command.id >= CommandClass::kFirstGovernorScene;
+    const bool governor = command.id >= kGovSceneFirst;
     const std::string kind = governor ? "governor scene " : "special scene ";
-    if (command.id > CommandClass::kLastScenePriorityRead) {
+    if (command.id > kScenePriorityReadLast) {
         mDiagnostics.error(command.line(),
                            kind + id +
                                " never gets a configured priority (the server reads them up to "

@@ -1,0 +1,36 @@
+// Command ids whose meaning is fixed by the server rather than by the configuration, and the
+// id ranges that decide how a configured command is dispatched. Shared by the server, the
+// scheduling-level manager and the configuration checker, which must agree on them.
+#pragma once
+
+namespace velmora {
+
+inline constexpr int kCmdWinSwitch = 4098;
+inline constexpr int kCmdColdStart = 4099;
+// Duration-0 events with their own rules for the ZOLA levels: the first 4114 is remembered,
+// 4113 only moves groups still at that remembered level.
+inline constexpr int kCmdZolaFollower = 4113;
+inline constexpr int kCmdZolaReference = 4114;
+inline constexpr int kCmdProbe = 4116;
+// Start-up command carrying the default scheduling-group levels.
+inline constexpr int kCmdDefaultSchedLevel = 5376;
+
+inline constexpr int kSpecialSceneFirst = 4118;
+inline constexpr int kSpecialSceneLast = 4352;
+// A governor scene may be applied on its own while this scene is current.
+inline constexpr int kGovHostScene = 4119;
+inline constexpr int kGovSceneFirst = 4224;
+// Configured scene priorities are read up to here; scene 4352 keeps whatever a lookup gave it.
+inline constexpr int kScenePriorityReadLast = 4351;
+
+inline constexpr int kOnOffFirst = 12288;
+inline constexpr int kOnOffLast = 13568;
+
+// Ids from here up are handled before any parse; the others are ignored.
+inline constexpr int kCmdClientRestart = 20224;
+inline constexpr int kCmdNotification = 20225;
+inline constexpr int kCmdReload = 20230;
+inline constexpr int kCmdMemLatencyRatio = 20480;
+inline constexpr int kCmdMemLatency = 20481;
+
+}  // namespace velmora
