@@ -1,7 +1,6 @@
 #include "bench/BenchPlatform.h"
 
 #include <cstdio>
-#include <cstdlib>
 #include <cstring>
 #include <atomic>
 
@@ -9,6 +8,7 @@
 #include "config/VelmoraLoadXml.h"
 #include "platform/OnDemandBoostServer.h"
 #include "platform/PlatformImports.h"
+#include "tests/fakes/FakeLoadXml.h"
 
 namespace velmora {
 namespace bench {
@@ -26,51 +26,6 @@ std::atomic<unsigned int> gProbeTid{0};
 class BenchPlatform : public VelmoraPlat {
 public:
     BenchPlatform() { mExecutorPtr = &executor(); }
-};
-
-Action* convertRecord(const RawXmlData& raw) {
-    auto* action = new Action();
-    action->mCmdId = raw.cmdId;
-    action->mName = raw.name;
-    action->mDuration = 0;
-    int intPairs = 0;
-    int stringPairs = 0;
-    for (size_t i = 0; i < raw.names.size(); ++i) {
-        const std::string& name = raw.names[i];
-        const std::string& value = raw.values[i];
-        if (name == "duration") {
-            action->mDuration = atoi(value.c_str());
-        } else if (name.size() > 2 && name.compare(0, 2, "s_") == 0) {
-            action->mParams.push_back(name.substr(2));
-            action->mParams.push_back(value);
-            ++stringPairs;
-        } else if (name.size() > 1 && name[0] == 't') {
-            action->mTagValues.push_back(atoi(name.c_str() + 1));
-            action->mTagValues.push_back(atoi(value.c_str()));
-            ++intPairs;
-        }
-    }
-    action->mParamNum = stringPairs > 0 ? stringPairs : intPairs;
-    return action;
-}
-
-class BenchLoadXml : public VelmoraLoadXml {
-public:
-    ActionMap* createActionMap(RawXmlDataMap& rawMap) override {
-        auto* map = new ActionMap();
-        for (const auto& entry : rawMap) {
-            auto* head = new Action();
-            head->mCmdId = entry.second->cmdId;
-            head->mName = entry.second->name;
-            Action* tail = head;
-            for (const RawXmlData* rec = entry.second->next; rec != nullptr; rec = rec->next) {
-                tail->mNext = convertRecord(*rec);
-                tail = tail->mNext;
-            }
-            (*map)[entry.first] = head;
-        }
-        return map;
-    }
 };
 
 }  // namespace
@@ -126,7 +81,7 @@ VelmoraPlat* getPlat() {
 }
 
 VelmoraLoadXml* createVelmoraLoadXml() {
-    return new velmora::bench::BenchLoadXml();
+    return new velmora::fake::FakeLoadXml();
 }
 
 OnDemandBoostServer* OnDemandBoostServer::getInstance() {

@@ -4,8 +4,8 @@
 // Unlike the test platform it records nothing (recording allocates); the only observation is
 // the probe boost hook, which the probe latency benchmark installs. Configuration comes from one
 // file named by setConfigPath(); there is no cloud copy, no launch policy, and the device event
-// log drops its lines. Loader conversion: <duration>N</duration>, <tN>V</tN> integer pairs,
-// <s_KEY>V</s_KEY> string pairs, as in the tests.
+// log drops its lines. The loader is the test platform's (tests/fakes/FakeLoadXml.h), so the
+// benchmarks read configurations written in the tests' vocabulary.
 #pragma once
 
 #include <pthread.h>
