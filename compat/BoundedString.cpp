@@ -37,7 +37,7 @@ int snprintf_s(char* dest, size_t destMax, size_t count, const char* format, ...
 
 namespace {
 
-// One conversion specification, split out of the caller's format.
+// One conversion (%d, %s, %[...] and so on) split out of the caller's format.
 struct Conversion {
     bool suppress = false;
     int width = 0;          // 0: none given
@@ -46,7 +46,7 @@ struct Conversion {
     std::string scanSet;    // for %[...]: the text between '[' and ']' inclusive
 };
 
-// Parses the specification after '%'. Returns the position after it, or null when malformed.
+// Parses a conversion after '%'. Returns the position after it, or null when malformed.
 const char* parseConversion(const char* f, Conversion* c) {
     if (*f == '*') {
         c->suppress = true;
