@@ -11,3 +11,15 @@ Action::Action(int32_t cmdId, std::string name, int32_t duration, int32_t paramN
         mParams[i] = std::move(params[i]);
     }
 }
+
+namespace velmora {
+
+void deleteActionChain(Action* head) {
+    while (head != nullptr) {
+        Action* next = head->mNext;
+        delete head;
+        head = next;
+    }
+}
+
+}  // namespace velmora

@@ -35,3 +35,10 @@ public:
 };
 
 using ActionMap = std::map<int32_t, Action*>;
+
+namespace velmora {
+
+// Deletes `head` and every record after it, following mNext. Null is allowed.
+void deleteActionChain(Action* head);
+
+}  // namespace velmora

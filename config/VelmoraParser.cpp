@@ -22,12 +22,7 @@ void VelmoraParser::deleteActionMap(ActionMap* map) {
         return;
     }
     for (auto& entry : *map) {
-        Action* action = entry.second;
-        while (action != nullptr) {
-            Action* next = action->mNext;
-            delete action;
-            action = next;
-        }
+        velmora::deleteActionChain(entry.second);
     }
     delete map;
 }

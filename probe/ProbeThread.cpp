@@ -159,11 +159,8 @@ void ProbeHandler::ProbeThread::update(Action* action) {
 }
 
 void ProbeHandler::ProbeThread::deleteAction() {
-    while (mAction != nullptr) {
-        Action* next = mAction->mNext;
-        delete mAction;
-        mAction = next;
-    }
+    velmora::deleteActionChain(mAction);
+    mAction = nullptr;
 }
 
 void ProbeHandler::ProbeThread::shutdown() {

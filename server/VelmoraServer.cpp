@@ -68,11 +68,7 @@ int VelmoraServer::velmoraGetVersion() {
 }
 
 void VelmoraServer::deleteActionPtr(Action* action) {
-    while (action != nullptr) {
-        Action* next = action->mNext;
-        delete action;
-        action = next;
-    }
+    deleteActionChain(action);
 }
 
 int VelmoraServer::parseCommand(int cmdId, Action* action) {
