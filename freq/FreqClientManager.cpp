@@ -42,6 +42,15 @@ int valueOr0(const FreqClientManager::TagMap& map, int tag) {
     return it == map.end() ? 0 : it->second;
 }
 
+// Hands a merged configuration to the platform; both request paths log a refusal alike.
+int applyConfig(PerfExecutor* exec, int id, int count, const int* tags, const int* values) {
+    const int ret = exec != nullptr ? exec->doPerfSetConfig(id, count, tags, values) : -1;
+    if (ret != 0) {
+        VLOGE("doPerfSetConfig failed!");
+    }
+    return ret;
+}
+
 }  // namespace
 
 FreqClientManager::FreqClientManager(VelmoraPlat* plat)
@@ -145,14 +154,8 @@ int FreqClientManager::doPerfSetConfig(int id, int tagLen, const int* tags, cons
         }
     }
 
-    PerfExecutor* exec = executor();
-    if (exec == nullptr) {
-        VLOGE("doPerfSetConfig failed!");
-        return -1;
-    }
-    const int ret = exec->doPerfSetConfig(id, tagLen, outTags, outValues);
+    const int ret = applyConfig(executor(), id, tagLen, outTags, outValues);
     if (ret != 0) {
-        VLOGE("doPerfSetConfig failed!");
         return ret;
     }
     // The platform has applied the request by now, so even an unknown id counts as success.
@@ -265,16 +268,7 @@ int FreqClientManager::doPerfEventConfig(int cmdId, int tagLen, const int* tags,
         saveDataToMap(cmdId, onOff, requested);
     }
 
-    PerfExecutor* exec = executor();
-    if (exec == nullptr) {
-        VLOGE("doPerfSetConfig failed!");
-        return -1;
-    }
-    const int ret = exec->doPerfSetConfig(cmdId, tagLen, tags, result);
-    if (ret != 0) {
-        VLOGE("doPerfSetConfig failed!");
-    }
-    return ret;
+    return applyConfig(executor(), cmdId, tagLen, tags, result);
 }
 
 void FreqClientManager::setMapFreq(int cmdId, int tag, int value) {
