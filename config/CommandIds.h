@@ -23,6 +23,18 @@ inline constexpr int kGovSceneFirst = 4224;
 // Configured scene priorities are read up to here; scene 4352 keeps whatever a lookup gave it.
 inline constexpr int kScenePriorityReadLast = 4351;
 
+// Priorities every server starts with; a valid configured priority replaces them.
+struct BuiltInScenePriority {
+    int cmdId;
+    int priority;
+};
+inline constexpr BuiltInScenePriority kBuiltInScenePriorities[] = {
+    {4118, 100},
+    {kGovHostScene, 200},
+    {4120, 20},
+    {4121, 70},
+};
+
 inline constexpr int kOnOffFirst = 12288;
 inline constexpr int kOnOffLast = 13568;
 

@@ -3,6 +3,8 @@
 #include <cstdlib>
 
 #include "config/Action.h"
+#include "config/CommandIds.h"
+#include "config/Tags.h"
 #include "host/ParamVocabulary.h"
 #include "platform/VelmoraLog.h"
 
@@ -10,21 +12,21 @@ namespace velmora {
 
 namespace {
 
-constexpr int kProbeCmdId = 4116;
-constexpr int kPriorityTag = 101;
-constexpr int kForkOnBigTag = 20;
-constexpr int kNoSchedLevel = -100;  // group level of "nothing requested"
+constexpr int kProbeCmdId = kCmdProbe;
+constexpr int kPriorityTag = kTagScenePriority;
+constexpr int kForkOnBigTag = VELMORA_TAG_FORK_ON_BIG_CLUSTER;
+constexpr int kNoSchedLevel = ZOLA_SCHED_LEVEL_NONE;  // group level of "nothing requested"
 constexpr const char* kFreqSource = "freq";
 constexpr const char* kSchedSource = "sched";
 constexpr const char* kProbeSource = "probe";
 
 // Kind of a command as far as its lifetime goes; also the timeline category of its instants.
 const char* categoryOf(int cmdId) {
-    if (cmdId >= 4118 && cmdId <= 4352)
+    if (cmdId >= kSpecialSceneFirst && cmdId <= kSpecialSceneLast)
         return "scene";
-    if (cmdId >= 12288 && cmdId <= 13568)
+    if (cmdId >= kOnOffFirst && cmdId <= kOnOffLast)
         return "onoff";
-    if (cmdId == 20480 || cmdId == 20481)
+    if (cmdId == kCmdMemLatencyRatio || cmdId == kCmdMemLatency)
         return "memlat";
     return "action";
 }
@@ -156,7 +158,7 @@ int HostExecutor::doPerfSetConfig(int id, int count, const int* tags, const int*
     int ret = 0;
     for (int i = 0; i < count; ++i) {
         const std::string key = mNodes.keyForTag(tags[i]);
-        if (key.empty() || tags[i] == 22 || tags[i] == 24 || tags[i] == 26) {
+        if (key.empty() || isTopFreqTag(tags[i])) {
             VLOGW("host: setConfig id=%d: tag %d cannot be set, ignored", id, tags[i]);
             ret = -1;
             continue;
@@ -195,8 +197,7 @@ int HostExecutor::doSchedLevelAction(int count, const int* groups, const int* le
     std::lock_guard<std::mutex> lock(mLock);
     int ret = 0;
     for (int i = 0; i < count; ++i) {
-        const std::string key =
-            groups[i] >= 50 && groups[i] <= 58 ? mNodes.keyForTag(groups[i]) : std::string();
+        const std::string key = isGroupTag(groups[i]) ? mNodes.keyForTag(groups[i]) : std::string();
         if (key.empty()) {
             VLOGW("host: sched level for unknown group tag %d, ignored", groups[i]);
             ret = -1;

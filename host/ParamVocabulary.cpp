@@ -4,6 +4,8 @@
 #include <climits>
 #include <cstdlib>
 
+#include "config/CommandIds.h"
+#include "config/Tags.h"
 #include "platform/VelmoraLog.h"
 
 namespace velmora {
@@ -16,27 +18,27 @@ struct Term {
 };
 
 const Term kTerms[] = {
-    {"little_min", 1},
-    {"little_max", 2},
-    {"big_min", 4},
-    {"big_max", 5},
-    {"gpu_min", 7},
-    {"gpu_max", 8},
-    {"ddr_min", 10},
-    {"ipa_switch_temp", 17},
-    {"ipa_control_temp", 18},
-    {"ipa_sustainable_power", 19},
-    {"fork_on_big", 20},
-    {"group_hmp", 50},
-    {"group_boost", 51},
-    {"group_vip", 52},
-    {"group_top_app", 53},
-    {"group_root", 54},
-    {"group_foreground", 55},
-    {"group_system_background", 56},
-    {"group_key_background", 57},
-    {"group_background", 58},
-    {"priority", 101},
+    {"little_min", VELMORA_TAG_LITTLE_CPU_MIN_FREQ},
+    {"little_max", VELMORA_TAG_LITTLE_CPU_MAX_FREQ},
+    {"big_min", VELMORA_TAG_BIG_CPU_MIN_FREQ},
+    {"big_max", VELMORA_TAG_BIG_CPU_MAX_FREQ},
+    {"gpu_min", VELMORA_TAG_GPU_MIN_FREQ},
+    {"gpu_max", VELMORA_TAG_GPU_MAX_FREQ},
+    {"ddr_min", kTagDdrMinFreq},
+    {"ipa_switch_temp", VELMORA_TAG_IPA_SWITCH_TEMP},
+    {"ipa_control_temp", VELMORA_TAG_IPA_CONTROL_TEMP},
+    {"ipa_sustainable_power", VELMORA_TAG_IPA_SUSTAINABLE_POWER},
+    {"fork_on_big", VELMORA_TAG_FORK_ON_BIG_CLUSTER},
+    {"group_hmp", VELMORA_TAG_GROUP_HMP},
+    {"group_boost", VELMORA_TAG_GROUP_BOOST},
+    {"group_vip", VELMORA_TAG_GROUP_VIP},
+    {"group_top_app", VELMORA_TAG_GROUP_TOP_APP},
+    {"group_root", VELMORA_TAG_GROUP_ROOT},
+    {"group_foreground", VELMORA_TAG_GROUP_FOREGROUND},
+    {"group_system_background", VELMORA_TAG_GROUP_SYSTEM_BACKGROUND},
+    {"group_key_background", VELMORA_TAG_GROUP_KEY_BACKGROUND},
+    {"group_background", VELMORA_TAG_GROUP_BACKGROUND},
+    {kScenePriorityKey, kTagScenePriority},
 };
 
 struct TextTerm {
@@ -102,7 +104,8 @@ std::string ParamVocabulary::textNodeForName(const std::string& name) {
 }
 
 bool ParamVocabulary::usesStringPairs(int cmdId) {
-    return (cmdId >= 4224 && cmdId <= 4352) || cmdId == 20480 || cmdId == 20481;
+    return (cmdId >= kGovSceneFirst && cmdId <= kSpecialSceneLast) ||
+           cmdId == kCmdMemLatencyRatio || cmdId == kCmdMemLatency;
 }
 
 Action* ParamVocabulary::toAction(const RawXmlData& record) {

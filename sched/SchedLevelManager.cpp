@@ -23,7 +23,7 @@ constexpr int kFirstGroupTag = VELMORA_TAG_GROUP_HMP;
 constexpr int kLastGroupTag = VELMORA_TAG_GROUP_BACKGROUND;
 constexpr int kFirstEasGroupTag = VELMORA_TAG_GROUP_BOOST;
 // Packed client levels are offset so that the low half stays non-negative.
-constexpr int kLevelOffset = 20;
+constexpr int kLevelOffset = -velmora::kSchedLevelLowest;
 
 constexpr int kClientKx = 1;
 constexpr int kClientJn = 2;
@@ -89,9 +89,9 @@ void SchedLevelManager::initZolaSchedLevelMap(LevelMap& table) {
 }
 
 void SchedLevelManager::initSchedLevelVec() {
-    static constexpr int kLevels[] = {-20, -10, 0, 10, 20, 30, 40};
     mSchedLevelNum = 0;
-    for (int level : kLevels) {
+    for (int level = velmora::kSchedLevelLowest; level <= velmora::kSchedLevelHighest;
+         level += velmora::kSchedLevelStep) {
         mSchedLevels[mSchedLevelNum++] = level;
     }
 }

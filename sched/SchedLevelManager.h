@@ -22,27 +22,10 @@
 #include <map>
 #include <vector>
 
+#include "config/Tags.h"
+
 class Action;
 class VelmoraPlat;
-
-// Scheduler-group tags: group index + 50. 50 is the single hmp group, 51..58 the EAS groups.
-constexpr int VELMORA_TAG_GROUP_HMP = 50;
-constexpr int VELMORA_TAG_GROUP_BOOST = 51;
-constexpr int VELMORA_TAG_GROUP_VIP = 52;
-constexpr int VELMORA_TAG_GROUP_TOP_APP = 53;
-constexpr int VELMORA_TAG_GROUP_ROOT = 54;
-constexpr int VELMORA_TAG_GROUP_FOREGROUND = 55;
-constexpr int VELMORA_TAG_GROUP_SYSTEM_BACKGROUND = 56;
-constexpr int VELMORA_TAG_GROUP_KEY_BACKGROUND = 57;
-constexpr int VELMORA_TAG_GROUP_BACKGROUND = 58;
-
-// Client request tags. Step config: 0 back to defaults, 1 one step down, 2 one step up.
-// Set config: group index in bits 31..16, level + 20 in bits 15..0.
-constexpr int VELMORA_TAG_SCHED_LEVEL_STEP = 40;
-constexpr int VELMORA_TAG_SET_SCHED_LEVEL = 42;
-
-// Event level of a group that no duration-0 event has named yet.
-constexpr int ZOLA_SCHED_LEVEL_NONE = -100;
 
 class SchedLevelManager {
 public:

@@ -19,7 +19,7 @@ namespace {
 // Notification word: bit 18 lets launch policies replace action durations.
 constexpr int kPolicyEnableBit = 0x40000;
 // On/off pairs with this tag are carried out by the platform, not the frequency manager.
-constexpr int kPlatformOnOffTag = 10;
+constexpr int kPlatformOnOffTag = kTagDdrMinFreq;
 // Most frequency pairs an on/off command may hand to the frequency manager.
 constexpr int kMaxOnOffFreqPairs = MAX_EVENT_TAGS;
 

@@ -6,6 +6,7 @@
 
 #include "config/Action.h"
 #include "config/CommandIds.h"
+#include "config/Tags.h"
 #include "config/VelmoraParser.h"
 #include "platform/VelmoraPlat.h"
 #include "server/VelmoraServer.h"
@@ -14,10 +15,10 @@ using namespace velmora;
 
 namespace {
 
-constexpr int kPriorityTag = 101;
-constexpr const char* kPriorityKey = "priority";
-constexpr int kPriorityMin = 1;
-constexpr int kPriorityMax = 500;
+constexpr int kPriorityTag = kTagScenePriority;
+constexpr const char* kPriorityKey = kScenePriorityKey;
+constexpr int kPriorityMin = kScenePriorityMin;
+constexpr int kPriorityMax = kScenePriorityMax;
 
 bool isGovScene(int cmdId) {
     return cmdId >= kGovSceneFirst && cmdId <= kSpecialSceneLast;
@@ -30,10 +31,9 @@ bool inPriorityRange(int prio) {
 }  // namespace
 
 void VelmoraServer::initExistingPriority() {
-    mPriorityMap[4118] = 100;
-    mPriorityMap[4119] = 200;
-    mPriorityMap[4120] = 20;
-    mPriorityMap[4121] = 70;
+    for (const auto& scene : kBuiltInScenePriorities) {
+        mPriorityMap[scene.cmdId] = scene.priority;
+    }
 }
 
 int VelmoraServer::getPriority(Action* action) {

@@ -90,27 +90,21 @@ std::string CommandClass::effect(DispatchClass dispatchClass, int cmdId, int dur
     }
     std::string text =
         "the platform applies the pairs and reverts them after " + std::to_string(duration) + " ms";
-    if (cmdId == 4098 || cmdId == 4099) {
+    if (cmdId == kCmdWinSwitch || cmdId == kCmdColdStart) {
         text += "; the launch policy \"";
-        text += cmdId == 4099 ? "cold" : "winswitch";
+        text += cmdId == kCmdColdStart ? "cold" : "winswitch";
         text += "\" may replace the duration";
     }
     return text;
 }
 
 int CommandClass::builtInPriority(int cmdId) {
-    switch (cmdId) {
-        case 4118:
-            return 100;
-        case 4119:
-            return 200;
-        case 4120:
-            return 20;
-        case 4121:
-            return 70;
-        default:
-            return 0;
+    for (const auto& scene : kBuiltInScenePriorities) {
+        if (scene.cmdId == cmdId) {
+            return scene.priority;
+        }
     }
+    return 0;
 }
 
 }  // namespace velmora

@@ -3,21 +3,21 @@
 #include <cstdlib>
 #include <map>
 
+#include "config/Tags.h"
 #include "tools/lint/CommandClass.h"
 
 namespace velmora {
 
 namespace {
 
-constexpr int kHmpGroupTag = 50;
-constexpr int kFirstEasGroupTag = 51;
-constexpr int kLastGroupTag = 58;
-constexpr int kEasGroupCount = 8;
-constexpr int kMaxGroupPairs = 8;
-constexpr int kLowestLevel = -20;
-constexpr int kHighestLevel = 40;
-constexpr int kPriorityTag = 101;
-constexpr const char* kPriorityKey = "priority";
+constexpr int kHmpGroupTag = VELMORA_TAG_GROUP_HMP;
+constexpr int kFirstEasGroupTag = VELMORA_TAG_GROUP_BOOST;
+constexpr int kLastGroupTag = VELMORA_TAG_GROUP_BACKGROUND;
+constexpr int kMaxGroupPairs = kEasGroupCount;
+constexpr int kLowestLevel = kSchedLevelLowest;
+constexpr int kHighestLevel = kSchedLevelHighest;
+constexpr int kPriorityTag = kTagScenePriority;
+constexpr const char* kPriorityKey = kScenePriorityKey;
 // The probe worker caps the start-up probe action's duration; a reloaded one keeps its own.
 constexpr int kMaxProbeDurationMs = 100;
 
@@ -43,12 +43,8 @@ std::string pairName(const CheckedRecord& record, int i) {
     return "<" + record.pairParams[i]->name + ">";
 }
 
-bool isGroupTag(int tag) {
-    return tag >= kHmpGroupTag && tag <= kLastGroupTag;
-}
-
 bool isOnOffTag(int tag) {
-    return tag == 1 || tag == 2 || tag == 4 || tag == 5 || tag == 7 || tag == 8 || tag == 10;
+    return isFreqFloorTag(tag) || isFreqCapTag(tag) || tag == kTagDdrMinFreq;
 }
 
 }  // namespace
@@ -306,7 +302,9 @@ void CommandRules::checkOnOff(const CheckedCommand& command, const CheckedRecord
         }
         lastOfTag[tag] = i;
     }
-    const int floorCap[][2] = {{1, 2}, {4, 5}, {7, 8}};
+    const int floorCap[][2] = {{VELMORA_TAG_LITTLE_CPU_MIN_FREQ, VELMORA_TAG_LITTLE_CPU_MAX_FREQ},
+                               {VELMORA_TAG_BIG_CPU_MIN_FREQ, VELMORA_TAG_BIG_CPU_MAX_FREQ},
+                               {VELMORA_TAG_GPU_MIN_FREQ, VELMORA_TAG_GPU_MAX_FREQ}};
     for (const auto& pair : floorCap) {
         auto floor = lastOfTag.find(pair[0]);
         auto cap = lastOfTag.find(pair[1]);

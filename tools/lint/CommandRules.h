@@ -9,6 +9,7 @@
 
 #include <vector>
 
+#include "config/Tags.h"
 #include "tools/lint/Diagnostics.h"
 #include "tools/lint/LoadChecker.h"
 
@@ -16,8 +17,8 @@ namespace velmora {
 
 class CommandRules {
 public:
-    static constexpr int kMinPriority = 1;
-    static constexpr int kMaxPriority = 500;
+    static constexpr int kMinPriority = kScenePriorityMin;
+    static constexpr int kMaxPriority = kScenePriorityMax;
 
     // `policyLine` is where findings about missing commands go.
     CommandRules(Diagnostics& diagnostics, int policyLine)

@@ -3,6 +3,7 @@
 #include <chrono>
 #include <thread>
 
+#include "config/CommandIds.h"
 #include "host/HostEnvironment.h"
 #include "host/HostPlatform.h"
 #include "server/VelmoraServer.h"
@@ -11,7 +12,7 @@ namespace velmora {
 
 namespace {
 
-constexpr int kReloadCmdId = 20230;
+constexpr int kReloadCmdId = kCmdReload;
 // How long the end of a replay waits for the library's probe worker to withdraw its boosts
 // (boosts live at most 256 ms).
 constexpr auto kProbeDrainLimit = std::chrono::milliseconds(1000);
