@@ -42,7 +42,7 @@ HostExecutor::HostExecutor(const NodeMap& nodes, DeviceTree& tree, HostClock& cl
     : mNodes(nodes),
       mTree(tree),
       mTimeline(timeline),
-      mResolver(nodes, tree),
+      mResolver(nodes, tree, &timeline),
       mTimers(clock, [this](int cmdId) { onExpire(cmdId); }) {}
 
 HostExecutor::~HostExecutor() = default;

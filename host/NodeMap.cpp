@@ -3,89 +3,62 @@
 #include <fstream>
 #include <sstream>
 
+#include "config/Tags.h"
+#include "host/profile/DeviceProfile.h"
+
 namespace velmora {
 
 namespace {
 
-constexpr const char* kCpuFreq = "sys/devices/system/cpu/cpufreq/";
-constexpr const char* kGpuFreq = "sys/class/devfreq/gpufreq/";
-constexpr const char* kDdrFreq = "sys/class/devfreq/ddrfreq/";
-constexpr const char* kThermal = "sys/class/thermal/thermal_zone0/";
-constexpr const char* kStune = "dev/stune/";
-
-struct GroupNode {
+struct TagKey {
     int tag;
     const char* key;
-    const char* dir;  // schedtune directory; "" is the root group
 };
 
-// Tags 51..58 are the EAS groups; tag 50, the single hmp group, is a kernel tunable.
-const GroupNode kGroups[] = {
-    {51, "sched.group.boost", "boost/"},
-    {52, "sched.group.vip", "vip/"},
-    {53, "sched.group.top_app", "top-app/"},
-    {54, "sched.group.root", ""},
-    {55, "sched.group.foreground", "foreground/"},
-    {56, "sched.group.system_background", "system-background/"},
-    {57, "sched.group.key_background", "key-background/"},
-    {58, "sched.group.background", "background/"},
+// Tags 51..58 are the EAS groups (schedtune); tag 50, the single hmp group, is a kernel tunable.
+const TagKey kTagKeys[] = {
+    {VELMORA_TAG_LITTLE_CPU_MIN_FREQ, "cpu.little.min"},
+    {VELMORA_TAG_LITTLE_CPU_MAX_FREQ, "cpu.little.max"},
+    {VELMORA_TAG_BIG_CPU_MIN_FREQ, "cpu.big.min"},
+    {VELMORA_TAG_BIG_CPU_MAX_FREQ, "cpu.big.max"},
+    {VELMORA_TAG_GPU_MIN_FREQ, "gpu.min"},
+    {VELMORA_TAG_GPU_MAX_FREQ, "gpu.max"},
+    {kTagDdrMinFreq, "ddr.min"},
+    {VELMORA_TAG_IPA_SWITCH_TEMP, "ipa.switch_temp"},
+    {VELMORA_TAG_IPA_CONTROL_TEMP, "ipa.control_temp"},
+    {VELMORA_TAG_IPA_SUSTAINABLE_POWER, "ipa.sustainable_power"},
+    {VELMORA_TAG_FORK_ON_BIG_CLUSTER, "sched.fork_on_big"},
+    {VELMORA_TAG_LITTLE_CPU_TOP_FREQ, "cpu.little.top"},
+    {VELMORA_TAG_BIG_CPU_TOP_FREQ, "cpu.big.top"},
+    {VELMORA_TAG_GPU_TOP_FREQ, "gpu.top"},
+    {VELMORA_TAG_GROUP_HMP, "sched.group.hmp"},
+    {VELMORA_TAG_GROUP_BOOST, "sched.group.boost"},
+    {VELMORA_TAG_GROUP_VIP, "sched.group.vip"},
+    {VELMORA_TAG_GROUP_TOP_APP, "sched.group.top_app"},
+    {VELMORA_TAG_GROUP_ROOT, "sched.group.root"},
+    {VELMORA_TAG_GROUP_FOREGROUND, "sched.group.foreground"},
+    {VELMORA_TAG_GROUP_SYSTEM_BACKGROUND, "sched.group.system_background"},
+    {VELMORA_TAG_GROUP_KEY_BACKGROUND, "sched.group.key_background"},
+    {VELMORA_TAG_GROUP_BACKGROUND, "sched.group.background"},
 };
 
 }  // namespace
 
-NodeMap::NodeMap() {
-    const std::string cpu = kCpuFreq;
-    // Frequencies in kHz for the CPU clusters (cpufreq) and in Hz for the GPU and DDR (devfreq).
-    add("cpu.little.min", cpu + "policy0/scaling_min_freq", NodeKind::Floor, "300000");
-    add("cpu.little.max", cpu + "policy0/scaling_max_freq", NodeKind::Cap, "1804800");
-    add("cpu.little.top", cpu + "policy0/cpuinfo_max_freq", NodeKind::Value, "1804800");
-    add("cpu.little.governor", cpu + "policy0/scaling_governor", NodeKind::Text, "schedutil");
-    add("cpu.big.min", cpu + "policy4/scaling_min_freq", NodeKind::Floor, "710400");
-    add("cpu.big.max", cpu + "policy4/scaling_max_freq", NodeKind::Cap, "2841600");
-    add("cpu.big.top", cpu + "policy4/cpuinfo_max_freq", NodeKind::Value, "2841600");
-    add("cpu.big.governor", cpu + "policy4/scaling_governor", NodeKind::Text, "schedutil");
-    add("gpu.min", std::string(kGpuFreq) + "min_freq", NodeKind::Floor, "257000000");
-    add("gpu.max", std::string(kGpuFreq) + "max_freq", NodeKind::Cap, "900000000");
-    add("gpu.top", std::string(kGpuFreq) + "max_freq_limit", NodeKind::Value, "900000000");
-    add("gpu.governor", std::string(kGpuFreq) + "governor", NodeKind::Text, "simple_ondemand");
-    add("ddr.min", std::string(kDdrFreq) + "min_freq", NodeKind::Floor, "200000000");
-    // IPA: trip point 0 switches the governor on, trip point 1 is the control temperature.
-    add("ipa.switch_temp", std::string(kThermal) + "trip_point_0_temp", NodeKind::Value, "65000");
-    add("ipa.control_temp", std::string(kThermal) + "trip_point_1_temp", NodeKind::Value, "85000");
-    add("ipa.sustainable_power", std::string(kThermal) + "sustainable_power", NodeKind::Value,
-        "3500");
-    add("sched.fork_on_big", "proc/sys/kernel/sched_fork_on_big_cluster", NodeKind::Value, "0");
-    add("sched.group.hmp", "proc/sys/kernel/sched_hmp_boost", NodeKind::Value, "0");
-    for (const auto& group : kGroups) {
-        add(group.key, std::string(kStune) + group.dir + "schedtune.boost", NodeKind::Value, "0");
-        mTagKeys[group.tag] = group.key;
-    }
-    // Per-thread probe boosts: the boosted threads go into the probe group's task list.
-    add("probe.tid", std::string(kStune) + "probe/tasks", NodeKind::Value, "0");
-    add("probe.threads", std::string(kStune) + "probe/boosted_count", NodeKind::Value, "0");
-    add("memlat.ratio_b", "sys/class/devfreq/memlat-big/ratio", NodeKind::Value, "1");
-    add("memlat.ratio_l", "sys/class/devfreq/memlat-little/ratio", NodeKind::Value, "1");
+NodeMap::NodeMap() : NodeMap(DeviceProfile::builtIn()) {}
 
-    mTagKeys[1] = "cpu.little.min";
-    mTagKeys[2] = "cpu.little.max";
-    mTagKeys[4] = "cpu.big.min";
-    mTagKeys[5] = "cpu.big.max";
-    mTagKeys[7] = "gpu.min";
-    mTagKeys[8] = "gpu.max";
-    mTagKeys[10] = "ddr.min";
-    mTagKeys[17] = "ipa.switch_temp";
-    mTagKeys[18] = "ipa.control_temp";
-    mTagKeys[19] = "ipa.sustainable_power";
-    mTagKeys[20] = "sched.fork_on_big";
-    mTagKeys[22] = "cpu.little.top";
-    mTagKeys[24] = "cpu.big.top";
-    mTagKeys[26] = "gpu.top";
-    mTagKeys[50] = "sched.group.hmp";
+NodeMap::NodeMap(const DeviceProfile& profile) {
+    useProfile(profile);
+    initTagKeys();
 }
 
-void NodeMap::add(const std::string& key, const std::string& path, NodeKind kind,
-                  const std::string& seed) {
-    mNodes.push_back({key, path, kind, seed});
+void NodeMap::useProfile(const DeviceProfile& profile) {
+    mNodes = profile.nodes();
+}
+
+void NodeMap::initTagKeys() {
+    for (const auto& entry : kTagKeys) {
+        mTagKeys[entry.tag] = entry.key;
+    }
 }
 
 const NodeSpec* NodeMap::find(const std::string& key) const {

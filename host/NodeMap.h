@@ -1,8 +1,9 @@
 // The node map: which file under the device root stands for which logical node, how requests
-// for the node combine, and which value a fresh simulated device starts with.
+// for the node combine, which values the node accepts and which value a fresh simulated device
+// starts with.
 //
-// Built with defaults that follow the usual Linux layout (cpufreq policies, devfreq, thermal
-// zones, cgroup schedtune groups); a small text file can override paths and seed values:
+// Built from the device profile (DeviceProfile: the example device's profile unless the host
+// program loads another one); a small text file can override paths and seed values:
 //
 //     # key                 path (relative to the device root)                  [seed]
 //     cpu.big.max           sys/devices/system/cpu/cpufreq/policy6/scaling_max_freq
@@ -14,6 +15,8 @@
 #include <map>
 #include <string>
 #include <vector>
+
+#include "host/profile/ValueRule.h"
 
 namespace velmora {
 
@@ -29,11 +32,19 @@ struct NodeSpec {
     std::string path;  // relative to the device root
     NodeKind kind;
     std::string seed;  // value of a fresh simulated device
+    ValueRule rule;    // what the node accepts
+    int line = 0;      // line of the node in its device profile
 };
+
+class DeviceProfile;
 
 class NodeMap {
 public:
-    NodeMap();  // the defaults
+    NodeMap();  // the nodes of the built-in (example) device profile
+    explicit NodeMap(const DeviceProfile& profile);
+
+    // Takes the nodes of `profile`, dropping any override applied so far.
+    void useProfile(const DeviceProfile& profile);
 
     const std::vector<NodeSpec>& nodes() const { return mNodes; }
     // Null when `key` is not a node.
@@ -48,8 +59,7 @@ public:
     int load(const std::string& path, std::string* error);
 
 private:
-    void add(const std::string& key, const std::string& path, NodeKind kind,
-             const std::string& seed);
+    void initTagKeys();
 
     std::vector<NodeSpec> mNodes;
     std::map<int, std::string> mTagKeys;

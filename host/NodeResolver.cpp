@@ -3,14 +3,50 @@
 #include <cstdlib>
 #include <set>
 
+#include "host/profile/KernelRules.h"
 #include "platform/VelmoraLog.h"
 
 namespace velmora {
 
-NodeResolver::NodeResolver(const NodeMap& nodes, DeviceTree& tree) : mNodes(nodes), mTree(tree) {}
+NodeResolver::NodeResolver(const NodeMap& nodes, DeviceTree& tree, Timeline* timeline)
+    : mNodes(nodes), mTree(tree), mTimeline(timeline) {}
+
+bool NodeResolver::take(const std::string& key, const std::string& source, const std::string& value,
+                        std::string* effective) {
+    const NodeSpec* spec = mNodes.find(key);
+    if (spec == nullptr) {
+        *effective = value;  // resolve() reports the missing node
+        return true;
+    }
+    const KernelRules::Outcome outcome = KernelRules::take(*spec, value);
+    switch (outcome.verdict) {
+        case KernelRules::Verdict::kAccepted:
+            *effective = value;
+            return true;
+        case KernelRules::Verdict::kRounded:
+            *effective = outcome.effective;
+            if (mTimeline != nullptr) {
+                mTimeline->recordInstant(
+                    "device", key + " requested " + value + ", effective " + outcome.effective);
+            }
+            return true;
+        case KernelRules::Verdict::kRefused:
+            break;
+    }
+    VLOGE("host: %s refuses '%s' from %s: %s", key.c_str(), value.c_str(), source.c_str(),
+          outcome.reason.c_str());
+    if (mTimeline != nullptr) {
+        mTimeline->recordInstant("device", key + " refused " + value + ": " + outcome.reason);
+    }
+    return false;
+}
 
 int NodeResolver::set(const std::string& key, const std::string& source, const std::string& value) {
-    mRequests[key][source] = {value, ++mSeq};
+    std::string effective;
+    if (!take(key, source, value, &effective)) {
+        return -1;
+    }
+    mRequests[key][source] = {effective, ++mSeq};
     return resolve(key);
 }
 
@@ -29,11 +65,16 @@ int NodeResolver::replaceSource(const std::string& source, const Requests& reque
             touched.insert(entry.first);
         }
     }
+    int ret = 0;
     for (const auto& request : requests) {
-        mRequests[request.first][source] = {request.second, ++mSeq};
+        std::string effective;
+        if (!take(request.first, source, request.second, &effective)) {
+            ret = -1;
+            continue;
+        }
+        mRequests[request.first][source] = {effective, ++mSeq};
         touched.insert(request.first);
     }
-    int ret = 0;
     for (const auto& key : touched) {
         ret |= resolve(key);
     }

@@ -5,6 +5,10 @@
 // levels), "cmd:<id>" (an applied action), "probe" (the probe command while threads are boosted).
 // How requests combine follows the node's kind (NodeMap.h); with no request left the node goes
 // back to its baseline, the value it had when first seen.
+//
+// Every request is first taken the way the device's kernel takes a write (KernelRules): a
+// value the node refuses is dropped (the call reports -1, the source's earlier request stays),
+// one between available frequencies is rounded, and the rounding is noted on the timeline.
 // Not thread safe: the executor calls it under its own lock.
 #pragma once
 
@@ -16,6 +20,7 @@
 
 #include "host/DeviceTree.h"
 #include "host/NodeMap.h"
+#include "host/Timeline.h"
 
 namespace velmora {
 
@@ -23,7 +28,8 @@ class NodeResolver {
 public:
     using Requests = std::vector<std::pair<std::string, std::string>>;  // (node key, value)
 
-    NodeResolver(const NodeMap& nodes, DeviceTree& tree);
+    // `timeline` (optional) receives a "device" instant for every rounded or refused request.
+    NodeResolver(const NodeMap& nodes, DeviceTree& tree, Timeline* timeline = nullptr);
 
     // Sets `source`'s request for `key` and writes the node if its value changes. 0 or -1.
     int set(const std::string& key, const std::string& source, const std::string& value);
@@ -44,9 +50,13 @@ private:
     };
 
     int resolve(const std::string& key);
+    // The value node `key` takes for `value`; false when the node refuses it (logged).
+    bool take(const std::string& key, const std::string& source, const std::string& value,
+              std::string* effective);
 
     const NodeMap& mNodes;
     DeviceTree& mTree;
+    Timeline* mTimeline;
     std::map<std::string, std::map<std::string, Request>> mRequests;  // key -> source -> request
     uint64_t mSeq = 0;
 };

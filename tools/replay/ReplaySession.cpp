@@ -6,6 +6,7 @@
 #include "config/CommandIds.h"
 #include "host/HostEnvironment.h"
 #include "host/HostPlatform.h"
+#include "host/profile/DeviceProfile.h"
 #include "server/VelmoraServer.h"
 
 namespace velmora {
@@ -48,6 +49,14 @@ int ReplaySession::setUp() {
         env.clock().setRealTime(mOptions.speed);
     }
     std::string error;
+    if (!mOptions.devicePath.empty()) {
+        DeviceProfile profile;
+        if (profile.load(mOptions.devicePath, &error) != 0) {
+            fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+            return kBadInput;
+        }
+        env.nodeMap().useProfile(profile);
+    }
     if (!mOptions.nodeMapPath.empty() && env.nodeMap().load(mOptions.nodeMapPath, &error) != 0) {
         fprintf(mErr, "velmora-replay: %s\n", error.c_str());
         return kBadInput;
@@ -225,6 +234,15 @@ std::string ReplaySession::summaryText() const {
                  node.numeric ? formatNumber(node.min).c_str() : "-",
                  node.numeric ? formatNumber(node.max).c_str() : "-");
         out += line;
+    }
+    // Where the device took a request other than asked: rounded to an available frequency, or
+    // refused like a sysfs write.
+    const auto deviceNotes = HostEnvironment::get().timeline().instants("device");
+    if (!deviceNotes.empty()) {
+        out += "\nrequested vs effective:\n";
+        for (const auto& note : deviceNotes) {
+            out += "  " + note.name + "\n";
+        }
     }
     return out;
 }

@@ -22,6 +22,7 @@ struct ReplayOptions {
     bool interactive = false;             // read calls from `input` until end of file
     std::vector<std::string> configDirs;  // default: the trace's directory
     std::string deviceRoot;               // default: a fresh simulated device in /tmp
+    std::string devicePath;               // device profile; default: the example device
     std::string nodeMapPath;              // node map overrides, optional
     double speed = 1.0;                   // trace ms per real ms
     bool fast = false;                    // virtual time: no waiting at all

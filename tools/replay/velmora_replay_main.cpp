@@ -17,6 +17,8 @@ void usage(FILE* to) {
         "                       default: the trace's directory)\n"
         "  --root DIR           device root: a fresh simulated device is created there\n"
         "                       (default /tmp/velmora-sim-<pid>); \"/\" writes the real nodes\n"
+        "  --device FILE        device profile (default: the example device,\n"
+        "                       examples/device/example-device.xml)\n"
         "  --nodes FILE         node map overrides\n"
         "  --speed X            replay X times faster than real time\n"
         "  --fast               do not wait at all (virtual time)\n"
@@ -45,6 +47,8 @@ int main(int argc, char** argv) {
             options.configDirs.push_back(value("--config-dir"));
         } else if (arg == "--root") {
             options.deviceRoot = value("--root");
+        } else if (arg == "--device") {
+            options.devicePath = value("--device");
         } else if (arg == "--nodes") {
             options.nodeMapPath = value("--nodes");
         } else if (arg == "--speed") {
