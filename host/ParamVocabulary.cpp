@@ -103,6 +103,19 @@ std::string ParamVocabulary::textNodeForName(const std::string& name) {
     return std::string();
 }
 
+std::vector<std::string> ParamVocabulary::names(bool stringPairs) {
+    std::vector<std::string> out = {kDuration};
+    for (const auto& term : kTerms) {
+        out.push_back(term.name);
+    }
+    if (stringPairs) {
+        for (const auto& term : kTextTerms) {
+            out.push_back(term.name);
+        }
+    }
+    return out;
+}
+
 bool ParamVocabulary::usesStringPairs(int cmdId) {
     return (cmdId >= kGovSceneFirst && cmdId <= kSpecialSceneLast) ||
            cmdId == kCmdMemLatencyRatio || cmdId == kCmdMemLatency;

@@ -21,6 +21,7 @@
 #pragma once
 
 #include <string>
+#include <vector>
 
 #include "config/Action.h"
 #include "config/RawXmlData.h"
@@ -36,6 +37,9 @@ public:
     static int tagForName(const std::string& name);
     // Node key of a text parameter name (governors, memory-latency ratios), or "".
     static std::string textNodeForName(const std::string& name);
+    // Every parameter name understood (with the text-pair names when `stringPairs`), for
+    // did-you-mean suggestions; "duration" included.
+    static std::vector<std::string> names(bool stringPairs);
     // True when `cmdId` carries its parameters as string pairs.
     static bool usesStringPairs(int cmdId);
     // Strict decimal integer (optional sign, surrounding blanks allowed).

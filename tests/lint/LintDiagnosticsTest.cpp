@@ -22,10 +22,10 @@ struct Row {
     int status;
 };
 
-std::string manyPairs(const char* name, int count) {
+std::string manyPairs(const char* name, int count, const char* value = "1209600") {
     std::string params;
     for (int i = 0; i < count; ++i) {
-        params += std::string("<") + name + ">1209600</" + name + ">";
+        params += std::string("<") + name + ">" + value + "</" + name + ">";
     }
     return params;
 }
@@ -34,8 +34,8 @@ const Row kRows[] = {
     // --- The document and the command elements, as the loader reads them.
     {"XmlSyntaxError",
      "<policy>\n<cmd id=\"4099\">\n</policy>\n",
-     {"F:2: error: XML syntax error: XML_ERROR_MISMATCHED_ELEMENT (XMLElement name=cmd); the "
-      "server loads nothing from this file"},
+     {"F:2: error: not well-formed XML: element <cmd> is not closed (expected </cmd> before the "
+      "enclosing element ends); the server loads nothing from this file"},
      2},
     {"RootIsNotPolicy",
      "<?xml version=\"1.0\"?>\n<config>\n<cmd id=\"4099\"/>\n</config>\n",
@@ -94,13 +94,13 @@ const Row kRows[] = {
      withBase("<cmd id=\"4099\" name=\"a\"><a><duration>10</duration>\n"
               "<big_mn>1497600</big_mn></a></cmd>\n"),
      {"F:5: warning: unknown parameter <big_mn> in command 4099: the host conversion leaves it "
-      "out"},
+      "out; did you mean <big_min>?"},
      0},
     {"UnknownParameterOfGovernorScene",
      withBase("<cmd id=\"4230\" name=\"g\"><a><priority>40</priority>\n"
               "<cpu_governor>performance</cpu_governor></a></cmd>\n"),
      {"F:5: warning: unknown parameter <cpu_governor> in command 4230: the host conversion "
-      "leaves it out"},
+      "leaves it out; did you mean <gpu_governor>?"},
      0},
     {"ValueNotAnInteger",
      withBase("<cmd id=\"4099\" name=\"a\"><a><duration>10</duration>\n"
@@ -175,7 +175,7 @@ const Row kRows[] = {
       "take only group tags 50..58; every event fails (status 3)"},
      2},
     {"SchedLevelNinePairs",
-     withBase("<cmd id=\"4101\"><a>\n<duration>0</duration>" + manyPairs("group_vip", 9) +
+     withBase("<cmd id=\"4101\"><a>\n<duration>0</duration>" + manyPairs("group_vip", 9, "10") +
               "</a></cmd>\n"),
      {"F:5: error: duration-0 command 4101 has 9 pairs: scheduling-level events take 1..8 group "
       "pairs; every event fails (status 3)"},
@@ -239,6 +239,55 @@ const Row kRows[] = {
      {"F:4: error: governor scene 4352 never gets a configured priority (the server reads them up "
       "to 4351 only): every switch is refused (-1)"},
      2},
+
+    // --- Values the example device takes otherwise or refuses.
+    {"LevelOutsideTheDeviceRange",
+     withBase("<cmd id=\"4101\"><a><duration>0</duration>\n<group_top_app>300</group_top_app>"
+              "</a></cmd>\n"),
+     {"F:5: error: <group_top_app> '300' of command 4101: 300 is outside -20..40 of "
+      "sched.group.top_app, the device refuses the write"},
+     2},
+    {"FloorAboveTheTopFrequency",
+     withBase("<cmd id=\"4099\"><a><duration>100</duration>\n<little_min>18048000</little_min>"
+              "</a></cmd>\n"),
+     {"F:5: error: <little_min> '18048000' of command 4099: 18048000 is above the top frequency "
+      "1804800 kHz of cpu.little.min, the device refuses the write"},
+     2},
+    {"KhzFigureInAnHzNode",
+     withBase("<cmd id=\"4099\"><a><duration>100</duration>\n<gpu_max>600000</gpu_max>"
+              "</a></cmd>\n"),
+     {"F:5: error: <gpu_max> '600000' of command 4099: 600000 is below the lowest frequency "
+      "257000000 Hz of gpu.max, the device refuses the write",
+      "F:5: note: 600000 is about 1000 times below the node's range: a kHz figure? gpu.max takes "
+      "Hz"},
+     2},
+    {"FrequencyBetweenSteps",
+     withBase("<cmd id=\"4099\"><a><duration>100</duration>\n<big_min>1500000</big_min>"
+              "</a></cmd>\n"),
+     {"F:5: note: <big_min> '1500000' of command 4099 lies between available frequencies of "
+      "cpu.big.min: the kernel uses 1612800"},
+     0},
+    {"GovernorTheDeviceLacks",
+     withBase("<cmd id=\"4230\"><a><priority>40</priority>\n"
+              "<big_governor>performace</big_governor></a></cmd>\n"),
+     {"F:5: error: <big_governor> 'performace' of command 4230: the device has no governor "
+      "'performace' of cpu.big.governor, the device refuses the write",
+      "F:5: note: did you mean 'performance'? the device offers schedutil, performance, "
+      "powersave"},
+     2},
+    {"RatioNotANumber",
+     withBase("<cmd id=\"20481\"><a><duration>0</duration>\n"
+              "<mem_latency_ratio_b>6O</mem_latency_ratio_b></a></cmd>\n"),
+     {"F:5: error: <mem_latency_ratio_b> '6O' of command 20481: '6O' is not a number of "
+      "memlat.ratio_b, the device refuses the write"},
+     2},
+    {"FloorAboveCapOfAnotherLimit",
+     withBase(
+         "<cmd id=\"12288\"><a><duration>0</duration>\n<big_max>1804800</big_max></a></cmd>\n"
+         "<cmd id=\"4118\"><a><priority>100</priority>\n<big_min>2419200</big_min></a></cmd>\n"),
+     {"F:7: warning: floor <big_min> 2419200 of command 4118 is above the cap <big_max> 1804800 "
+      "of command 12288 (line 5), and both can be on at once: the cap wins"},
+     0},
 
     // --- Commands that do nothing.
     {"DisabledCommandIsANote",

@@ -34,7 +34,9 @@ public:
     // What an event of the class does, for the --explain listing.
     static std::string effect(DispatchClass dispatchClass, int cmdId, int duration);
 
-    static bool isScene(int cmdId) { return cmdId >= kSpecialSceneFirst && cmdId <= kSpecialSceneLast; }
+    static bool isScene(int cmdId) {
+        return cmdId >= kSpecialSceneFirst && cmdId <= kSpecialSceneLast;
+    }
     static bool isOnOff(int cmdId) { return cmdId >= kOnOffFirst && cmdId <= kOnOffLast; }
     // Built-in priority of a special scene, 0 when it has none.
     static int builtInPriority(int cmdId);

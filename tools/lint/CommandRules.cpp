@@ -14,8 +14,6 @@ constexpr int kHmpGroupTag = VELMORA_TAG_GROUP_HMP;
 constexpr int kFirstEasGroupTag = VELMORA_TAG_GROUP_BOOST;
 constexpr int kLastGroupTag = VELMORA_TAG_GROUP_BACKGROUND;
 constexpr int kMaxGroupPairs = kEasGroupCount;
-constexpr int kLowestLevel = kSchedLevelLowest;
-constexpr int kHighestLevel = kSchedLevelHighest;
 constexpr int kPriorityTag = kTagScenePriority;
 constexpr const char* kPriorityKey = kScenePriorityKey;
 // The probe worker caps the start-up probe action's duration; a reloaded one keeps its own.
@@ -146,17 +144,11 @@ void CommandRules::checkStartup(const CheckedCommand* command) {
     std::map<int, int> seen;
     for (int i = 0; i < pairs; ++i) {
         const int tag = action.mTagValues[2 * i];
-        const int level = action.mTagValues[2 * i + 1];
         if (pairs == kEasGroupCount && tag == kHmpGroupTag) {
             mDiagnostics.error(pairLine(*record, i),
                                "start-up command 5376 with eight pairs takes only EAS groups: " +
                                    pairName(*record, i) + " makes the server's init fail");
             return;
-        }
-        if (level < kLowestLevel || level > kHighestLevel) {
-            mDiagnostics.warning(pairLine(*record, i), "default level " + str(level) + " of " +
-                                                           pairName(*record, i) +
-                                                           " is outside the level scale -20..40");
         }
         if (seen.count(tag) != 0) {
             mDiagnostics.warning(pairLine(*record, i), "start-up command 5376 sets " +

@@ -7,6 +7,7 @@
 #include "tools/lint/LoadChecker.h"
 #include "tools/lint/LoaderRun.h"
 #include "tools/lint/LocatedConfig.h"
+#include "tools/lint/ValueChecker.h"
 
 namespace velmora {
 
@@ -24,6 +25,9 @@ int ConfigLinter::run(std::ostream& out) {
     if (loadChecker.check(&commands)) {
         CommandRules rules(mDiagnostics, located.rootLine());
         rules.check(commands);
+        const NodeMap nodes(mOptions.device != nullptr ? *mOptions.device
+                                                       : DeviceProfile::builtIn());
+        ValueChecker(nodes, mDiagnostics).check(commands);
         if (mOptions.explain) {
             Explainer(out).explain(commands);
         }

@@ -1,7 +1,8 @@
 // Checks one command configuration file the way the server would read it: loads it with the
 // library's loader and the platform layer's conversion (LoaderRun), reads it a second time for
 // line numbers (LocatedConfig), then reports load-level findings (LoadChecker, with
-// ConversionChecker per action) and what the server does with each command (CommandRules), and
+// ConversionChecker per action), what the server does with each command (CommandRules) and
+// what the device makes of the values (ValueChecker, against a device profile), and
 // on request lists how every command is dispatched (Explainer).
 //
 // One object per file; not thread safe (a load swaps liblog's process-wide logger).
@@ -10,6 +11,7 @@
 #include <ostream>
 #include <string>
 
+#include "host/profile/DeviceProfile.h"
 #include "tools/lint/Diagnostics.h"
 
 namespace velmora {
@@ -17,6 +19,8 @@ namespace velmora {
 struct LintOptions {
     bool explain = false;  // list every command's dispatch before the findings
     bool werror = false;   // warnings make the exit status 1
+    // Device whose nodes the values are written to; null for the example device.
+    const DeviceProfile* device = nullptr;
 };
 
 class ConfigLinter {

@@ -1,6 +1,7 @@
 #include "tools/lint/ConversionChecker.h"
 
 #include "host/ParamVocabulary.h"
+#include "host/Spelling.h"
 
 namespace velmora {
 
@@ -43,8 +44,12 @@ CheckedRecord ConversionChecker::check(int cmdId, const LocatedAction& action,
         const bool known = ParamVocabulary::tagForName(param.name) >= 0 ||
                            (stringPairs && !ParamVocabulary::textNodeForName(param.name).empty());
         if (!known) {
-            mDiagnostics.warning(param.line, "unknown parameter <" + param.name + "> in command " +
-                                                 id + ": the host conversion leaves it out");
+            const std::string guess =
+                Spelling::closest(param.name, ParamVocabulary::names(stringPairs));
+            mDiagnostics.warning(param.line,
+                                 "unknown parameter <" + param.name + "> in command " + id +
+                                     ": the host conversion leaves it out" +
+                                     (guess.empty() ? "" : "; did you mean <" + guess + ">?"));
             continue;
         }
         if (!stringPairs && !ParamVocabulary::parseInt(param.text, &value)) {

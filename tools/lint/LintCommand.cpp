@@ -33,11 +33,13 @@ std::string unreadableReason(const std::string& path) {
 }  // namespace
 
 void LintCommand::printUsage(std::ostream& to) {
-    to << "usage: " << kProgram << " [--explain] [--werror] CONFIG.xml\n"
+    to << "usage: " << kProgram << " [--explain] [--werror] [--device PROFILE.xml] CONFIG.xml\n"
        << "Checks a command configuration the way the server loads and dispatches it and\n"
        << "reports findings as FILE:LINE: error|warning|note: MESSAGE.\n"
        << "  --explain   list how every command is dispatched (class, duration, pairs)\n"
        << "  --werror    exit 1 when there are warnings (and no errors)\n"
+       << "  --device F  check values against device profile F (default: the example device,\n"
+       << "              examples/device/example-device.xml)\n"
        << "Exit status: 0 clean (notes allowed), 1 warnings with --werror, 2 errors or a\n"
        << "usage error.\n";
 }
@@ -45,9 +47,17 @@ void LintCommand::printUsage(std::ostream& to) {
 int LintCommand::run(const std::vector<std::string>& args, std::ostream& out, std::ostream& err) {
     LintOptions options;
     std::string path;
+    std::string devicePath;
     bool pathGiven = false;
-    for (const std::string& arg : args) {
-        if (arg == "--explain") {
+    for (size_t i = 0; i < args.size(); ++i) {
+        const std::string& arg = args[i];
+        if (arg == "--device") {
+            if (i + 1 >= args.size()) {
+                err << kProgram << ": --device needs a device profile\n";
+                return kUsageError;
+            }
+            devicePath = args[++i];
+        } else if (arg == "--explain") {
             options.explain = true;
         } else if (arg == "--werror") {
             options.werror = true;
@@ -76,6 +86,15 @@ int LintCommand::run(const std::vector<std::string>& args, std::ostream& out, st
     if (!reason.empty()) {
         err << kProgram << ": " << path << ": " << reason << '\n';
         return kUsageError;
+    }
+    DeviceProfile device;
+    if (!devicePath.empty()) {
+        std::string error;
+        if (device.load(devicePath, &error) != 0) {
+            err << kProgram << ": " << error << '\n';
+            return kUsageError;
+        }
+        options.device = &device;
     }
     ConfigLinter linter(path, options);
     return linter.run(out);

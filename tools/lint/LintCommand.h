@@ -2,7 +2,7 @@
 // ConfigLinter run. main() only forwards its arguments here, so tests drive the whole program
 // (output and exit status) without starting a process.
 //
-//   velmora-lint [--explain] [--werror] CONFIG.xml
+//   velmora-lint [--explain] [--werror] [--device PROFILE.xml] CONFIG.xml
 //
 // Findings and the listing go to `out`; usage errors to `err`. Stateless.
 #pragma once

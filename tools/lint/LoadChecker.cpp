@@ -70,7 +70,7 @@ bool LoadChecker::check(std::vector<CheckedCommand>* commands) {
 bool LoadChecker::checkDocument() {
     const int status = mLoader.status();
     if (!mLocated.xmlError().empty()) {
-        mDiagnostics.error(mLocated.errorLine(), "XML syntax error: " + mLocated.xmlError() +
+        mDiagnostics.error(mLocated.errorLine(), "not well-formed XML: " + mLocated.xmlError() +
                                                      "; the server loads nothing from this file");
         if (status != 2) {
             disagree(mLocated.errorLine(), "the loader read the file although it is not XML");

@@ -1,6 +1,7 @@
 #include "tools/lint/LocatedConfig.h"
 
 #include "config/DecimalText.h"
+#include "host/profile/XmlErrorText.h"
 
 #include <ctype.h>
 #include <tinyxml2.h>
@@ -51,13 +52,7 @@ bool LocatedConfig::load(const std::string& path) {
     tinyxml2::XMLDocument doc(true);
     doc.LoadFile(path.c_str());
     if (doc.Error()) {
-        // ErrorStr() repeats name, id and line before the detail; keep the name and the detail.
-        mXmlError = doc.ErrorName();
-        const std::string full = doc.ErrorStr() != nullptr ? doc.ErrorStr() : "";
-        const size_t detail = full.find(": ");
-        if (detail != std::string::npos) {
-            mXmlError += " (" + full.substr(detail + 2) + ")";
-        }
+        mXmlError = XmlErrorText::describe(doc);
         mErrorLine = doc.ErrorLineNum();
         return false;
     }
