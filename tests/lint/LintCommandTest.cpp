@@ -36,7 +36,8 @@ TEST(LintCommandTest, ExplainListsEveryCommandsDispatch) {
         "    -> sent at start-up: records the default group levels",
         "4116 probe (line 3): probe boost, duration 50, 1 pair",
         "    big_min(4)=1497600",
-        "    -> probed threads get the pairs for 50 ms",
+        "    -> probed threads get the pairs for 50 ms; a message that does not begin "
+        "\"pid=<n>\" is answered with 0, as if it had worked, and boosts nothing",
         "4099 cold (line 4): timed action, duration 1500, 1 pair",
         "    big_min(4)=2419200",
         "    + 1 further action(s) passed along with it, never dispatched on their own",
@@ -73,6 +74,25 @@ TEST(LintCommandTest, ExplainMarksASceneThatIsAlwaysRefused) {
               "    -> payload 0/-1 switches the scene on/off; the highest priority on is applied "
               "(this one never: no valid priority)");
     EXPECT_EQ(result.status, 2);
+}
+
+TEST(LintCommandTest, ExplainPrintsTheServerRuleBehindAFinding) {
+    ScratchDir dir;
+    const auto result =
+        runLint({"--explain"},
+                dir.write("c.xml",
+                          "<policy>\n<cmd id=\"5376\"><a><duration>0</duration><group_hmp>0"
+                          "</group_hmp></a></cmd>\n<cmd id=\"4116\"><a>\n<duration>200</duration>"
+                          "</a></cmd>\n</policy>\n"));
+    const auto lines = result.outLines();
+    ASSERT_GE(lines.size(), 2u) << result.out;
+    EXPECT_EQ(lines[lines.size() - 2],
+              "F:4: warning: probe duration 200 ms is capped to 100 at start-up but used as "
+              "configured after a reload");
+    EXPECT_EQ(lines.back(),
+              "    the probe worker clamps the duration of the probe action it is built with to "
+              "100 ms; a reload hands it the newly parsed action unchanged, so the same "
+              "configuration boosts probed threads longer after a reload than after start-up.");
 }
 
 // Exit status by the worst finding, and --werror turning warnings (not notes) into status 1.
@@ -143,6 +163,9 @@ const UsageRow kUsageRows[] = {
     {"UnknownOption", {"--fix", "c.xml"}, "velmora-lint: unknown option --fix"},
     {"MissingFile", {"DIR/none.xml"}, "velmora-lint: DIR/none.xml: No such file or directory"},
     {"Directory", {"DIR"}, "velmora-lint: DIR: is a directory"},
+    {"BrokenDeviceProfile",
+     {"--device", "DIR/a.xml", "DIR/b.xml"},
+     "velmora-lint: DIR/a.xml:1: the top-level element must be <device>"},
     {"TwoFiles",
      {"DIR/a.xml", "DIR/b.xml"},
      "velmora-lint: more than one configuration given (DIR/a.xml, DIR/b.xml)"},

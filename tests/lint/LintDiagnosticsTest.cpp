@@ -167,6 +167,14 @@ const Row kRows[] = {
       "after a reload"},
      0},
 
+    {"GovernorSceneUnderTheGameScene",
+     withBase("<cmd id=\"4119\"><a><priority>200</priority></a></cmd>\n"
+              "<cmd id=\"4300\"><a><priority>50</priority><gpu_governor>performance"
+              "</gpu_governor></a></cmd>\n"),
+     {"F:5: note: governor scene 4300 (priority 50) is applied under scene 4119 (priority 200): "
+      "switched off while 4119 stays current, it is not withdrawn and its settings stay"},
+     0},
+
     // --- Duration-0 (scheduling-level) commands.
     {"SchedLevelForeignTag",
      withBase("<cmd id=\"4101\"><a><duration>0</duration>\n<big_min>1497600</big_min>"

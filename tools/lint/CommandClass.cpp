@@ -70,7 +70,9 @@ std::string CommandClass::effect(DispatchClass dispatchClass, int cmdId, int dur
                        ? "events take their ratios from the event text, this entry is unused"
                        : "events with this id never read the configuration";
         case DispatchClass::kProbe:
-            return "probed threads get the pairs for " + std::to_string(duration) + " ms";
+            return "probed threads get the pairs for " + std::to_string(duration) +
+                   " ms; a message that does not begin \"pid=<n>\" is answered with 0, as if "
+                   "it had worked, and boosts nothing";
         case DispatchClass::kNoAction:
         case DispatchClass::kDisabled:
             return "events do nothing and return 0";

@@ -96,6 +96,44 @@ void CommandRules::check(const std::vector<CheckedCommand>& commands) {
     }
     checkStartup(startup);
     checkProbe(probe);
+    checkGovernorScenesUnderHost(commands);
+}
+
+void CommandRules::checkGovernorScenesUnderHost(const std::vector<CheckedCommand>& commands) {
+    const CheckedCommand* host = nullptr;
+    for (const auto& command : commands) {
+        if (command.id == kGovHostScene && command.dispatched() != nullptr &&
+            command.dispatched()->action->mDuration >= 0) {
+            host = &command;
+        }
+    }
+    if (host == nullptr) {
+        return;  // scene 4119 can never be current
+    }
+    const int hostPriority = effectivePriority(*host);
+    for (const auto& command : commands) {
+        const CheckedRecord* record = command.dispatched();
+        if (command.id < kGovSceneFirst || command.id > kScenePriorityReadLast ||
+            record == nullptr || record->action->mDuration < 0) {
+            continue;
+        }
+        const int priority = effectivePriority(command);
+        if (!isValidPriority(priority) || priority > hostPriority) {
+            continue;  // refused, or it takes over from 4119 and is withdrawn like any scene
+        }
+        // A note, not a warning: it is how governor scenes under the game scene work, and only
+        // a surprise when the host switches one off before the game scene.
+        mDiagnostics.note(command.line(),
+                          "governor scene " + str(command.id) + " (priority " + str(priority) +
+                              ") is applied under scene 4119 (priority " + str(hostPriority) +
+                              "): switched off while 4119 stays current, it is not withdrawn and "
+                              "its settings stay");
+        mDiagnostics.explain(
+            "while scene 4119 is current, a governor scene that does not outrank it is applied "
+            "on its own; when it is switched off while 4119 stays current, the server re-applies "
+            "the remaining governor scene with the highest priority but never withdraws the one "
+            "switched off, so its settings stay until another request overwrites them.");
+    }
 }
 
 void CommandRules::checkStartup(const CheckedCommand* command) {
@@ -174,6 +212,10 @@ void CommandRules::checkProbe(const CheckedCommand* command) {
         mDiagnostics.error(mPolicyLine,
                            "no probe command 4116: the server's init stops early (status 4), "
                            "probe events fail and configured scene priorities are never read");
+        mDiagnostics.explain(
+            "init parses the probe command right after the start-up event and returns 4 when it "
+            "is missing, before it reads the configured scene priorities: until a reload only "
+            "the built-in priorities of scenes 4118..4121 apply, every other scene is refused.");
         return;
     }
     const CheckedRecord* record = command->dispatched();
@@ -193,6 +235,10 @@ void CommandRules::checkProbe(const CheckedCommand* command) {
                              "probe duration " + str(duration) +
                                  " ms is capped to 100 at start-up but used as configured after a "
                                  "reload");
+        mDiagnostics.explain(
+            "the probe worker clamps the duration of the probe action it is built with to 100 "
+            "ms; a reload hands it the newly parsed action unchanged, so the same configuration "
+            "boosts probed threads longer after a reload than after start-up.");
     }
 }
 
@@ -324,6 +370,9 @@ void CommandRules::checkScenePriority(const CheckedCommand& command, const Check
                            kind + id +
                                " never gets a configured priority (the server reads them up to "
                                "4351 only): every switch is refused (-1)");
+        mDiagnostics.explain(
+            "the server reads configured scene priorities for ids 4118..4351; scene 4352 keeps "
+            "priority 0, which is not a valid priority, so switching it on or off returns -1.");
         return;
     }
     bool given = false;

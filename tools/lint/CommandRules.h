@@ -45,6 +45,7 @@ private:
     void checkSchedLevels(const CheckedCommand& command, const CheckedRecord& record);
     void checkOnOff(const CheckedCommand& command, const CheckedRecord& record);
     void checkScenePriority(const CheckedCommand& command, const CheckedRecord& record);
+    void checkGovernorScenesUnderHost(const std::vector<CheckedCommand>& commands);
 
     Diagnostics& mDiagnostics;
     int mPolicyLine;

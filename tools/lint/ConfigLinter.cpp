@@ -32,7 +32,7 @@ int ConfigLinter::run(std::ostream& out) {
             Explainer(out).explain(commands);
         }
     }
-    mDiagnostics.print(out);
+    mDiagnostics.print(out, mOptions.explain);
     return mDiagnostics.exitStatus(mOptions.werror);
 }
 

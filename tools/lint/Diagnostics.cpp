@@ -46,7 +46,7 @@ void Diagnostics::printOne(std::ostream& out, const Diagnostic& finding) const {
     out << ' ' << severityName(finding.severity) << ": " << finding.message << '\n';
 }
 
-void Diagnostics::print(std::ostream& out) const {
+void Diagnostics::print(std::ostream& out, bool explanations) const {
     std::vector<const Diagnostic*> ordered;
     ordered.reserve(mFindings.size());
     for (const auto& finding : mFindings) {
@@ -58,6 +58,9 @@ void Diagnostics::print(std::ostream& out) const {
         printOne(out, *finding);
         for (const auto& note : finding->notes) {
             printOne(out, note);
+        }
+        if (explanations && !finding->explanation.empty()) {
+            out << "    " << finding->explanation << '\n';
         }
     }
 }

@@ -21,6 +21,7 @@ struct Diagnostic {
     Severity severity = Severity::kNote;
     std::string message;
     std::vector<Diagnostic> notes;  // printed right after this finding
+    std::string explanation;        // the server's rule behind it, printed with --explain
 };
 
 class Diagnostics {
@@ -37,13 +38,17 @@ public:
     void note(int line, const std::string& message) { add(line, Severity::kNote, message); }
     // Attaches a note to the finding made last. REQUIRES: at least one finding was made.
     void attachNote(int line, const std::string& message);
+    // Gives the finding made last the text --explain prints under it: why the server does
+    // what the finding says. REQUIRES: at least one finding was made.
+    void explain(const std::string& text) { mFindings.back().explanation = text; }
 
     int errorCount() const { return count(Severity::kError); }
     int warningCount() const { return count(Severity::kWarning); }
     const std::vector<Diagnostic>& all() const { return mFindings; }
 
-    // Prints every finding, in line order, one per line.
-    void print(std::ostream& out) const;
+    // Prints every finding, in line order, one per line; with `explanations`, each finding's
+    // explanation follows it, indented.
+    void print(std::ostream& out, bool explanations = false) const;
     // kErrors when there is an error, kWarningsAsErrors when there are warnings and `werror`,
     // else kClean. Notes never change the status.
     int exitStatus(bool werror) const;
