@@ -7,6 +7,9 @@ namespace velmora {
 
 inline constexpr int kCmdWinSwitch = 4098;
 inline constexpr int kCmdColdStart = 4099;
+// Launch policies the launch events ask the policy server for.
+inline constexpr const char* kWinSwitchPolicyName = "winswitch";
+inline constexpr const char* kColdPolicyName = "cold";
 // Duration-0 events with their own rules for the ZOLA levels: the first 4114 is remembered,
 // 4113 only moves groups still at that remembered level.
 inline constexpr int kCmdZolaFollower = 4113;

@@ -54,7 +54,7 @@ void VelmoraServer::updatePolicy(int cmdId, Action* action, const int* payload) 
     if (cmdId != kCmdColdStart && cmdId != kCmdWinSwitch) {
         return;
     }
-    const char* name = cmdId == kCmdColdStart ? "cold" : "winswitch";
+    const char* name = cmdId == kCmdColdStart ? kColdPolicyName : kWinSwitchPolicyName;
     const int duration = OnDemandBoostServer::getInstance()->getPolicy(name);
     if (duration != -1) {
         action->mDuration = duration;

@@ -3,6 +3,8 @@
 // through, the report lines of the device event log, and the timeline file.
 #include <gtest/gtest.h>
 
+#include <sys/stat.h>
+
 #include <algorithm>
 #include <cstdio>
 #include <cstring>
@@ -174,6 +176,55 @@ TEST(ReplaySessionTest, BadTraceOrMissingConfigurationStopsBeforeAnyCall) {
     ReplaySession noConfig(options, stdout, stderr);
     EXPECT_EQ(ReplaySession::kBadInput, noConfig.run());
     EXPECT_EQ(0, noConfig.calls());
+}
+
+std::string readAll(FILE* file) {
+    rewind(file);
+    std::string text;
+    char buffer[512];
+    while (fgets(buffer, sizeof(buffer), file) != nullptr) {
+        text += buffer;
+    }
+    return text;
+}
+
+TEST(ReplaySessionTest, WarnsAboutCallsTheServerCannotMeanAndPointsAtTheChecker) {
+    const std::string dir = hosttest::makeScratchDir("warn");
+    hosttest::writeFile(dir + "/t.trace", "policy colde 1200\nevent 4321 0\nevent 20225 0\n");
+    ReplayOptions options;
+    options.tracePath = dir + "/t.trace";
+    options.configDirs = {std::string(VELMORA_SOURCE_DIR) + "/examples"};
+    options.fast = true;
+    options.quiet = true;
+    options.deviceRoot = dir + "/device";
+    options.timelinePath = dir + "/timeline.json";
+    options.eventLogPath = dir + "/events.log";
+    FILE* err = tmpfile();
+    ReplaySession session(options, stdout, err);
+    EXPECT_EQ(ReplaySession::kOk, session.run());
+    const std::string where = "velmora-replay: " + dir + "/t.trace:";
+    EXPECT_EQ(where +
+                  "1: warning: policy 'colde' is never asked for: the server asks for "
+                  "\"cold\" (4099) and \"winswitch\" (4098); did you mean 'cold'?\n" +
+                  where +
+                  "2: warning: command 4321 is not in the configuration: the server "
+                  "answers 2\n",
+              readAll(err));
+    fclose(err);
+
+    // A configuration the server cannot start with (no start-up command 5376).
+    ASSERT_EQ(0, mkdir((dir + "/xml").c_str(), 0755));
+    hosttest::writeFile(dir + "/xml/velmora_config_cust.xml",
+                        "<policy><cmd id=\"4099\"><a><duration>5</duration></a></cmd></policy>\n");
+    options.configDirs = {dir};
+    err = tmpfile();
+    ReplaySession broken(options, stdout, err);
+    EXPECT_EQ(ReplaySession::kSetupFailed, broken.run());
+    EXPECT_NE(std::string::npos,
+              readAll(err).find("server init failed with 2; check the configuration with "
+                                "velmora-lint " +
+                                dir + "/xml/velmora_config_cust.xml"));
+    fclose(err);
 }
 
 }  // namespace

@@ -70,7 +70,8 @@ INSTANTIATE_TEST_SUITE_P(
     Lines, TraceParserErrorTest,
     testing::Values(
         // Typo in the call name.
-        BadLine{"evnt 4098 0", "minute.trace:2: unknown call 'evnt'"},
+        BadLine{"evnt 4098 0", "minute.trace:2: unknown call 'evnt'; did you mean 'event'?"},
+        BadLine{"frobnicate", "minute.trace:2: unknown call 'frobnicate'"},
         // Malformed numbers in every numeric position.
         BadLine{"event 40x9 0", "minute.trace:2: malformed number '40x9' for command id"},
         BadLine{"event 4099 zero", "minute.trace:2: malformed number 'zero' for payload"},
@@ -88,6 +89,21 @@ INSTANTIATE_TEST_SUITE_P(
     [](const testing::TestParamInfo<BadLine>& info) {
         return "case" + std::to_string(info.index);
     });
+
+TEST(TraceParserTest, EveryBadLineIsReportedAndAByteOrderMarkIsSkipped) {
+    std::vector<TraceCall> calls;
+    std::string error;
+    EXPECT_EQ(-1, TraceParser::parseText("\xEF\xBB\xBF"
+                                         "event 4099 0\nsetconfig 1\nreload\nsleeep 5\n",
+                                         "t.trace", &calls, &error));
+    EXPECT_EQ(
+        "t.trace:2: 'setconfig' takes 2..64 argument(s), got 1\n"
+        "t.trace:4: unknown call 'sleeep'; did you mean 'sleep'?",
+        error);
+    ASSERT_EQ(2u, calls.size());
+    EXPECT_EQ(4099, calls[0].id);
+    EXPECT_EQ(TraceCall::Kind::Reload, calls[1].kind);
+}
 
 TEST(TraceParserTest, MissingFileIsNamed) {
     std::vector<TraceCall> calls;

@@ -94,7 +94,7 @@ std::string CommandClass::effect(DispatchClass dispatchClass, int cmdId, int dur
         "the platform applies the pairs and reverts them after " + std::to_string(duration) + " ms";
     if (cmdId == kCmdWinSwitch || cmdId == kCmdColdStart) {
         text += "; the launch policy \"";
-        text += cmdId == kCmdColdStart ? "cold" : "winswitch";
+        text += cmdId == kCmdColdStart ? kColdPolicyName : kWinSwitchPolicyName;
         text += "\" may replace the duration";
     }
     return text;

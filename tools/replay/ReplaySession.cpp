@@ -1,12 +1,19 @@
 #include "tools/replay/ReplaySession.h"
 
+#include <pthread.h>
+
 #include <chrono>
+#include <set>
+#include <sstream>
 #include <thread>
 
 #include "config/CommandIds.h"
+#include "config/VelmoraParser.h"
 #include "host/HostEnvironment.h"
 #include "host/HostPlatform.h"
+#include "host/Spelling.h"
 #include "host/profile/DeviceProfile.h"
+#include "platform/VelmoraPlat.h"
 #include "server/VelmoraServer.h"
 
 namespace velmora {
@@ -14,6 +21,8 @@ namespace velmora {
 namespace {
 
 constexpr int kReloadCmdId = kCmdReload;
+constexpr const char* kColdPolicy = kColdPolicyName;
+constexpr const char* kWinSwitchPolicy = kWinSwitchPolicyName;
 // How long the end of a replay waits for the library's probe worker to withdraw its boosts
 // (boosts live at most 256 ms).
 constexpr auto kProbeDrainLimit = std::chrono::milliseconds(1000);
@@ -93,7 +102,10 @@ int ReplaySession::setUp() {
     fprintf(mOut, "init -> %d (device %s)\n", status, root.c_str());
     // 4 means the probe command is missing; everything else is running.
     if (status != 0 && status != 4) {
-        fprintf(mErr, "velmora-replay: server init failed with %d\n", status);
+        fprintf(mErr,
+                "velmora-replay: server init failed with %d; check the configuration with "
+                "velmora-lint %s\n",
+                status, env.properties().findConfigFile("xml/velmora_config_cust.xml").c_str());
         mServer.reset();
         return kSetupFailed;
     }
@@ -167,12 +179,16 @@ int ReplaySession::replayFile() {
     std::vector<TraceCall> calls;
     std::string error;
     if (TraceParser::parseFile(mOptions.tracePath, &calls, &error) != 0) {
-        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+        std::istringstream lines(error);
+        for (std::string line; std::getline(lines, line);) {
+            fprintf(mErr, "velmora-replay: %s\n", line.c_str());
+        }
         return kBadInput;
     }
     const int setup = setUp();
     if (setup != kOk)
         return setup;
+    warnAboutCalls(calls);
     for (const auto& call : calls) {
         perform(call);
     }
@@ -201,6 +217,41 @@ int ReplaySession::replayInteractive() {
             perform(call);
     }
     return result;
+}
+
+void ReplaySession::warnAboutCalls(const std::vector<TraceCall>& calls) {
+    std::set<int> configured;
+    VelmoraParser* parser = mServer->mPlatPtr != nullptr ? mServer->mPlatPtr->mParserPtr : nullptr;
+    if (parser == nullptr) {
+        return;
+    }
+    pthread_rwlock_rdlock(&parser->mRwLock);
+    if (parser->mActionMap != nullptr) {
+        for (const auto& entry : *parser->mActionMap) {
+            configured.insert(entry.first);
+        }
+    }
+    pthread_rwlock_unlock(&parser->mRwLock);
+    const std::vector<std::string> policies = {kColdPolicy, kWinSwitchPolicy};
+    for (const auto& call : calls) {
+        const std::string where = call.file + ":" + std::to_string(call.line);
+        // Ids from 20224 up are taken apart before any parse, except memory latency 20481.
+        const bool parsed = call.id < kCmdClientRestart || call.id == kCmdMemLatency;
+        if (call.kind == TraceCall::Kind::Event && parsed && configured.count(call.id) == 0) {
+            fprintf(mErr,
+                    "velmora-replay: %s: warning: command %d is not in the configuration: the "
+                    "server answers 2\n",
+                    where.c_str(), call.id);
+        } else if (call.kind == TraceCall::Kind::Policy && call.text != kColdPolicy &&
+                   call.text != kWinSwitchPolicy) {
+            const std::string guess = Spelling::closest(call.text, policies);
+            fprintf(mErr,
+                    "velmora-replay: %s: warning: policy '%s' is never asked for: the server "
+                    "asks for \"cold\" (4099) and \"winswitch\" (4098)%s\n",
+                    where.c_str(), call.text.c_str(),
+                    guess.empty() ? "" : ("; did you mean '" + guess + "'?").c_str());
+        }
+    }
 }
 
 void ReplaySession::waitForProbeBoosts() {

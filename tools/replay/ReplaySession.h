@@ -57,6 +57,9 @@ public:
 private:
     int replayFile();
     int replayInteractive();
+    // Warns (on `err`) about calls that are valid but surely not meant: events of commands the
+    // configuration lacks, launch-policy names the server never asks for.
+    void warnAboutCalls(const std::vector<TraceCall>& calls);
     void waitForProbeBoosts();
     void echo(const TraceCall& call, const std::string& result);
 

@@ -6,9 +6,16 @@
 #include <fstream>
 #include <sstream>
 
+#include "host/Spelling.h"
+
 namespace velmora {
 
 namespace {
+
+const std::vector<std::string> kCalls = {"sleep",     "event", "reload", "setconfig",
+                                         "getconfig", "dump",  "policy"};
+// Editors on some systems start a UTF-8 file with a byte-order mark.
+constexpr const char* kUtf8Bom = "\xEF\xBB\xBF";
 
 // Splits a line into words; a word may contain a double-quoted part (msg="a b").
 bool tokenize(const std::string& line, std::vector<std::string>* words, std::string* problem) {
@@ -201,7 +208,9 @@ int TraceParser::parseLine(const std::string& line, const std::string& file, int
             return -1;
         call.text = args[0];
     } else {
-        p.fail("unknown call '" + verb + "'");
+        const std::string guess = Spelling::closest(verb, kCalls);
+        p.fail("unknown call '" + verb + "'" +
+               (guess.empty() ? std::string() : "; did you mean '" + guess + "'?"));
         return -1;
     }
     calls->push_back(call);
@@ -210,15 +219,23 @@ int TraceParser::parseLine(const std::string& line, const std::string& file, int
 
 int TraceParser::parseText(const std::string& text, const std::string& file,
                            std::vector<TraceCall>* calls, std::string* error) {
-    std::istringstream in(text);
+    const std::string bom = kUtf8Bom;
+    std::istringstream in(text.compare(0, bom.size(), bom) == 0 ? text.substr(bom.size()) : text);
     std::string line;
     int lineNo = 0;
+    int result = 0;
+    std::string errors;
     while (std::getline(in, line)) {
-        if (parseLine(line, file, ++lineNo, calls, error) != 0) {
-            return -1;
+        std::string lineError;
+        if (parseLine(line, file, ++lineNo, calls, &lineError) != 0) {
+            errors += (errors.empty() ? "" : "\n") + lineError;
+            result = -1;
         }
     }
-    return 0;
+    if (error != nullptr && result != 0) {
+        *error = errors;
+    }
+    return result;
 }
 
 int TraceParser::parseFile(const std::string& path, std::vector<TraceCall>* calls,
