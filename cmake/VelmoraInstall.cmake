@@ -1,6 +1,6 @@
-# Install rules: the two libraries, the public headers under include/velmora, a pkg-config file
-# per library and a CMake package (find_package(velmora) gives velmora::velmora and
-# velmora::velmora_host).
+# Install rules: the two libraries, the tools, the public headers under include/velmora, a
+# pkg-config file per library, a CMake package (find_package(velmora) gives velmora::velmora and
+# velmora::velmora_host), and under share/velmora everything in examples/ and docs/.
 #
 # Included by the top-level CMakeLists right after the velmora target exists; the host layer's
 # target is defined later (host/), so the rules run deferred, at the end of the top directory.
@@ -9,19 +9,36 @@ include(CMakePackageConfigHelpers)
 
 set(VELMORA_INSTALL_CMAKEDIR "${CMAKE_INSTALL_LIBDIR}/cmake/velmora")
 set(VELMORA_PUBLIC_HEADER_DIRS server config platform freq sched probe report compat host)
+set(VELMORA_INSTALL_DATADIR "${CMAKE_INSTALL_DATADIR}/velmora")
+
+# Installed files find each other relative to their own place ($ORIGIN), so that an install
+# prefix or an unpacked package can move; the Android host libraries stay outside the loader's
+# default search path wherever we are. Programs are made after this point (host/, tools/) and
+# take the run path from here; the libraries get theirs in velmora_install_rules.
+file(RELATIVE_PATH VELMORA_BIN_TO_LIB "/prefix/${CMAKE_INSTALL_BINDIR}"
+     "/prefix/${CMAKE_INSTALL_LIBDIR}")
+set(CMAKE_INSTALL_RPATH "$ORIGIN/${VELMORA_BIN_TO_LIB};${ANDROID_LIBRARY_DIR}")
+# Where velmora-replay looks for the installed example, relative to its own directory.
+file(RELATIVE_PATH VELMORA_BIN_TO_EXAMPLES "/prefix/${CMAKE_INSTALL_BINDIR}"
+     "/prefix/${VELMORA_INSTALL_DATADIR}/examples")
 
 function(velmora_install_rules)
     set(targets velmora)
     if(TARGET velmora_host)
         list(APPEND targets velmora_host)
     endif()
+    set_target_properties(${targets} PROPERTIES INSTALL_RPATH "$ORIGIN;${ANDROID_LIBRARY_DIR}")
     install(TARGETS ${targets} EXPORT velmoraTargets
             LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
             ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR}
             RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
-    if(TARGET velmora-replay)
-        install(TARGETS velmora-replay RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
-    endif()
+    foreach(tool velmora-replay velmora-lint)
+        if(TARGET ${tool})
+            install(TARGETS ${tool} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+        endif()
+    endforeach()
+    install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" "${PROJECT_SOURCE_DIR}/docs"
+            DESTINATION "${VELMORA_INSTALL_DATADIR}")
     foreach(dir IN LISTS VELMORA_PUBLIC_HEADER_DIRS)
         if(EXISTS "${PROJECT_SOURCE_DIR}/${dir}")
             install(DIRECTORY "${PROJECT_SOURCE_DIR}/${dir}/"
@@ -58,3 +75,5 @@ function(velmora_install_rules)
 endfunction()
 
 cmake_language(DEFER DIRECTORY "${PROJECT_SOURCE_DIR}" CALL velmora_install_rules)
+
+include(${CMAKE_CURRENT_LIST_DIR}/VelmoraPackage.cmake)

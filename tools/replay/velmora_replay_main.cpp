@@ -5,6 +5,7 @@
 #include <cstring>
 #include <string>
 
+#include "tools/replay/InstalledExample.h"
 #include "tools/replay/ReplaySession.h"
 
 namespace {
@@ -14,7 +15,8 @@ void usage(FILE* to) {
         "usage: velmora-replay [options] TRACE\n"
         "       velmora-replay [options] --interactive\n"
         "  --config-dir DIR     where xml/velmora_config_cust.xml is looked up (repeatable;\n"
-        "                       default: the trace's directory)\n"
+        "                       default: the trace's directory, then the installed example\n"
+        "                       in <prefix>/share/velmora/examples)\n"
         "  --root DIR           device root: a fresh simulated device is created there\n"
         "                       (default /tmp/velmora-sim-<pid>); \"/\" writes the real nodes\n"
         "  --device FILE        device profile (default: the example device,\n"
@@ -95,6 +97,9 @@ int main(int argc, char** argv) {
     if (options.tracePath.empty() && !options.interactive) {
         usage(stderr);
         return velmora::ReplaySession::kBadInput;
+    }
+    if (options.configDirs.empty()) {
+        options.configDirs = velmora::defaultConfigDirs(options.tracePath, options.interactive);
     }
     velmora::ReplaySession session(options, stdout, stderr);
     return session.run();
