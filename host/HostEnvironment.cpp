@@ -6,6 +6,7 @@
 
 #include <cstring>
 
+#include "host/HostProbeClock.h"
 #include "platform/VelmoraLog.h"
 
 namespace velmora {
@@ -34,6 +35,8 @@ HostEnvironment& HostEnvironment::get() {
 HostEnvironment::HostEnvironment()
     : mTimeline(mClock), mDevice(mNodeMap, mTimeline), mEventLog(mClock, mTimeline) {
     mDevice.setRoot(defaultSimulatedRoot());
+    // The probe workers of servers built from now on read time and wait through mClock.
+    ProbeClock::setFactory(&HostProbeClock::create);
 }
 
 std::string HostEnvironment::defaultSimulatedRoot() {

@@ -6,7 +6,7 @@ namespace velmora {
 
 TimedActionScheduler::TimedActionScheduler(HostClock& clock, ExpiryCallback onExpire)
     : mClock(clock), mOnExpire(std::move(onExpire)) {
-    mListenerId = mClock.addListener([this] { expireDue(); });
+    mListenerId = mClock.addListener([this] { expireDue(); }, [this] { return nextDeadlineMs(); });
     mThread = std::thread([this] { run(); });
 }
 
@@ -16,22 +16,47 @@ TimedActionScheduler::~TimedActionScheduler() {
         std::lock_guard<std::mutex> lock(mLock);
         mStop = true;
         mDeadlines.clear();
+        mByTime.clear();
     }
     mCond.notify_all();
     mThread.join();
 }
 
+int64_t TimedActionScheduler::earliestLocked() const {
+    return mByTime.empty() ? HostClock::kNoDeadline : mByTime.begin()->first;
+}
+
+bool TimedActionScheduler::eraseLocked(int cmdId) {
+    auto it = mDeadlines.find(cmdId);
+    if (it == mDeadlines.end()) {
+        return false;
+    }
+    mByTime.erase({it->second, cmdId});
+    mDeadlines.erase(it);
+    return true;
+}
+
 void TimedActionScheduler::arm(int cmdId, int64_t durationMs) {
+    const int64_t deadline = mClock.nowMs() + durationMs;
+    bool earlier;
     {
         std::lock_guard<std::mutex> lock(mLock);
-        mDeadlines[cmdId] = mClock.nowMs() + durationMs;
+        const int64_t before = earliestLocked();
+        eraseLocked(cmdId);
+        mDeadlines.emplace(cmdId, deadline);
+        mByTime.emplace(deadline, cmdId);
+        earlier = earliestLocked() < before;
     }
-    mCond.notify_all();
+    // A later earliest deadline (this command re-armed) only makes the worker wake once for
+    // nothing; it goes back to sleep until the new one.
+    if (earlier) {
+        mCond.notify_one();
+    }
 }
 
 bool TimedActionScheduler::cancel(int cmdId) {
     std::lock_guard<std::mutex> lock(mLock);
-    return mDeadlines.erase(cmdId) != 0;
+    return eraseLocked(cmdId);
 }
 
 bool TimedActionScheduler::armed(int cmdId) const {
@@ -44,18 +69,24 @@ size_t TimedActionScheduler::pending() const {
     return mDeadlines.size();
 }
 
+int64_t TimedActionScheduler::nextDeadlineMs() const {
+    std::lock_guard<std::mutex> lock(mLock);
+    return earliestLocked();
+}
+
 void TimedActionScheduler::expireDue() {
+    // Whoever comes second (the worker or a thread advancing the clock) waits until the first
+    // has run its callbacks: what fell due is done when this returns.
+    std::lock_guard<std::mutex> expiring(mExpiryLock);
     std::vector<int> due;
+    const int64_t now = mClock.nowMs();
     {
         std::lock_guard<std::mutex> lock(mLock);
-        const int64_t now = mClock.nowMs();
-        for (auto it = mDeadlines.begin(); it != mDeadlines.end();) {
-            if (it->second <= now) {
-                due.push_back(it->first);
-                it = mDeadlines.erase(it);
-            } else {
-                ++it;
-            }
+        while (!mByTime.empty() && mByTime.begin()->first <= now) {
+            const int cmdId = mByTime.begin()->second;
+            due.push_back(cmdId);
+            mByTime.erase(mByTime.begin());
+            mDeadlines.erase(cmdId);
         }
     }
     for (int cmdId : due) {
@@ -66,16 +97,12 @@ void TimedActionScheduler::expireDue() {
 void TimedActionScheduler::run() {
     std::unique_lock<std::mutex> lock(mLock);
     while (!mStop) {
-        if (mDeadlines.empty() || mClock.isVirtual()) {
-            // Virtual time moves only through the clock, whose listener expires deadlines.
+        if (mByTime.empty() || mClock.isVirtual()) {
+            // Virtual time moves only through the clock, which expires deadlines itself.
             mCond.wait(lock);
             continue;
         }
-        int64_t earliest = mDeadlines.begin()->second;
-        for (const auto& entry : mDeadlines) {
-            earliest = std::min(earliest, entry.second);
-        }
-        const int64_t remaining = earliest - mClock.nowMs();
+        const int64_t remaining = earliestLocked() - mClock.nowMs();
         if (remaining > 0) {
             mCond.wait_for(lock, mClock.toReal(remaining));
             continue;

@@ -1,9 +1,5 @@
 #include "probe/ProbeThread.h"
 
-#include <errno.h>
-#include <time.h>
-#include <utils/Timers.h>
-
 #include "config/Action.h"
 #include "platform/PerfExecutor.h"
 #include "platform/VelmoraLog.h"
@@ -24,18 +20,6 @@ constexpr int32_t kProbeThreadPriority = -2;
 
 constexpr int kStateBoost = 0;
 constexpr int kStateUnboost = -1;
-
-// Sleeps the whole time even when a signal interrupts the sleep: waking early would boost a
-// larger thread id that falls due before the smallest one, ahead of the pass meant for both.
-void sleepWholeMs(int64_t ms) {
-    struct timespec left = {static_cast<time_t>(ms / 1000), static_cast<long>(ms % 1000) * 1000000};
-    while (nanosleep(&left, &left) != 0 && errno == EINTR) {
-    }
-}
-
-int64_t monotonicNow() {
-    return systemTime(SYSTEM_TIME_MONOTONIC);
-}
 
 bool isLive(const ProbeHandler::ProbeThread::ProbeQueue& queue, uint32_t tid) {
     const ssize_t index = queue.indexOfKey(tid);
@@ -60,7 +44,11 @@ ProbeHandler::ProbeThread::ProbeItem::ProbeItem(uint32_t itemTid, int64_t itemTi
     : tid(itemTid), timestamp(itemTimestamp) {}
 
 ProbeHandler::ProbeThread::ProbeThread(ProbeHandler& handler, VelmoraPlat* plat, Action* action)
-    : android::Thread(true), mHandler(handler), mPlat(plat), mAction(action) {
+    : android::Thread(true),
+      mHandler(handler),
+      mPlat(plat),
+      mAction(action),
+      mClock(velmora::ProbeClock::create()) {
     if (mAction != nullptr && mAction->mDuration > kMaxProbeDurationMs) {
         mAction->mDuration = kMaxProbeDurationMs;
     }
@@ -72,6 +60,7 @@ ProbeHandler::ProbeThread::~ProbeThread() {
     // contract and gives the sanitizers an ordering with the host's last queue change.
     Mutex::Autolock lock(mLock);
     deleteAction();
+    delete mClock;
 }
 
 void ProbeHandler::ProbeThread::onFirstRef() {
@@ -95,9 +84,9 @@ void ProbeHandler::ProbeThread::addItemToQueue(int pid, uint32_t tid) {
 
 void ProbeHandler::ProbeThread::addItemToWaitQueue(uint32_t tid) {
     if (!isLive(mWaitQueue, tid) && !isLive(mBoostedQueue, tid)) {
-        mWaitQueue.replaceValueFor(tid, new ProbeItem(tid, monotonicNow()));
+        mWaitQueue.replaceValueFor(tid, new ProbeItem(tid, mClock->now()));
     }
-    mCond.signal();
+    mClock->signal(mCond);
 }
 
 void ProbeHandler::ProbeThread::addItemToBoostedQueue(uint32_t tid) {
@@ -110,7 +99,7 @@ void ProbeHandler::ProbeThread::addItemToBoostedQueue(uint32_t tid) {
 }
 
 void ProbeHandler::ProbeThread::addItemToBoostedQueueLocked(uint32_t tid) {
-    mBoostedQueue.replaceValueFor(tid, new ProbeItem(tid, monotonicNow()));
+    mBoostedQueue.replaceValueFor(tid, new ProbeItem(tid, mClock->now()));
 }
 
 void ProbeHandler::ProbeThread::moveItemFromWaitQueueToBoosted(uint32_t tid) {
@@ -123,7 +112,7 @@ void ProbeHandler::ProbeThread::moveItemToUnboostQueue(uint32_t tid) {
     if (markWithdrawn(mBoostedQueue, tid)) {
         handleUnboostItem(tid);
     }
-    mCond.signal();
+    mClock->signal(mCond);
 }
 
 void ProbeHandler::ProbeThread::handleBoostItem(uint32_t tid) {
@@ -170,14 +159,15 @@ void ProbeHandler::ProbeThread::shutdown() {
     {
         Mutex::Autolock lock(mLock);
         mPlat = nullptr;
-        mCond.signal();
+        mClock->signal(mCond);
     }
+    mClock->wakeForExit();
     // A pass in progress may still read mHandler; waiting keeps the owner alive until it ends.
     requestExitAndWait();
 }
 
 bool ProbeHandler::ProbeThread::threadLoop() {
-    const int64_t now = monotonicNow();
+    const int64_t now = mClock->now();
     const int64_t delayMs = mHandler.mBoostDelayMs;
     int64_t sleepMs = 0;
 
@@ -240,7 +230,7 @@ bool ProbeHandler::ProbeThread::threadLoop() {
 
     if (mWaitQueue.isEmpty() && mBoostedQueue.isEmpty()) {
         if (!exitPending()) {
-            mCond.wait(mLock);
+            mClock->wait(mCond, mLock);
         }
         mLock.unlock();
         return true;
@@ -248,6 +238,6 @@ bool ProbeHandler::ProbeThread::threadLoop() {
     mLock.unlock();
     // With only boosted items left sleepMs is 0 and the loop polls until they expire or are
     // withdrawn: CPU time traded for a lifetime that ends on time without a timed wait.
-    sleepWholeMs(sleepMs);
+    mClock->sleepMs(sleepMs);
     return true;
 }

@@ -16,7 +16,8 @@
 // mCond is signalled whenever an item is queued or withdrawn; the worker waits on it only while
 // both queues are empty. It runs on CLOCK_MONOTONIC like every timestamp here: boosts are timed
 // in milliseconds, and a wall-clock step (network time arriving after boot) must neither fire
-// nor stall them.
+// nor stall them. Timestamps, the sleep between passes and the wait on mCond all go through
+// mClock (ProbeClock.h), the system's own calls unless a platform layer installed a clock.
 //
 // Lifetime: the first strong reference starts the thread. libutils' loop promotes a strong
 // reference to this object around every threadLoop call, so the object outlives any pass in
@@ -32,6 +33,7 @@
 #include <utils/StrongPointer.h>
 #include <utils/Thread.h>
 
+#include "probe/ProbeClock.h"
 #include "probe/ProbeHandler.h"
 
 class Action;
@@ -85,6 +87,8 @@ public:
     ProbeQueue mBoostedQueue GUARDED_BY(mLock);
     VelmoraPlat* mPlat GUARDED_BY(mLock);  // not owned; null once shut down
     Action* mAction GUARDED_BY(mLock);
+    // Where every timestamp, sleep and wait of this worker goes; owned, set for its lifetime.
+    velmora::ProbeClock* const mClock;
 
 private:
     bool threadLoop() override;

@@ -2,10 +2,8 @@
 
 #include <pthread.h>
 
-#include <chrono>
 #include <set>
 #include <sstream>
-#include <thread>
 
 #include "config/CommandIds.h"
 #include "config/VelmoraParser.h"
@@ -23,9 +21,12 @@ namespace {
 constexpr int kReloadCmdId = kCmdReload;
 constexpr const char* kColdPolicy = kColdPolicyName;
 constexpr const char* kWinSwitchPolicy = kWinSwitchPolicyName;
-// How long the end of a replay waits for the library's probe worker to withdraw its boosts
-// (boosts live at most 256 ms).
-constexpr auto kProbeDrainLimit = std::chrono::milliseconds(1000);
+// How long, in trace time, the end of a replay waits for the library's probe worker to
+// withdraw its boosts (boosts live at most 256 ms), in steps of kProbeDrainStepMs, and then for
+// the worker to drop the withdrawn entries.
+constexpr int64_t kProbeDrainLimitMs = 1000;
+constexpr int64_t kProbeDrainStepMs = 1;
+constexpr int64_t kProbeSettleMs = 20;
 
 std::string directoryOf(const std::string& path) {
     const size_t slash = path.find_last_of('/');
@@ -124,9 +125,9 @@ void ReplaySession::echo(const TraceCall& call, const std::string& result) {
 
 int ReplaySession::perform(const TraceCall& call) {
     HostEnvironment& env = HostEnvironment::get();
-    if (call.atMs >= 0) {
-        env.clock().advanceTo(call.atMs);
-    }
+    // In virtual time this also lets the probe worker finish what the last call gave it, so a
+    // line without a time runs after it, as it would a moment later on a device.
+    env.clock().advanceTo(call.atMs >= 0 ? call.atMs : env.clock().nowMs());
     int status = 0;
     std::string result;
     switch (call.kind) {
@@ -189,9 +190,17 @@ int ReplaySession::replayFile() {
     if (setup != kOk)
         return setup;
     warnAboutCalls(calls);
-    for (const auto& call : calls) {
-        perform(call);
+    // In real time the clock is held at the next timed call, so that calls are never late.
+    HostClock& clock = HostEnvironment::get().clock();
+    for (size_t i = 0; i < calls.size(); ++i) {
+        size_t next = i;
+        while (next < calls.size() && calls[next].atMs < 0) {
+            ++next;
+        }
+        clock.holdAt(next < calls.size() ? calls[next].atMs : HostClock::kNoDeadline);
+        perform(calls[i]);
     }
+    clock.holdAt(HostClock::kNoDeadline);
     return kOk;
 }
 
@@ -258,12 +267,12 @@ void ReplaySession::waitForProbeBoosts() {
     auto* plat = mServer != nullptr ? dynamic_cast<HostPlatform*>(mServer->mPlatPtr) : nullptr;
     if (plat == nullptr)
         return;
-    const auto limit = std::chrono::steady_clock::now() + kProbeDrainLimit;
-    while (plat->executor()->boostedThreads() != 0 && std::chrono::steady_clock::now() < limit) {
-        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+    HostClock& clock = HostEnvironment::get().clock();
+    const int64_t limit = clock.nowMs() + kProbeDrainLimitMs;
+    while (plat->executor()->boostedThreads() != 0 && clock.nowMs() < limit) {
+        clock.sleepMs(kProbeDrainStepMs);
     }
-    // Let the worker drop the withdrawn entries before the platform goes away.
-    std::this_thread::sleep_for(std::chrono::milliseconds(20));
+    clock.sleepMs(kProbeSettleMs);
 }
 
 void ReplaySession::tearDown() {
