@@ -1,7 +1,9 @@
 #include "host/DeviceTree.h"
 
 #include <errno.h>
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <cstring>
 #include <fstream>
@@ -33,14 +35,41 @@ std::string trimmed(const std::string& text) {
 DeviceTree::DeviceTree(const NodeMap& nodes, Timeline& timeline)
     : mNodes(nodes), mTimeline(timeline) {}
 
+DeviceTree::~DeviceTree() {
+    std::lock_guard<std::mutex> lock(mLock);
+    forgetLocked();
+}
+
+void DeviceTree::forgetLocked() {
+    for (auto& entry : mNodeState) {
+        if (entry.second.fd >= 0) {
+            close(entry.second.fd);
+        }
+    }
+    mNodeState.clear();
+}
+
+DeviceTree::Node* DeviceTree::nodeLocked(const std::string& key) {
+    auto it = mNodeState.find(key);
+    if (it != mNodeState.end()) {
+        return &it->second;
+    }
+    const NodeSpec* spec = mNodes.find(key);
+    if (spec == nullptr) {
+        return nullptr;
+    }
+    Node& node = mNodeState[key];
+    node.path = (mRoot == "/" ? std::string() : mRoot) + "/" + spec->path;
+    return &node;
+}
+
 void DeviceTree::setRoot(const std::string& root) {
     std::lock_guard<std::mutex> lock(mLock);
     mRoot = root;
     while (mRoot.size() > 1 && mRoot.back() == '/') {
         mRoot.pop_back();
     }
-    mCurrent.clear();
-    mBaseline.clear();
+    forgetLocked();
 }
 
 std::string DeviceTree::root() const {
@@ -79,71 +108,110 @@ int DeviceTree::seed() {
         file << spec.seed << "\n";
     }
     std::lock_guard<std::mutex> lock(mLock);
-    mCurrent.clear();
-    mBaseline.clear();
+    forgetLocked();
     return 0;
 }
 
-bool DeviceTree::loadLocked(const std::string& key, const NodeSpec& spec) {
-    if (mCurrent.count(key) != 0) {
+bool DeviceTree::loadLocked(const std::string& key, Node& node) {
+    if (node.known) {
         return true;
     }
-    const std::string path = (mRoot == "/" ? std::string() : mRoot) + "/" + spec.path;
-    std::ifstream file(path);
+    std::ifstream file(node.path);
     std::string text;
     if (!file || !std::getline(file, text)) {
         return false;
     }
     text = trimmed(text);
-    mCurrent[key] = text;
-    mBaseline[key] = text;
-    mTimeline.recordInitial(key, path, text);
+    node.known = true;
+    node.current = text;
+    node.baseline = text;
+    mTimeline.recordInitial(key, node.path, text);
     return true;
 }
 
 bool DeviceTree::read(const std::string& key, std::string* text) {
-    const NodeSpec* spec = mNodes.find(key);
     std::lock_guard<std::mutex> lock(mLock);
-    if (spec == nullptr || !loadLocked(key, *spec)) {
+    Node* node = nodeLocked(key);
+    if (node == nullptr || !loadLocked(key, *node)) {
         return false;
     }
-    *text = mCurrent[key];
+    *text = node->current;
     return true;
 }
 
 bool DeviceTree::baseline(const std::string& key, std::string* text) {
-    const NodeSpec* spec = mNodes.find(key);
     std::lock_guard<std::mutex> lock(mLock);
-    if (spec == nullptr || !loadLocked(key, *spec)) {
+    Node* node = nodeLocked(key);
+    if (node == nullptr || !loadLocked(key, *node)) {
         return false;
     }
-    *text = mBaseline[key];
+    *text = node->baseline;
     return true;
 }
 
+bool DeviceTree::openNode(Node& node) {
+    node.fd = open(node.path.c_str(), O_WRONLY | O_CLOEXEC);
+    if (node.fd < 0) {
+        return false;
+    }
+    struct stat st;
+    node.regular = fstat(node.fd, &st) == 0 && S_ISREG(st.st_mode);
+    return true;
+}
+
+bool DeviceTree::writeNode(Node& node, const std::string& text) {
+    char small[128];
+    std::string large;
+    const size_t size = text.size() + 1;
+    char* line = small;
+    if (size > sizeof(small)) {
+        large = text + "\n";
+        line = &large[0];
+    } else {
+        memcpy(small, text.data(), text.size());
+        small[text.size()] = '\n';
+    }
+    // One retry on a fresh descriptor: the node may have been replaced (a simulated tree
+    // seeded again, a driver that came back).
+    for (int attempt = 0; attempt < 2; ++attempt) {
+        if (node.fd < 0 && !openNode(node)) {
+            continue;
+        }
+        if (pwrite(node.fd, line, size, 0) == static_cast<ssize_t>(size) &&
+            (!node.regular || !node.known || node.current.size() + 1 <= size ||
+             ftruncate(node.fd, static_cast<off_t>(size)) == 0)) {
+            return true;
+        }
+        const int saved = errno;
+        close(node.fd);
+        node.fd = -1;
+        errno = saved;
+    }
+    return false;
+}
+
 int DeviceTree::write(const std::string& key, const std::string& text) {
-    const NodeSpec* spec = mNodes.find(key);
-    if (spec == nullptr) {
+    std::lock_guard<std::mutex> lock(mLock);
+    Node* node = nodeLocked(key);
+    if (node == nullptr) {
         VLOGE("host: write to unknown node %s", key.c_str());
         return -1;
     }
-    std::lock_guard<std::mutex> lock(mLock);
-    const std::string path = (mRoot == "/" ? std::string() : mRoot) + "/" + spec->path;
     // A node that cannot be read still takes writes (write-only nodes such as tasks files).
-    if (loadLocked(key, *spec) && mCurrent[key] == text) {
+    const bool known = loadLocked(key, *node);
+    if (known && node->current == text) {
         return 0;
     }
-    std::ofstream file(path, std::ios::trunc);
-    if (file) {
-        file << text << "\n";
-        file.flush();
-    }
-    if (!file) {
-        VLOGE("host: write %s to %s failed: %s", text.c_str(), path.c_str(), strerror(errno));
+    if (!writeNode(*node, text)) {
+        VLOGE("host: write %s to %s failed: %s", text.c_str(), node->path.c_str(), strerror(errno));
         return -1;
     }
-    mCurrent[key] = text;
-    mTimeline.recordWrite(key, path, text);
+    node->current = text;
+    if (!known) {
+        node->known = true;  // write-only node: from now on only changes are written
+        node->baseline.clear();
+    }
+    mTimeline.recordWrite(key, node->path, text);
     return 0;
 }
 

@@ -5,6 +5,10 @@
 // changes; every changing write goes to the timeline. The first value seen of a node (the seed,
 // or what the real node held) is its initial value in the timeline and the baseline the
 // executor falls back to. Thread safe: the executor, queries and the dump may run concurrently.
+//
+// A node is written with one pwrite at offset 0 to a descriptor opened at its first write and
+// kept open (reopened once when a write fails); a simulated node that gets a shorter value is
+// also cut to length. Changing the root closes every descriptor.
 #pragma once
 
 #include <map>
@@ -19,6 +23,9 @@ namespace velmora {
 class DeviceTree {
 public:
     DeviceTree(const NodeMap& nodes, Timeline& timeline);
+    ~DeviceTree();
+    DeviceTree(const DeviceTree&) = delete;
+    DeviceTree& operator=(const DeviceTree&) = delete;
 
     // Uses `root` from now on and forgets every remembered value. "/" is the real device.
     void setRoot(const std::string& root);
@@ -41,15 +48,30 @@ public:
     bool baseline(const std::string& key, std::string* text);
 
 private:
-    // REQUIRES: mLock held.
-    bool loadLocked(const std::string& key, const NodeSpec& spec);
+    struct Node {
+        std::string path;
+        bool known = false;    // current and baseline are valid
+        std::string current;   // last known value
+        std::string baseline;  // first known value
+        int fd = -1;           // kept open for writing
+        bool regular = false;  // a plain file (simulated): shorter values cut it to length
+    };
+
+    // The record of `key`, created on first use; null for an unknown key. REQUIRES: mLock.
+    Node* nodeLocked(const std::string& key);
+    // Reads the node's value unless known. REQUIRES: mLock held.
+    bool loadLocked(const std::string& key, Node& node);
+    // Writes `text` and a newline; false (errno set) when the node cannot be written.
+    static bool writeNode(Node& node, const std::string& text);
+    static bool openNode(Node& node);
+    // Closes every descriptor and forgets every value. REQUIRES: mLock held.
+    void forgetLocked();
 
     const NodeMap& mNodes;
     Timeline& mTimeline;
     mutable std::mutex mLock;  // guards everything below
     std::string mRoot;
-    std::map<std::string, std::string> mCurrent;   // last known value per key
-    std::map<std::string, std::string> mBaseline;  // first known value per key
+    std::map<std::string, Node> mNodeState;  // by key
 };
 
 }  // namespace velmora

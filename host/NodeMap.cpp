@@ -53,6 +53,10 @@ NodeMap::NodeMap(const DeviceProfile& profile) {
 
 void NodeMap::useProfile(const DeviceProfile& profile) {
     mNodes = profile.nodes();
+    mIndex.clear();
+    for (size_t i = 0; i < mNodes.size(); ++i) {
+        mIndex[mNodes[i].key] = i;
+    }
 }
 
 void NodeMap::initTagKeys() {
@@ -62,12 +66,8 @@ void NodeMap::initTagKeys() {
 }
 
 const NodeSpec* NodeMap::find(const std::string& key) const {
-    for (const auto& node : mNodes) {
-        if (node.key == key) {
-            return &node;
-        }
-    }
-    return nullptr;
+    auto it = mIndex.find(key);
+    return it == mIndex.end() ? nullptr : &mNodes[it->second];
 }
 
 std::string NodeMap::keyForTag(int tag) const {

@@ -14,6 +14,7 @@
 
 #include <map>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 #include "host/profile/ValueRule.h"
@@ -62,6 +63,7 @@ private:
     void initTagKeys();
 
     std::vector<NodeSpec> mNodes;
+    std::unordered_map<std::string, size_t> mIndex;  // key -> position in mNodes
     std::map<int, std::string> mTagKeys;
 };
 

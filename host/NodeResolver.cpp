@@ -1,7 +1,7 @@
 #include "host/NodeResolver.h"
 
+#include <algorithm>
 #include <cstdlib>
-#include <set>
 
 #include "host/profile/KernelRules.h"
 #include "platform/VelmoraLog.h"
@@ -47,6 +47,10 @@ int NodeResolver::set(const std::string& key, const std::string& source, const s
         return -1;
     }
     mRequests[key][source] = {effective, ++mSeq};
+    std::vector<std::string>& keys = mSourceKeys[source];
+    if (std::find(keys.begin(), keys.end(), key) == keys.end()) {
+        keys.push_back(key);
+    }
     return resolve(key);
 }
 
@@ -55,15 +59,17 @@ int NodeResolver::clear(const std::string& key, const std::string& source) {
     if (it == mRequests.end() || it->second.erase(source) == 0) {
         return 0;
     }
+    std::vector<std::string>& keys = mSourceKeys[source];
+    keys.erase(std::remove(keys.begin(), keys.end(), key), keys.end());
     return resolve(key);
 }
 
 int NodeResolver::replaceSource(const std::string& source, const Requests& requests) {
-    std::set<std::string> touched;
-    for (auto& entry : mRequests) {
-        if (entry.second.erase(source) != 0) {
-            touched.insert(entry.first);
-        }
+    std::vector<std::string>& keys = mSourceKeys[source];
+    std::vector<std::string> touched;
+    touched.swap(keys);
+    for (const auto& key : touched) {
+        mRequests[key].erase(source);
     }
     int ret = 0;
     for (const auto& request : requests) {
@@ -73,8 +79,13 @@ int NodeResolver::replaceSource(const std::string& source, const Requests& reque
             continue;
         }
         mRequests[request.first][source] = {effective, ++mSeq};
-        touched.insert(request.first);
+        if (std::find(keys.begin(), keys.end(), request.first) == keys.end()) {
+            keys.push_back(request.first);
+        }
     }
+    touched.insert(touched.end(), keys.begin(), keys.end());
+    std::sort(touched.begin(), touched.end());
+    touched.erase(std::unique(touched.begin(), touched.end()), touched.end());
     for (const auto& key : touched) {
         ret |= resolve(key);
     }

@@ -58,6 +58,7 @@ private:
     DeviceTree& mTree;
     Timeline* mTimeline;
     std::map<std::string, std::map<std::string, Request>> mRequests;  // key -> source -> request
+    std::map<std::string, std::vector<std::string>> mSourceKeys;      // source -> its keys
     uint64_t mSeq = 0;
 };
 

@@ -38,6 +38,8 @@ bool TimedActionScheduler::eraseLocked(int cmdId) {
 
 void TimedActionScheduler::arm(int cmdId, int64_t durationMs) {
     const int64_t deadline = mClock.nowMs() + durationMs;
+    // In virtual time the worker has nothing to do: the clock expires deadlines itself.
+    const bool wake = !mClock.isVirtual();
     bool earlier;
     {
         std::lock_guard<std::mutex> lock(mLock);
@@ -49,7 +51,7 @@ void TimedActionScheduler::arm(int cmdId, int64_t durationMs) {
     }
     // A later earliest deadline (this command re-armed) only makes the worker wake once for
     // nothing; it goes back to sleep until the new one.
-    if (earlier) {
+    if (earlier && wake) {
         mCond.notify_one();
     }
 }

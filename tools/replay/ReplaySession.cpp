@@ -13,6 +13,7 @@
 #include "host/profile/DeviceProfile.h"
 #include "platform/VelmoraPlat.h"
 #include "server/VelmoraServer.h"
+#include "tools/replay/ProgressLine.h"
 
 namespace velmora {
 
@@ -192,6 +193,7 @@ int ReplaySession::replayFile() {
     warnAboutCalls(calls);
     // In real time the clock is held at the next timed call, so that calls are never late.
     HostClock& clock = HostEnvironment::get().clock();
+    ProgressLine progress(mErr);
     for (size_t i = 0; i < calls.size(); ++i) {
         size_t next = i;
         while (next < calls.size() && calls[next].atMs < 0) {
@@ -199,7 +201,9 @@ int ReplaySession::replayFile() {
         }
         clock.holdAt(next < calls.size() ? calls[next].atMs : HostClock::kNoDeadline);
         perform(calls[i]);
+        progress.update(clock.nowMs(), mCalls);
     }
+    progress.clear();
     clock.holdAt(HostClock::kNoDeadline);
     return kOk;
 }
