@@ -37,8 +37,10 @@ void HostProbeClock::wait(android::Condition& cond, android::Mutex& lock) {
         mClock.workerResumed(mWorkerId);
         return;
     }
-    mClock.workerWait(
-        mWorkerId, [&lock] { lock.unlock(); }, [&lock] { lock.lock(); });
+    // The worker's mutex is held on entry and on return; in between the clock lets it go.
+    auto release = [&lock]() NO_THREAD_SAFETY_ANALYSIS { lock.unlock(); };
+    auto reacquire = [&lock]() NO_THREAD_SAFETY_ANALYSIS { lock.lock(); };
+    mClock.workerWait(mWorkerId, release, reacquire);
 }
 
 void HostProbeClock::signal(android::Condition& cond) {
