@@ -1,0 +1,67 @@
+#include "tools/logcat/LogcatImportCommand.h"
+
+#include <fstream>
+#include <sstream>
+
+#include "tools/logcat/LogcatImporter.h"
+
+namespace velmora {
+
+namespace {
+
+constexpr const char* kUsage =
+    "usage: velmora-import-logcat LOG -o TRACE\n"
+    "  LOG       text of adb logcat (threadtime or time; year, epoch, monotonic, uid)\n"
+    "  -o TRACE  the event trace to write, for velmora-replay\n";
+
+}  // namespace
+
+int LogcatImportCommand::run(const std::vector<std::string>& args, std::ostream& out,
+                             std::ostream& err) {
+    std::string logPath;
+    std::string tracePath;
+    for (size_t i = 0; i < args.size(); ++i) {
+        if (args[i] == "-h" || args[i] == "--help") {
+            out << kUsage;
+            return kOk;
+        }
+        if (args[i] == "-o" && i + 1 < args.size()) {
+            tracePath = args[++i];
+        } else if (!args[i].empty() && args[i][0] != '-' && logPath.empty()) {
+            logPath = args[i];
+        } else {
+            err << "velmora-import-logcat: unexpected argument '" << args[i] << "'\n" << kUsage;
+            return kBadInput;
+        }
+    }
+    if (logPath.empty() || tracePath.empty()) {
+        err << kUsage;
+        return kBadInput;
+    }
+    std::ifstream in(logPath, std::ios::binary);
+    if (!in) {
+        err << "velmora-import-logcat: " << logPath << ": cannot be read\n";
+        return kBadInput;
+    }
+    std::stringstream text;
+    text << in.rdbuf();
+
+    LogcatImporter importer;
+    std::string error;
+    if (importer.importText(text.str(), logPath, &error) != 0) {
+        err << "velmora-import-logcat: " << error << "\n";
+        return kBadInput;
+    }
+    std::ofstream trace(tracePath, std::ios::trunc);
+    trace << importer.trace();
+    trace.close();
+    if (!trace) {
+        err << "velmora-import-logcat: " << tracePath << ": cannot be written\n";
+        return kBadInput;
+    }
+    out << logPath << " (logcat -v " << importer.formatName() << "): " << importer.counts().text()
+        << "\nwrote " << tracePath << "\n";
+    return kOk;
+}
+
+}  // namespace velmora
