@@ -80,8 +80,8 @@ std::string LogcatImporter::noCallsError() const {
     if (mCounts.serverLines == 0)
         return "no \"velmora server\" lines among " + plural(mCounts.lines, "line", "lines") +
                " of logcat -v " + mFormat.name();
-    return "the " + plural(mCounts.serverLines, "velmora server line", "velmora server lines") +
-           " hold no host calls";
+    return "no host calls among " +
+           plural(mCounts.serverLines, "velmora server line", "velmora server lines");
 }
 
 void LogcatImporter::readLine(const std::string& line, int lineNo) {
