@@ -28,7 +28,12 @@ struct FormatRow {
     const char* format;  // as detected
     const char* first;   // everything before the message, for the event
     const char* second;  // for the request
+    const char* what = "";
 };
+
+std::ostream& operator<<(std::ostream& out, const FormatRow& row) {
+    return out << row.format << row.what;
+}
 
 class LogcatFormatTest : public testing::TestWithParam<FormatRow> {};
 
@@ -60,9 +65,8 @@ INSTANTIATE_TEST_SUITE_P(
                   "2026-11-23 18:09:31.600  1234  1251 I velmora server: "},
         FormatRow{"threadtime,uid", "11-23 18:09:30.100  1000:  1234  1250 I velmora server: ",
                   "11-23 18:09:31.600  root:  1234  1251 I velmora server: "},
-        // A new year in a log without years; microseconds.
         FormatRow{"threadtime", "12-31 23:59:59.100000  1234  1250 I velmora server: ",
-                  "01-01 00:00:00.600000  1234  1251 I velmora server: "},
+                  "01-01 00:00:00.600000  1234  1251 I velmora server: ", "-new-year-usec"},
         FormatRow{"threadtime,epoch", "1795457370.100  1234  1250 I velmora server: ",
                   "1795457371.600  1234  1251 I velmora server: "},
         FormatRow{"threadtime,monotonic,uid", "  5123.100  1000:  1234  1250 I velmora server: ",
@@ -96,6 +100,10 @@ std::string threadtimeLog(const std::vector<std::pair<int, std::string>>& lines)
         log += prefix + lines[k].second + "\n";
     }
     return log;
+}
+
+std::ostream& operator<<(std::ostream& out, const LineRow& row) {
+    return out << row.name;
 }
 
 class ServerLinesTest : public testing::TestWithParam<LineRow> {};
@@ -180,6 +188,10 @@ struct BadInputRow {
     std::string log;
     const char* error;  // part of the one line
 };
+
+std::ostream& operator<<(std::ostream& out, const BadInputRow& row) {
+    return out << row.name;
+}
 
 class ImportCommandTest : public testing::TestWithParam<BadInputRow> {
 protected:
