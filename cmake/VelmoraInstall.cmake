@@ -32,7 +32,7 @@ function(velmora_install_rules)
             LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
             ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR}
             RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
-    foreach(tool velmora-replay velmora-lint)
+    foreach(tool velmora-replay velmora-lint velmora-import-logcat)
         if(TARGET ${tool})
             install(TARGETS ${tool} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
         endif()

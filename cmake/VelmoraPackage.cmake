@@ -13,7 +13,8 @@ set(CPACK_PACKAGE_DESCRIPTION_SUMMARY
 set(CPACK_PACKAGE_DESCRIPTION
     "libvelmora, the performance server of a mobile device's vendor layer, built for a Linux host
 with its host platform layer (a simulated device), velmora-replay (event trace replay),
-velmora-lint (configuration checker), headers, pkg-config and CMake files, the example
+velmora-lint (configuration checker), velmora-import-logcat (device logs into traces),
+headers, pkg-config and CMake files, the example
 configuration and traces, and the documentation.")
 set(CPACK_PACKAGING_INSTALL_PREFIX "/usr")
 set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
