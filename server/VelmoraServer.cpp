@@ -12,6 +12,12 @@
 
 using namespace velmora;
 
+// The host was built against plain bool flags: the atomics must keep their footprint.
+static_assert(sizeof(std::atomic<bool>) == sizeof(bool) &&
+                  alignof(std::atomic<bool>) == alignof(bool),
+              "std::atomic<bool> must lay out like bool");
+static_assert(std::atomic<bool>::is_always_lock_free, "flags are read from every host thread");
+
 namespace {
 
 // The probe worker owns its action chain and frees it by walking mNext, but a parsed copy's

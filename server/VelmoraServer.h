@@ -13,6 +13,7 @@
 
 #include <utils/Mutex.h>
 
+#include <atomic>
 #include <cstdint>
 #include <map>
 #include <set>
@@ -89,9 +90,12 @@ public:
     SchedLevelManager* mSchedLevelPtr;
     ProbeHandler* mProbeHandler;
     android::Mutex mMutex;
-    bool mDebugLog;       // entry-point traces; switched by "--logon" / "--logoff"
-    bool mInitialized;    // entry points return 1 while false
-    bool mPolicyEnabled;  // launch policies replace durations; bit 18 of notification 20225
+    // The dump and notification 20225 write these two flags while every host thread reads
+    // them; each is a lone switch that orders nothing else, so relaxed loads and stores do.
+    // std::atomic<bool> has the size, alignment and offset of the plain bool it replaces.
+    std::atomic<bool> mDebugLog;       // entry-point traces; switched by "--logon" / "--logoff"
+    bool mInitialized;                 // entry points return 1 while false
+    std::atomic<bool> mPolicyEnabled;  // launch policies replace durations; bit 18 of 20225
     // Guarded by mMutex.
     int32_t mCurSpecialCmdId GUARDED_BY(mMutex);  // scene currently applied, 0 for none
     std::map<int32_t, int32_t> mPriorityMap GUARDED_BY(mMutex);  // lookups insert on miss

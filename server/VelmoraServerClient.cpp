@@ -106,7 +106,7 @@ int VelmoraServer::velmoraGetConfig(int tagLen, const int* tags, int* configs) {
     if (!mInitialized) {
         return 1;
     }
-    if (mDebugLog) {
+    if (mDebugLog.load(std::memory_order_relaxed)) {
         VLOGI("velmoraGetConfig tagLen=%d", tagLen);
     }
     if (mPlatPtr == nullptr) {
@@ -152,10 +152,10 @@ void VelmoraServer::dumpVelmoraServerInfo(int fd, const std::vector<std::string>
         out.append("--freqlist: print set freq list\n");
         out.append("--easgrouplist: print set eas group list\n");
     } else if (option == "--logon") {
-        mDebugLog = true;
+        mDebugLog.store(true, std::memory_order_relaxed);
         out.appendFormat("velmora log is %s\n", "ON");
     } else if (option == "--logoff") {
-        mDebugLog = false;
+        mDebugLog.store(false, std::memory_order_relaxed);
         out.appendFormat("velmora log is %s\n", "OFF");
     } else if (option == "--freqlist") {
         if (mFreqClientPtr != nullptr) {

@@ -29,7 +29,7 @@ int VelmoraServer::isVelmoraEnable(int cmdId, const int* payload) {
     if (!mInitialized) {
         return 1;
     }
-    if (mDebugLog) {
+    if (mDebugLog.load(std::memory_order_relaxed)) {
         if (payload != nullptr) {
             VLOGI("velmoraEvent cmdId=%d, payload=%d", cmdId, payload[0]);
         } else {
@@ -48,7 +48,7 @@ bool VelmoraServer::isParamValid(unsigned int payloadNum, const int* payload) {
 }
 
 void VelmoraServer::updatePolicy(int cmdId, Action* action, const int* payload) {
-    if (payload == nullptr || !mPolicyEnabled || payload[0] != 0) {
+    if (payload == nullptr || !mPolicyEnabled.load(std::memory_order_relaxed) || payload[0] != 0) {
         return;
     }
     if (cmdId != kCmdColdStart && cmdId != kCmdWinSwitch) {
@@ -87,7 +87,7 @@ int VelmoraServer::doNotificationEvent(int cmdId, unsigned int payloadNum, const
         if (payloadNum != 1 || payload == nullptr) {
             return 0;
         }
-        mPolicyEnabled = (payload[0] & kPolicyEnableBit) != 0;
+        mPolicyEnabled.store((payload[0] & kPolicyEnableBit) != 0, std::memory_order_relaxed);
         const int tag = VELMORA_TAG_FEATURE_SWITCH;
         return velmoraSetConfig(0, 1, &tag, payload);
     }
@@ -159,8 +159,10 @@ int VelmoraServer::doOnOffAction(const Action* action, unsigned int payloadNum,
         VLOGE("invalid special scene parameters, cmdId is %d", action->mCmdId);
         return -1;
     }
-    PerfExecutor* executor = mPlatPtr->mExecutorPtr;
+    // The executor is read at each use: the platform may install or replace it at any time,
+    // also while the frequency manager's call below is under way.
     if (action->mDuration > 0) {
+        PerfExecutor* executor = mPlatPtr->mExecutorPtr;
         return executor != nullptr ? executor->doAction(action, 1, payload) : -1;
     }
 
@@ -202,6 +204,7 @@ int VelmoraServer::doOnOffAction(const Action* action, unsigned int payloadNum,
         return 0;
     }
     // Some pairs carry the platform's own on/off tag: the platform applies the action too.
+    PerfExecutor* executor = mPlatPtr->mExecutorPtr;
     if (executor == nullptr) {
         return -1;
     }

@@ -19,6 +19,11 @@ namespace {
 constexpr size_t kRatioBufferSize = 512;
 constexpr size_t kRatioBufferAnnounced = 511;
 
+// The platform's executor as it is now; never kept across calls.
+PerfExecutor* currentExecutor(const VelmoraPlat* plat) {
+    return plat != nullptr ? plat->mExecutorPtr : nullptr;
+}
+
 }  // namespace
 
 int VelmoraServer::doMemlatencyEvent(int cmdId, const char* msg, unsigned int payloadNum,
@@ -29,7 +34,6 @@ int VelmoraServer::doMemlatencyEvent(int cmdId, const char* msg, unsigned int pa
         VLOGE("payload is invalid! cmdId=%d", cmdId);
         return 3;
     }
-    PerfExecutor* executor = mPlatPtr != nullptr ? mPlatPtr->mExecutorPtr : nullptr;
 
     if (cmdId == kCmdMemLatency) {
         Action action;
@@ -38,6 +42,8 @@ int VelmoraServer::doMemlatencyEvent(int cmdId, const char* msg, unsigned int pa
             VLOGE("doParse failed! cmdId=%d, errno=%d", cmdId, parseRet);
             return 2;
         }
+        // Read after the parse, not before: the platform may have replaced its executor.
+        PerfExecutor* executor = currentExecutor(mPlatPtr);
         if (executor == nullptr || executor->doAction(&action, 1, payload) != 0) {
             VLOGE("doAction failed! cmdId=%d", cmdId);
             return 3;
@@ -56,6 +62,7 @@ int VelmoraServer::doMemlatencyEvent(int cmdId, const char* msg, unsigned int pa
     std::vector<std::string> params = {"mem_latency_ratio_b", ratioBig, "mem_latency_ratio_l",
                                        ratioLittle};
     Action action(kCmdMemLatencyRatio, "", 0, 2, params);
+    PerfExecutor* executor = currentExecutor(mPlatPtr);
     if (executor == nullptr || executor->doAction(&action, 1, payload) != 0) {
         VLOGE("doAction failed! cmdId=%d", kCmdMemLatencyRatio);
         return 3;

@@ -86,7 +86,7 @@ int VelmoraServer::doSpecialSceneEvent(int cmdId, unsigned int payloadNum, const
 }
 
 int VelmoraServer::doSpecialAction(int cmdId, int value) {
-    if (mDebugLog) {
+    if (mDebugLog.load(std::memory_order_relaxed)) {
         VLOGI("doSpecialAction cmdId is %d, payload is %d", cmdId, value);
     }
     Action action;

@@ -24,6 +24,8 @@ const char* const kDispatchCommands =
     "</a></cmd>"
     "<cmd id=\"12300\" name=\"onoff_timed\"><a><duration>20</duration><t2>900</t2></a></cmd>"
     "<cmd id=\"12301\" name=\"onoff_empty\"><a><duration>0</duration></a></cmd>"
+    "<cmd id=\"12302\" name=\"onoff_both\"><a><duration>0</duration><t10>5</t10>"
+    "<t2>900000</t2></a></cmd>"
     "<cmd id=\"4099\" name=\"cold\"><a><duration>500</duration><t4>2000</t4></a></cmd>"
     "<cmd id=\"4098\" name=\"winswitch\"><a><duration>300</duration><t4>1800</t4></a></cmd>"
     "<cmd id=\"4401\" name=\"disabled\"><a><duration>-1</duration><t1>1</t1></a></cmd>"
@@ -217,6 +219,28 @@ TEST_F(EventDispatchTest, OnOffWithPositiveDurationIsATimedPlatformAction) {
 TEST_F(EventDispatchTest, OnOffWithoutPairsDoesNothing) {
     EXPECT_EQ(mServer->velmoraEvent(12301, "", 1, &kOn), 0);
     EXPECT_TRUE(executor().calls().empty());
+}
+
+// A platform may install another executor at any time; an on/off command that goes to the
+// frequency manager first must hand its platform part to the executor installed by then.
+class SwappingExecutor : public FakeExecutor {
+public:
+    int doPerfSetConfig(int id, int count, const int* tags, const int* values) override {
+        FakeEnv::get().lastPlat->mExecutorPtr = replacement;
+        return FakeExecutor::doPerfSetConfig(id, count, tags, values);
+    }
+    PerfExecutor* replacement = nullptr;
+};
+
+TEST_F(EventDispatchTest, OnOffUsesTheExecutorInstalledDuringTheFrequencyCall) {
+    SwappingExecutor first;
+    first.replacement = &executor();
+    env().lastPlat->mExecutorPtr = &first;
+    EXPECT_EQ(mServer->velmoraEvent(12302, "", 1, &kOn), 0);
+    EXPECT_EQ(first.calls(Op::SetConfig).size(), 1u);
+    EXPECT_TRUE(first.calls(Op::DoAction).empty());
+    ASSERT_EQ(actions().size(), 1u);
+    EXPECT_EQ(actions()[0].id, 12302);
 }
 
 class OnOffLimitTest : public ServerTest {};
