@@ -23,6 +23,8 @@ constexpr DumpRow kDumpRows[] = {
     {VELMORA_TAG_IPA_SUSTAINABLE_POWER, "ipa sustainable power,"},
     {VELMORA_TAG_FORK_ON_BIG_CLUSTER, "fork on big cluster,  "},
 };
+static_assert(sizeof(kDumpRows) / sizeof(kDumpRows[0]) == FreqClientManager::kFreqListTags,
+              "one dump row per merged tag");
 
 // Client requests rarely carry more tags than an event; larger ones spill to the heap.
 constexpr int kInlineRequestTags = MAX_EVENT_TAGS;
@@ -61,6 +63,9 @@ FreqClientManager::FreqClientManager(VelmoraPlat* plat)
     initConfigMap(mZolaConfigMap);
     initConfigMap(mMinConfigMap);
     initFreqMap();
+    // Not yet shared with any other thread; the lock only keeps the analysis honest.
+    android::Mutex::Autolock lock(mLock);
+    publishFreqListLocked();
 }
 
 FreqClientManager::~FreqClientManager() = default;
@@ -190,6 +195,18 @@ void FreqClientManager::cacheTags(int clientId, int tagLen, const int* tags, con
         return;
     }
     updateConfigMap(tagLen, tags, configs, *table);
+    publishFreqListLocked();
+}
+
+void FreqClientManager::publishFreqListLocked() {
+    const TagMap* const tables[kFreqListClients] = {&mKxConfigMap, &mJnConfigMap, &mZolaConfigMap};
+    FreqListValues values;
+    for (int c = 0; c < kFreqListClients; ++c) {
+        for (int row = 0; row < kFreqListTags; ++row) {
+            values[c][row] = valueOr0(*tables[c], kDumpRows[row].tag);
+        }
+    }
+    mFreqListSnapshot.publish(values);
 }
 
 void FreqClientManager::updateConfigMap(int tagLen, const int* tags, const int* configs,
@@ -402,15 +419,20 @@ bool FreqClientManager::isFreqValValid(int minFreq, int maxFreq) {
     return minFreq <= maxFreq || minFreq < 1 || maxFreq < 1;
 }
 
-// The dump runs on the dump caller's thread without mLock: a debugging aid must not block behind
-// a stuck platform call. The client tables always hold the seven merged tags, so it only reads.
+// The dump runs on the dump caller's thread and reads the published copy, never the tables: a
+// debugging aid must neither race with a request nor block behind a stuck platform call.
 void FreqClientManager::dumpFreqList(android::String8& out) {
-    out.append("KX set freq is:\n");
-    printFreqList(mKxConfigMap, out);
-    out.append("JN set freq is:\n");
-    printFreqList(mJnConfigMap, out);
-    out.append("ZOLA set freq is:\n");
-    printFreqList(mZolaConfigMap, out);
+    static const char* const kHeadings[kFreqListClients] = {
+        "KX set freq is:\n", "JN set freq is:\n", "ZOLA set freq is:\n"};
+    const FreqListValues values = mFreqListSnapshot.read();
+    for (int c = 0; c < kFreqListClients; ++c) {
+        TagMap table;
+        for (int row = 0; row < kFreqListTags; ++row) {
+            table[kDumpRows[row].tag] = values[c][row];
+        }
+        out.append(kHeadings[c]);
+        printFreqList(table, out);
+    }
 }
 
 void FreqClientManager::printFreqList(TagMap& table, android::String8& out) {

@@ -9,17 +9,20 @@
 //
 // Locking: mLock guards every table, both flags and the reporter. doPerfSetConfig holds it for
 // the whole request, platform calls included; nothing called under it re-enters the manager.
-// The dump reads the client tables without it. Field order and the single virtual destructor
-// are part of the binary interface with separately built components.
+// The dump never takes it: it prints mFreqListSnapshot, which every change of a client table
+// republishes under mLock (mLock before the snapshot's own lock). Field order and the single
+// virtual destructor are part of the binary interface with separately built components.
 #pragma once
 
 #include <utils/Mutex.h>
 #include <utils/String8.h>
 
+#include <array>
 #include <cstdint>
 #include <map>
 #include <set>
 
+#include "dump/DumpSnapshot.h"
 #include "freq/FreqTags.h"
 #include "report/FreqInfoUpload.h"
 
@@ -47,8 +50,8 @@ public:
     int doPerfEventConfig(int cmdId, int tagLen, const int* tags, const int* configs, int onOff)
         REQUIRES(mLock);
 
-    // Appends the three clients' stored requests. Reads without mLock (see the note above).
-    void dumpFreqList(android::String8& out) NO_THREAD_SAFETY_ANALYSIS;
+    // Appends the three clients' stored requests, as last published. Never waits for mLock.
+    void dumpFreqList(android::String8& out) EXCLUDES(mLock);
     // Appends the seven merged tags of `table`, inserting missing ones as 0.
     void printFreqList(TagMap& table, android::String8& out);
 
@@ -117,7 +120,16 @@ public:
     bool mMaxFreqRead GUARDED_BY(mLock);    // top frequencies handed to the reporter
     bool mUploadEnabled GUARDED_BY(mLock);  // set by the feature switch, never cleared
 
+    // What "--freqlist" prints: KX's, JN's and ZOLA's values of the seven merged tags, in dump
+    // order, copied from the client tables whenever one of them changes.
+    static constexpr int kFreqListClients = 3;
+    static constexpr int kFreqListTags = 7;
+    using FreqListValues = std::array<std::array<int32_t, kFreqListTags>, kFreqListClients>;
+    velmora::DumpSnapshot<FreqListValues> mFreqListSnapshot;
+
 private:
+    // Copies the client tables into mFreqListSnapshot.
+    void publishFreqListLocked() REQUIRES(mLock);
     // The platform's executor, or null when the platform or its executor is absent.
     PerfExecutor* executor() const;
     // The client's table, or null for ids other than 1..3.

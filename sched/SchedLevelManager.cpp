@@ -22,6 +22,8 @@ constexpr int kMaxGroupIndex = 8;
 constexpr int kFirstGroupTag = VELMORA_TAG_GROUP_HMP;
 constexpr int kLastGroupTag = VELMORA_TAG_GROUP_BACKGROUND;
 constexpr int kFirstEasGroupTag = VELMORA_TAG_GROUP_BOOST;
+static_assert(SchedLevelManager::EasGroupValues::kGroups == kLastGroupTag - kFirstGroupTag + 1,
+              "the dump's copy holds every group tag");
 // Packed client levels are offset so that the low half stays non-negative.
 constexpr int kLevelOffset = -velmora::kSchedLevelLowest;
 
@@ -41,8 +43,8 @@ int pairCount(const Action& action) {
 }
 
 // Copies `from` into `to` level by level when both hold the same tags, so that the tree keeps
-// its nodes: the dump walks the tables without the lock and must never meet a tree being
-// rebuilt. Falls back to a plain assignment otherwise.
+// its nodes (and callers' pointers into it stay valid). Falls back to a plain assignment
+// otherwise.
 void copyLevels(const SchedLevelManager::LevelMap& from, SchedLevelManager::LevelMap& to) {
     const bool sameTags =
         from.size() == to.size() &&
@@ -58,6 +60,19 @@ void copyLevels(const SchedLevelManager::LevelMap& from, SchedLevelManager::Leve
     }
 }
 
+// Republishes the dump's copy when an entry point returns, on every path, while its lock is
+// still held (declare it after the lock).
+class PublishOnReturn {
+public:
+    explicit PublishOnReturn(SchedLevelManager& manager) : mManager(manager) {}
+    ~PublishOnReturn() NO_THREAD_SAFETY_ANALYSIS { mManager.publishEasGroupListLocked(); }
+    PublishOnReturn(const PublishOnReturn&) = delete;
+    PublishOnReturn& operator=(const PublishOnReturn&) = delete;
+
+private:
+    SchedLevelManager& mManager;
+};
+
 }  // namespace
 
 SchedLevelManager::SchedLevelManager(VelmoraPlat* plat)
@@ -72,6 +87,7 @@ SchedLevelManager::SchedLevelManager(VelmoraPlat* plat)
     initSchedLevelVec();
     initZolaSchedLevelMap(mZolaFirstEventMap);
     initZolaSchedLevelMap(mZolaEventMap);
+    publishEasGroupListLocked();
 }
 
 SchedLevelManager::~SchedLevelManager() = default;
@@ -192,6 +208,7 @@ int SchedLevelManager::doEventSchedLevel(const Action* action) {
     }
 
     android::Mutex::Autolock lock(mLock);
+    PublishOnReturn publish(*this);
     if (action->mCmdId == kCmdDefaultSchedLevel) {
         // Only recorded: the platform hears of the defaults with the next merge.
         int groups[kMaxGroupNum] = {};
@@ -317,6 +334,7 @@ int SchedLevelManager::doPerfSetSchedLevel(int clientId, int tagLen, const int* 
     }
 
     android::Mutex::Autolock lock(mLock);
+    PublishOnReturn publish(*this);
     const LevelMap tableBackup = *table;
     const LevelMap currentBackup = mCurrentLevelMap;
     if (tagLen == 1 && tags[0] == VELMORA_TAG_SCHED_LEVEL_STEP) {
@@ -384,19 +402,35 @@ SchedLevelManager::LevelMap* SchedLevelManager::getSchedLevelMap(int clientId) {
 }
 
 void SchedLevelManager::dumpEasGroupList(android::String8& out) {
-    // Unlocked so that a dump never waits behind a platform call. The tables keep their nine
-    // nodes for life (see copyLevels), so a dump taken during a request can at worst show a
-    // level from the middle of that request.
-    out.append("default eas group value is:\n");
-    printEasGroupList(mDefaultLevelMap, out);
-    out.append("current eas group value is:\n");
-    printEasGroupList(mCurrentLevelMap, out);
-    out.append("KX set eas group value is:\n");
-    printEasGroupList(mKxLevelMap, out);
-    out.append("JN set eas group value is:\n");
-    printEasGroupList(mJnLevelMap, out);
-    out.append("ZOLA set eas group value is:\n");
-    printEasGroupList(mZolaLevelMap, out);
+    // The published copy, never the tables: a dump must neither race with a request nor wait
+    // behind the platform call that a request makes under mLock.
+    static const char* const kHeadings[EasGroupValues::kTables] = {
+        "default eas group value is:\n", "current eas group value is:\n",
+        "KX set eas group value is:\n", "JN set eas group value is:\n",
+        "ZOLA set eas group value is:\n"};
+    const EasGroupValues values = mEasGroupSnapshot.read();
+    for (int t = 0; t < EasGroupValues::kTables; ++t) {
+        LevelMap table;
+        for (int g = 0; g < EasGroupValues::kGroups; ++g) {
+            table[kFirstGroupTag + g] = values.levels[t][g];
+        }
+        out.append(kHeadings[t]);
+        velmora::EasGroupPrinter::print(table, values.hmpMode, out);
+    }
+}
+
+void SchedLevelManager::publishEasGroupListLocked() {
+    const LevelMap* const tables[EasGroupValues::kTables] = {
+        &mDefaultLevelMap, &mCurrentLevelMap, &mKxLevelMap, &mJnLevelMap, &mZolaLevelMap};
+    EasGroupValues values;
+    for (int t = 0; t < EasGroupValues::kTables; ++t) {
+        for (int g = 0; g < EasGroupValues::kGroups; ++g) {
+            const auto it = tables[t]->find(kFirstGroupTag + g);
+            values.levels[t][g] = it != tables[t]->end() ? it->second : 0;
+        }
+    }
+    values.hmpMode = mHmpMode;
+    mEasGroupSnapshot.publish(values);
 }
 
 void SchedLevelManager::printEasGroupList(LevelMap& table, android::String8& out) {

@@ -10,9 +10,10 @@
 //
 // Locking: mLock is the manager's only lock and is not recursive. The two entry points take it
 // after validating their input and hold it through the platform call, so a slow platform holds
-// up the other entry point; nothing else is locked while it is held. Every other table
-// operation expects the caller to hold it (see REQUIRES). The dump and getSchedLevelMap read
-// without it.
+// up the other entry point; nothing else is locked while it is held except the dump snapshot's
+// own short lock, which both entry points take last to publish what the dump prints. Every
+// other table operation expects the caller to hold it (see REQUIRES). The dump never takes it:
+// it prints mEasGroupSnapshot. getSchedLevelMap hands out a table without it.
 #pragma once
 
 #include <utils/Mutex.h>
@@ -23,6 +24,7 @@
 #include <vector>
 
 #include "config/Tags.h"
+#include "dump/DumpSnapshot.h"
 
 class Action;
 class VelmoraPlat;
@@ -42,8 +44,9 @@ public:
     // missing executor, otherwise the executor's nonzero result (state rolled back).
     int doPerfSetSchedLevel(int clientId, int tagLen, const int* tags, const int* configs)
         EXCLUDES(mLock);
-    // Appends the default, current, KX, JN and ZOLA tables.
-    void dumpEasGroupList(android::String8& out) NO_THREAD_SAFETY_ANALYSIS;
+    // Appends the default, current, KX, JN and ZOLA tables, as last published. Never waits for
+    // mLock.
+    void dumpEasGroupList(android::String8& out) EXCLUDES(mLock);
     // Appends one line per active group of `table`.
     void printEasGroupList(LevelMap& table, android::String8& out) NO_THREAD_SAFETY_ANALYSIS;
 
@@ -107,6 +110,20 @@ public:
     bool mHmpMode GUARDED_BY(mLock);
 
     android::Mutex mLock;
+
+    // What "--easgrouplist" prints: the levels of the nine group tags in the default, current,
+    // KX, JN and ZOLA tables, and the mode that picks the lines. Republished under mLock at the
+    // end of every entry point, whatever it changed or rolled back.
+    struct EasGroupValues {
+        static constexpr int kTables = 5;
+        static constexpr int kGroups = 9;  // tags 50..58
+        int32_t levels[kTables][kGroups];
+        bool hmpMode;
+    };
+    velmora::DumpSnapshot<EasGroupValues> mEasGroupSnapshot;
+
+    // Copies the five dumped tables into mEasGroupSnapshot.
+    void publishEasGroupListLocked() REQUIRES(mLock);
 };
 
 // Creates the manager for `plat`; the caller owns it.

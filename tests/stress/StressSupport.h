@@ -5,6 +5,7 @@
 
 #include <unistd.h>
 
+#include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <condition_variable>
@@ -15,9 +16,7 @@
 #include <thread>
 #include <vector>
 
-// The dumps read the managers' tables without their locks, and mDebugLog / mPolicyEnabled are
-// plain flags: deliberate on the device, reported as races by ThreadSanitizer. Under TSan those
-// operations run only before and after the concurrent phase, single-threaded.
+// ThreadSanitizer slows every operation down several times: the counts shrink under it.
 #if defined(__SANITIZE_THREAD__)
 #define VELMORA_STRESS_TSAN 1
 #elif defined(__has_feature)
@@ -64,6 +63,13 @@ inline const std::vector<int> kGovScenes = {4230, 4240, 4260};
 inline const std::map<int, int> kPriorities = {{4118, 100}, {4119, 200}, {4120, 20}, {4121, 70},
                                         {4122, 150}, {4230, 50},  {4240, 50}, {4260, 300}};
 inline const std::vector<int> kFreqTags = {2, 5, 8};
+// Lines of the two table dumps (headings included, plus the reply's closing blank line).
+inline constexpr int kFreqListLines = 3 + 3 * 7 + 1;
+inline constexpr int kEasGroupLines = 5 + 5 * 8 + 1;
+
+inline int lineCount(const std::string& text) {
+    return static_cast<int>(std::count(text.begin(), text.end(), '\n'));
+}
 
 inline std::string cmd(int id, const std::string& name, const std::string& body) {
     return "<cmd id=\"" + std::to_string(id) + "\" name=\"" + name + "\"><act>" + body +
@@ -90,10 +96,6 @@ inline std::string commands(int variant) {
            cmd(4230, "gov_4230", "<duration>0</duration><s_priority>50</s_priority>") +
            cmd(4240, "gov_4240", "<duration>0</duration><s_priority>50</s_priority>") +
            cmd(4260, "gov_4260", "<duration>0</duration><s_priority>300</s_priority>");
-}
-
-inline bool isTsan() {
-    return VELMORA_STRESS_TSAN != 0;
 }
 
 // Per-thread progress for the watchdog: an operation counter and the operation in flight.
