@@ -6,6 +6,7 @@
 
 #include "config/Action.h"
 #include "config/VelmoraLoadXml.h"
+#include "config/VelmoraParser.h"
 #include "platform/OnDemandBoostServer.h"
 #include "platform/PlatformImports.h"
 #include "tests/fakes/FakeLoadXml.h"
@@ -75,6 +76,17 @@ NoopExecutor& executor() {
 
 }  // namespace bench
 }  // namespace velmora
+
+// VelmoraPlat belongs to the platform layer: libvelmora.so only declares it, so each platform
+// layer defines its members. The destructor deletes the parser that init stored in mParserPtr.
+VelmoraPlat::~VelmoraPlat() {
+    delete mParserPtr;
+    mParserPtr = nullptr;
+}
+
+int VelmoraPlat::initialize() {
+    return 0;
+}
 
 VelmoraPlat* getPlat() {
     return new velmora::bench::BenchPlatform();

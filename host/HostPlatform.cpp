@@ -1,5 +1,6 @@
 #include "host/HostPlatform.h"
 
+#include "config/VelmoraParser.h"
 #include "host/HostEnvironment.h"
 #include "platform/VelmoraLog.h"
 
@@ -31,6 +32,17 @@ int HostPlatform::initialize() {
 }
 
 }  // namespace velmora
+
+// VelmoraPlat belongs to the platform layer: libvelmora.so only declares it, so each platform
+// layer defines its members. The destructor deletes the parser that init stored in mParserPtr.
+VelmoraPlat::~VelmoraPlat() {
+    delete mParserPtr;
+    mParserPtr = nullptr;
+}
+
+int VelmoraPlat::initialize() {
+    return 0;
+}
 
 VelmoraPlat* getPlat() {
     return new velmora::HostPlatform();

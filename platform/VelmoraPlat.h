@@ -4,6 +4,11 @@
 // the object from then on; the object owns the command parser stored in mParserPtr (deleted by
 // this destructor) but not the executor, which belongs to the platform layer.
 // Field and virtual slot order are part of the binary interface.
+//
+// The class itself is the platform layer's too: on a device the vendor's library defines its
+// members, so libvelmora.so defines none of them and emits neither its vtable nor its typeinfo
+// (it only calls through the vtable and deletes). Our own platform layers (host/, tests/fakes/,
+// bench/) define the two members next to their getPlat().
 #pragma once
 
 class PerfExecutor;
@@ -13,10 +18,10 @@ class VelmoraServer;
 class VelmoraPlat {
 public:
     VelmoraPlat() = default;
-    // Deletes the parser held in mParserPtr.
+    // Deletes the parser held in mParserPtr. Defined by the platform layer.
     virtual ~VelmoraPlat();
     // Prepares the platform once the parser holds the configuration. 0 means success; any other
-    // value is returned from VelmoraServer::init unchanged.
+    // value is returned from VelmoraServer::init unchanged. Defined by the platform layer.
     virtual int initialize();
 
     VelmoraParser* mParserPtr = nullptr;  // owned from the moment init stores it

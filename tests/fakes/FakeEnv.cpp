@@ -5,6 +5,7 @@
 #include <cstring>
 
 #include "config/VelmoraLoadXml.h"
+#include "config/VelmoraParser.h"
 #include "platform/OnDemandBoostServer.h"
 #include "platform/PlatformImports.h"
 #include "tests/fakes/FakeLoadXml.h"
@@ -80,6 +81,17 @@ FakePlatform::~FakePlatform() {
 }  // namespace velmora
 
 using velmora::fake::FakeEnv;
+
+// VelmoraPlat belongs to the platform layer: libvelmora.so only declares it, so each platform
+// layer defines its members. The destructor deletes the parser that init stored in mParserPtr.
+VelmoraPlat::~VelmoraPlat() {
+    delete mParserPtr;
+    mParserPtr = nullptr;
+}
+
+int VelmoraPlat::initialize() {
+    return 0;
+}
 
 VelmoraPlat* getPlat() {
     FakeEnv& env = FakeEnv::get();
