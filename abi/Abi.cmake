@@ -1,11 +1,16 @@
 # Interface checks, as CTest tests of every build that has tests:
 #   abi.<arch>          scripts/check-abi: field and virtual-slot layout of the host-facing types
 #                       and the exported symbols of libvelmora.so, against abi/<arch>/
+#   abi.exports         scripts/check-exports: libvelmora.so exports nothing outside its
+#                       interface (every flavour, sanitizers included)
 #   android_bp.sources  scripts/check-android-bp: Android.bp builds the sources of `velmora`
 # Included at the end of the top-level CMakeLists.
 if(NOT BUILD_TESTING)
     return()
 endif()
+
+add_test(NAME abi.exports
+         COMMAND ${PROJECT_SOURCE_DIR}/scripts/check-exports ${PROJECT_BINARY_DIR})
 
 # Sanitizer builds export instrumentation symbols of their own; the reference describes the
 # plain library.

@@ -15,7 +15,10 @@
 #include <string>
 #include <vector>
 
-class Action {
+#include "platform/VelmoraExport.h"
+
+// Exported: the platform's loader conversion builds Action chains and its executor reads them.
+class VELMORA_EXPORT Action {
 public:
     // Default record: cmdId -1, empty name, duration -1 (nothing to do), no parameters.
     Action() = default;

@@ -9,7 +9,10 @@
 #include <string>
 #include <vector>
 
-class RawXmlData {
+#include "platform/VelmoraExport.h"
+
+// Exported: the platform's loader conversion reads these records.
+class VELMORA_EXPORT RawXmlData {
 public:
     int32_t cmdId = 0;
     int32_t type = 0;                 // the action element's "type" attribute, 0 when absent

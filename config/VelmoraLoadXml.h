@@ -11,12 +11,14 @@
 
 #include "config/Action.h"
 #include "config/RawXmlData.h"
+#include "platform/VelmoraExport.h"
 
 namespace tinyxml2 {
 class XMLElement;
 }
 
-class VelmoraLoadXml {
+// Exported: the platform layer derives its loader from this class.
+class VELMORA_EXPORT VelmoraLoadXml {
 public:
     // Converts the raw records into a new map of Action chains, or returns null. Must not keep
     // pointers into `rawMap`: the caller frees the records after the call.

@@ -13,10 +13,12 @@
 #include <cstdint>
 
 #include "config/Action.h"
+#include "platform/VelmoraExport.h"
 
 class VelmoraServer;
 
-class VelmoraParser {
+// Exported: the platform object holds the parser and its destructor deletes it.
+class VELMORA_EXPORT VelmoraParser {
 public:
     VelmoraParser();
     // Takes the write lock, frees every chain and the map, then destroys the lock.

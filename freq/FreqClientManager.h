@@ -24,6 +24,7 @@
 
 #include "dump/DumpSnapshot.h"
 #include "freq/FreqTags.h"
+#include "platform/VelmoraExport.h"
 #include "report/FreqInfoUpload.h"
 
 class PerfExecutor;
@@ -136,5 +137,7 @@ private:
     TagMap* clientTable(int clientId) REQUIRES(mLock);
 };
 
-// A new manager built on `plat`, owned by the caller.
-FreqClientManager* getFreqClient(VelmoraPlat* plat);
+// A new manager built on `plat`, owned by the caller. Exported: a factory of the platform
+// interface, which a platform layer may call to build its own manager (it needs nothing else of
+// the class: it only keeps the pointer and deletes it through the virtual destructor).
+VELMORA_EXPORT FreqClientManager* getFreqClient(VelmoraPlat* plat);

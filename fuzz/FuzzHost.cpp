@@ -7,7 +7,6 @@
 #include <cstdlib>
 
 #include "host/HostEnvironment.h"
-#include "probe/ProbeHandler.h"
 #include "server/VelmoraServer.h"
 
 namespace velmora {
@@ -19,14 +18,12 @@ void dropLine(const struct __android_logger_data* /*data*/, const char* /*messag
 
 VelmoraServer* gServer = nullptr;
 
-// At exit: stop the probe worker, then release the components (the platform's destructor stops
-// the host layer's timer thread). The server object itself stays, as a host's would.
+// At exit: release the components (the probe worker is stopped before the platform goes, and
+// the platform's destructor stops the host layer's timer thread). The server object itself
+// stays, as a host's would.
 void stopServer() {
     if (gServer == nullptr) {
         return;
-    }
-    if (gServer->mProbeHandler != nullptr) {
-        gServer->mProbeHandler->stopProbeThread();
     }
     gServer->deleteObject();
 }

@@ -16,9 +16,13 @@
 #include <utils/Condition.h>
 #include <utils/Mutex.h>
 
+#include "platform/VelmoraExport.h"
+
 namespace velmora {
 
-class ProbeClock {
+// Exported: a platform layer that runs the library off the device (host/) derives its clock
+// from it and installs a factory.
+class VELMORA_EXPORT ProbeClock {
 public:
     using Factory = ProbeClock* (*)();
 

@@ -25,6 +25,7 @@
 
 #include "config/Tags.h"
 #include "dump/DumpSnapshot.h"
+#include "platform/VelmoraExport.h"
 
 class Action;
 class VelmoraPlat;
@@ -126,5 +127,6 @@ public:
     void publishEasGroupListLocked() REQUIRES(mLock);
 };
 
-// Creates the manager for `plat`; the caller owns it.
-SchedLevelManager* getSchedLevel(VelmoraPlat* plat);
+// Creates the manager for `plat`; the caller owns it. Exported for the same reason as
+// getFreqClient: a factory of the platform interface.
+VELMORA_EXPORT SchedLevelManager* getSchedLevel(VelmoraPlat* plat);

@@ -20,13 +20,16 @@
 #include <string>
 #include <vector>
 
+#include "platform/VelmoraExport.h"
+
 class Action;
 class FreqClientManager;
 class ProbeHandler;
 class SchedLevelManager;
 class VelmoraPlat;
 
-class VelmoraServer {
+// Exported: the host service constructs it and calls its entry points.
+class VELMORA_EXPORT VelmoraServer {
 public:
     VelmoraServer();
     virtual ~VelmoraServer();
