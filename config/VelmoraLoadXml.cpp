@@ -1,5 +1,6 @@
 #include "config/VelmoraLoadXml.h"
 
+#include <sys/stat.h>
 #include <tinyxml2.h>
 
 #include "compat/BoundedString.h"
@@ -20,6 +21,9 @@ constexpr const char* kCloudConfigFormat =
 constexpr const char* kCustConfigSuffix = "xml/velmora_config_cust.xml";
 // A command keeps at most this many action elements; later ones are ignored.
 constexpr int kMaxActionsPerCommand = 3;
+// A command configuration is tens of kilobytes. tinyxml2 holds the whole text and its tree in
+// memory, so a larger file (a runaway cloud copy, a wrong path) is refused before it is read.
+constexpr long long kMaxConfigBytes = 16LL * 1024 * 1024;
 
 // Reads an integer attribute written in decimal (see DecimalText.h).
 bool queryDecimalAttribute(const tinyxml2::XMLElement* element, const char* name, int* out) {
@@ -99,6 +103,14 @@ int32_t VelmoraLoadXml::innerLoad(const char* path, RawXmlDataMap* rawMap) {
     if (path == nullptr || rawMap == nullptr) {
         return 2;
     }
+    struct stat info;
+    if (stat(path, &info) == 0 && static_cast<long long>(info.st_size) > kMaxConfigBytes) {
+        VLOGE("configuration file %s is too large: %lld bytes, at most %lld", path,
+              static_cast<long long>(info.st_size), kMaxConfigBytes);
+        return 2;
+    }
+    // A file cut short while it is read (a copy being replaced in place) fails to parse or to
+    // read, and the caller keeps the configuration in force.
     tinyxml2::XMLDocument doc(true);
     doc.LoadFile(path);
     const int error = doc.ErrorID();

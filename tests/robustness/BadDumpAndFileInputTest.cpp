@@ -1,12 +1,16 @@
 // Hostile and malformed input at the dump entry point (arguments, unusable descriptors) and in
 // the configuration file (broken, hostile or incomplete documents, tried by a reload and by a
 // fresh init). Each row states the reply or status and the line the library logs.
+#include <errno.h>
 #include <fcntl.h>
 #include <signal.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <functional>
 #include <string>
+#include <thread>
+#include <utility>
 #include <vector>
 
 #include "config/VelmoraLoadXml.h"
@@ -58,50 +62,78 @@ TEST_F(BadInputTest, DumpToNegativeDescriptorOnlyLogs) {
     expectNothingLost();
 }
 
-TEST_F(BadInputTest, DumpToClosedDescriptorLogsTheFailedWrite) {
-    int fds[2];
-    ASSERT_EQ(pipe(fds), 0);
-    close(fds[0]);
-    close(fds[1]);
-    mServer->dumpVelmoraServerInfo(fds[1], {"--help"});
-    EXPECT_EQ(LogCapture::countContaining("dump write failed, fd=" + std::to_string(fds[1]) +
-                                          ", errno=9"),
-              1);
-    expectNothingLost();
+// Descriptors a dump cannot write to. Each row opens its descriptor (and a peer to close
+// afterwards, or -1); the dump must give up at once with one log line naming the error, never
+// block, and never raise SIGPIPE.
+struct DumpFdRow {
+    const char* name;
+    std::function<std::pair<int, int>()> open;  // {descriptor to dump to, peer}
+    int error;
+};
+
+std::pair<int, int> closedPipeEnd() {
+    int fds[2] = {-1, -1};
+    if (pipe(fds) == 0) {
+        close(fds[0]);
+        close(fds[1]);
+    }
+    return {fds[1], -1};
 }
 
-TEST_F(BadInputTest, DumpToReadOnlyDescriptorLogsTheFailedWrite) {
-    const int fd = open("/dev/null", O_RDONLY);
-    ASSERT_GE(fd, 0);
-    mServer->dumpVelmoraServerInfo(fd, {"--freqlist"});
-    close(fd);
-    EXPECT_EQ(LogCapture::countContaining("dump write failed, fd=" + std::to_string(fd) +
-                                          ", errno=9"),
-              1);
-    expectNothingLost();
+std::pair<int, int> pipeWithoutReader() {
+    int fds[2] = {-1, -1};
+    if (pipe(fds) == 0) {
+        close(fds[0]);
+    }
+    return {fds[1], -1};
 }
 
-TEST_F(BadInputTest, DumpToPipeWithoutReaderLogsTheFailedWrite) {
-    // SIGPIPE at its default action, which would end the process: the dump must not raise it.
+std::pair<int, int> fullNonBlockingPipe() {
+    int fds[2] = {-1, -1};
+    if (pipe2(fds, O_NONBLOCK) != 0) {
+        return {-1, -1};
+    }
+    const std::string chunk(4096, 'x');
+    while (write(fds[1], chunk.data(), chunk.size()) > 0) {
+    }
+    return {fds[1], fds[0]};
+}
+
+class BadDumpFdTest : public BadInputTest, public ::testing::WithParamInterface<DumpFdRow> {};
+
+TEST_P(BadDumpFdTest, GivesUpWithOneLogLine) {
+    // SIGPIPE at its default action, which would end the process.
     struct sigaction deflt = {};
     struct sigaction previous = {};
     deflt.sa_handler = SIG_DFL;
     sigaction(SIGPIPE, &deflt, &previous);
-    int fds[2];
-    ASSERT_EQ(pipe(fds), 0);
-    close(fds[0]);
-    mServer->dumpVelmoraServerInfo(fds[1], {"--easgrouplist"});
-    close(fds[1]);
+    const std::pair<int, int> fds = GetParam().open();
+    ASSERT_GE(fds.first, 0);
+    mServer->dumpVelmoraServerInfo(fds.first, {"--easgrouplist"});
+    close(fds.first);
+    if (fds.second >= 0) {
+        close(fds.second);
+    }
     sigaction(SIGPIPE, &previous, nullptr);
     sigset_t pending;
     sigemptyset(&pending);
     sigpending(&pending);
     EXPECT_EQ(sigismember(&pending, SIGPIPE), 0) << "a SIGPIPE was left pending";
-    EXPECT_EQ(LogCapture::countContaining("dump write failed, fd=" + std::to_string(fds[1]) +
-                                          ", errno=32"),
+    EXPECT_EQ(LogCapture::countContaining("dump write failed, fd=" + std::to_string(fds.first) +
+                                          ", errno=" + std::to_string(GetParam().error)),
               1);
     expectNothingLost();
 }
+
+INSTANTIATE_TEST_SUITE_P(
+    Rows, BadDumpFdTest,
+    ::testing::Values(DumpFdRow{"ClosedDescriptor", closedPipeEnd, EBADF},
+                      DumpFdRow{"ReadOnlyDescriptor",
+                                [] { return std::make_pair(open("/dev/null", O_RDONLY), -1); },
+                                EBADF},
+                      DumpFdRow{"PipeWithoutReader", pipeWithoutReader, EPIPE},
+                      DumpFdRow{"FullNonBlockingPipe", fullNonBlockingPipe, EAGAIN}),
+    [](const ::testing::TestParamInfo<DumpFdRow>& info) { return std::string(info.param.name); });
 
 // ---------------------------------------------------------------------------------------------
 // The loader on a configuration file: a reload (20230) with the bad file must keep the
@@ -122,6 +154,14 @@ std::string nested(int depth) {
     }
     for (int i = 0; i < depth; ++i) {
         s += "</n>";
+    }
+    return s;
+}
+
+std::string manyCommands(int count) {
+    std::string s;
+    for (int id = 30000; id < 30000 + count; ++id) {
+        s += "<cmd id=\"" + std::to_string(id) + "\"><a><duration>1</duration></a></cmd>";
     }
     return s;
 }
@@ -169,15 +209,19 @@ INSTANTIATE_TEST_SUITE_P(
     Rows, BadFileTest,
     ::testing::Values(
         FileRow{"EmptyFile", [] { return std::string(); }, -1, "LoadFile error"},
-        FileRow{"Unterminated",
-                [] { return startupPlus("").substr(0, 60); }, -1, "LoadFile error"},
+        FileRow{"Unterminated", [] { return startupPlus("").substr(0, 60); }, -1, "LoadFile error"},
         FileRow{"NoPolicyElement", [] { return std::string("<other/>"); }, -1,
                 "get velmora_config_cust.xml failed!,ret:3"},
         FileRow{"OnlyUnusableIds",
                 [] { return policyXml("<cmd id=\"0x10\"/><cmd id=\"1e3\"/><cmd/>"); }, -1,
                 "empty rawXmlDataMap!!"},
-        FileRow{"DeepNesting", [] { return startupPlus(nested(100000)); }, -1,
-                "LoadFile error"},
+        FileRow{"DeepNesting", [] { return startupPlus(nested(100000)); }, -1, "LoadFile error"},
+        // Refused by its size before it is read.
+        FileRow{"SixtyFourMiB", [] { return startupPlus("") + std::string(64 << 20, ' '); }, -1,
+                "bytes, at most 16777216"},
+        // Loaded: many small commands stay within the size bound.
+        FileRow{"HundredThousandCommands", [] { return startupPlus(manyCommands(100000)); }, 0, "",
+                false},
         FileRow{"BillionLaughs", billionLaughs, 0, "", false},
         FileRow{"HugeAttribute",
                 [] {
@@ -206,6 +250,35 @@ INSTANTIATE_TEST_SUITE_P(
                 },
                 2, "", false}),
     [](const ::testing::TestParamInfo<FileRow>& info) { return std::string(info.param.name); });
+
+// The copy is rewritten in place while reloads read it: each reload sees the whole file or a
+// prefix of it, loads the one and refuses the other, and the configuration in force never goes.
+TEST_F(BadInputTest, ReloadWhileTheFileIsRewrittenInPlace) {
+    const std::string full = policyXml(std::string(kStartupCommands) + kCommands);
+    const std::string path = env().custConfigPath;
+    std::atomic<bool> stop{false};
+    std::thread writer([&] {
+        while (!stop.load()) {
+            const int fd = open(path.c_str(), O_WRONLY);
+            if (fd < 0) {
+                return;
+            }
+            const size_t half = full.size() / 2;
+            bool ok = ftruncate(fd, 0) == 0 && write(fd, full.data(), half) > 0;
+            ok = ok && write(fd, full.data() + half, full.size() - half) > 0;
+            close(fd);
+            if (!ok) {
+                return;
+            }
+        }
+    });
+    for (int i = 0; i < 30; ++i) {
+        EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
+        expectNothingLost();
+    }
+    stop = true;
+    writer.join();
+}
 
 TEST_F(BadInputTest, BillionLaughsIsNotExpanded) {
     // The document loads, but entity declarations are not honoured: the reference stays as it
