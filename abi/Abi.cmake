@@ -4,6 +4,9 @@
 #   abi.exports         scripts/check-exports: libvelmora.so exports nothing outside its
 #                       interface (every flavour, sanitizers included)
 #   android_bp.sources  scripts/check-android-bp: Android.bp builds the sources of `velmora`
+#   android_bp.build    scripts/build-android-bp: Android.bp, turned into a Makefile by
+#                       mini-soong, builds a hardened libvelmora.so with the same exports
+#                       (skipped where mini-soong is missing)
 # Included at the end of the top-level CMakeLists.
 if(NOT BUILD_TESTING)
     return()
@@ -18,6 +21,12 @@ if(VELMORA_SANITIZE STREQUAL "" AND CMAKE_SYSTEM_PROCESSOR MATCHES "^(x86_64|aar
     add_test(NAME abi.${CMAKE_SYSTEM_PROCESSOR}
              COMMAND ${PROJECT_SOURCE_DIR}/scripts/check-abi ${PROJECT_BINARY_DIR}
                      ${CMAKE_SYSTEM_PROCESSOR})
+endif()
+# Natively only: mini-soong builds for the machine it runs on.
+if(VELMORA_SANITIZE STREQUAL "" AND NOT CMAKE_CROSSCOMPILING)
+    add_test(NAME android_bp.build
+             COMMAND ${PROJECT_SOURCE_DIR}/scripts/build-android-bp ${PROJECT_BINARY_DIR})
+    set_tests_properties(android_bp.build PROPERTIES SKIP_RETURN_CODE 77 TIMEOUT 600)
 endif()
 
 find_package(Python3 COMPONENTS Interpreter QUIET)
