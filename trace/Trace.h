@@ -1,0 +1,85 @@
+// The library's trace points: one gate, enabled(), that every point tests first, and the calls
+// that hand a point to the installed sink (atrace unless a host program or a test installed one).
+//
+// Cheap when nobody traces: enabled() is one load of atrace's enabled tags (a call into
+// libcutils reading shared memory on a device), one load of a word that is 0 unless a sink of
+// our own is installed, and one branch that is predicted not taken. No lock, no allocation and
+// no formatting happens before that branch; every point formats its text only behind it.
+//
+// Thread safe. Install a sink before the server starts and remove it after the server and its
+// probe worker have stopped: a point that passed the gate may still be using the old sink.
+#pragma once
+
+#include <cutils/trace.h>
+
+#include <atomic>
+#include <cstdint>
+
+namespace velmora {
+
+class TraceSink;
+
+// The library's own: only setSink is exported, for the host layer and the tests.
+class __attribute__((visibility("hidden"))) Trace {
+public:
+    // The power category: the one people enable to see why frequencies and power states change
+    // ("atrace power freq sched", Perfetto's atrace_categories: "power"). The server is the
+    // vendor's power and performance component, and its tracks explain exactly those changes.
+    static constexpr uint64_t kAtraceTag = ATRACE_TAG_POWER;
+
+    // True while someone is tracing: atrace has the power tag on, or a sink of our own is
+    // installed.
+    static bool enabled() {
+        const uint64_t tags =
+            atrace_get_enabled_tags() | sOwnSinkTags.load(std::memory_order_relaxed);
+        return CC_UNLIKELY((tags & kAtraceTag) != 0);
+    }
+
+    // Hand one point to the sink. Callers test enabled() first.
+    static void counter(const char* track, int64_t value);
+    static void beginSlice(const char* name);
+    // Begins the slice "<name> <key>=<value>" (longer text is cut).
+    static void beginSlice(const char* name, const char* key, int value);
+    static void endSlice();
+
+    // Sends every later point to `sink` instead of atrace, or back to atrace when null. The
+    // caller keeps ownership; `sink` must outlive its installation (see above).
+    __attribute__((visibility("default"))) static void setSink(TraceSink* sink);
+
+private:
+    static TraceSink& sink();
+
+    // kAtraceTag while a sink of our own is installed, else 0.
+    static std::atomic<uint64_t> sOwnSinkTags;
+    static std::atomic<TraceSink*> sSink;  // null: atrace
+};
+
+// A slice for the lifetime of the object, on the thread that creates it. Tests the gate once;
+// when tracing is off it neither formats nor calls anything.
+class __attribute__((visibility("hidden"))) TraceSlice {
+public:
+    explicit TraceSlice(const char* name) : mOpen(Trace::enabled()) {
+        if (mOpen) {
+            Trace::beginSlice(name);
+        }
+    }
+    TraceSlice(const char* name, const char* key, int value) : mOpen(Trace::enabled()) {
+        if (mOpen) {
+            Trace::beginSlice(name, key, value);
+        }
+    }
+    ~TraceSlice() {
+        if (mOpen) {
+            Trace::endSlice();
+        }
+    }
+    TraceSlice(const TraceSlice&) = delete;
+    TraceSlice& operator=(const TraceSlice&) = delete;
+
+private:
+    // Whether this slice was begun: a slice that began while tracing was on is ended even if it
+    // has been switched off since, and one that did not begin is never ended.
+    const bool mOpen;
+};
+
+}  // namespace velmora
