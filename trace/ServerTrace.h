@@ -1,11 +1,7 @@
-// The server's counter tracks: their names and the points that set them. The host timeline
-// carries the same tracks under the same names (it is fed through a TraceSink), so a device
-// capture and a host replay of the same events line up track by track.
-//
-//   velmora.scene             special scene applied, its command id; 0 for none
-//   velmora.freq.<tag>        merged limit of a frequency tag, as the platform accepted it
-//   velmora.sched.<group>     current level of a scheduler group, as the platform accepted it
-//   velmora.probe.boosted     threads the probe worker holds boosted
+// The server's counter tracks: their names and the points that set them (docs/tracing.md lists
+// the tracks and their values). The host timeline carries the same tracks under the same names
+// (it is fed through a TraceSink), so a device capture and a host replay of the same events line
+// up track by track.
 //
 // Each point tests Trace::enabled() inline and does its work out of line, so a call site costs
 // one predicted branch while nobody traces. Callers may hold their own lock; the points take
