@@ -3,7 +3,7 @@
 #include "config/VelmoraLoadXml.h"
 #include "platform/VelmoraLog.h"
 #include "server/VelmoraServer.h"
-#include "trace/Trace.h"
+#include "trace/TraceSlice.h"
 
 using velmora::TraceSlice;
 

@@ -13,7 +13,7 @@
 #include "platform/VelmoraPlat.h"
 #include "sched/SchedLevelManager.h"
 #include "server/VelmoraServer.h"
-#include "trace/Trace.h"
+#include "trace/TraceSlice.h"
 
 using velmora::TraceSlice;
 

@@ -11,7 +11,7 @@
 #include "probe/ProbeHandler.h"
 #include "sched/SchedLevelManager.h"
 #include "server/VelmoraServer.h"
-#include "trace/Trace.h"
+#include "trace/TraceSlice.h"
 
 using namespace velmora;
 

@@ -2,8 +2,7 @@
 
 #include <cstdio>
 
-#include "freq/FreqTags.h"
-#include "sched/SchedLevelManager.h"
+#include "config/Tags.h"
 
 namespace velmora {
 
