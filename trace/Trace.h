@@ -31,6 +31,7 @@ public:
     // The power category: the one people enable to see why frequencies and power states change
     // ("atrace power freq sched", Perfetto's atrace_categories: "power"). The server is the
     // vendor's power and performance component, and its tracks explain exactly those changes.
+    // Not the hal category: that one switches on every hardware service's slices at once.
     static constexpr uint64_t kAtraceTag = ATRACE_TAG_POWER;
 
     // True while someone is tracing: atrace has the power tag on, or a sink of our own is
