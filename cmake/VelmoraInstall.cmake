@@ -8,7 +8,7 @@ include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)
 
 set(VELMORA_INSTALL_CMAKEDIR "${CMAKE_INSTALL_LIBDIR}/cmake/velmora")
-set(VELMORA_PUBLIC_HEADER_DIRS server config platform dump freq sched probe report compat host)
+set(VELMORA_PUBLIC_HEADER_DIRS server config platform dump freq sched probe report trace compat host)
 set(VELMORA_INSTALL_DATADIR "${CMAKE_INSTALL_DATADIR}/velmora")
 
 # Installed files find each other relative to their own place ($ORIGIN), so that an install

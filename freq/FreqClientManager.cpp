@@ -6,6 +6,7 @@
 #include "platform/PerfExecutor.h"
 #include "platform/VelmoraLog.h"
 #include "platform/VelmoraPlat.h"
+#include "trace/ServerTrace.h"
 
 namespace {
 
@@ -44,12 +45,15 @@ int valueOr0(const FreqClientManager::TagMap& map, int tag) {
     return it == map.end() ? 0 : it->second;
 }
 
-// Hands a merged configuration to the platform; both request paths log a refusal alike.
+// Hands a merged configuration to the platform; both request paths log a refusal alike, and
+// both trace what the platform accepted.
 int applyConfig(PerfExecutor* exec, int id, int count, const int* tags, const int* values) {
     const int ret = exec != nullptr ? exec->doPerfSetConfig(id, count, tags, values) : -1;
     if (ret != 0) {
         VLOGE("doPerfSetConfig failed!");
+        return ret;
     }
+    velmora::ServerTrace::freqLimits(count, tags, values);
     return ret;
 }
 

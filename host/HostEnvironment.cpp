@@ -8,6 +8,7 @@
 
 #include "host/HostProbeClock.h"
 #include "platform/VelmoraLog.h"
+#include "trace/Trace.h"
 
 namespace velmora {
 
@@ -33,10 +34,18 @@ HostEnvironment& HostEnvironment::get() {
 }
 
 HostEnvironment::HostEnvironment()
-    : mTimeline(mClock), mDevice(mNodeMap, mTimeline), mEventLog(mClock, mTimeline) {
+    : mTimeline(mClock),
+      mTraceSink(mClock, mTimeline),
+      mDevice(mNodeMap, mTimeline),
+      mEventLog(mClock, mTimeline) {
     mDevice.setRoot(defaultSimulatedRoot());
     // The probe workers of servers built from now on read time and wait through mClock.
     ProbeClock::setFactory(&HostProbeClock::create);
+    Trace::setSink(&mTraceSink);
+}
+
+HostEnvironment::~HostEnvironment() {
+    Trace::setSink(nullptr);
 }
 
 std::string HostEnvironment::defaultSimulatedRoot() {

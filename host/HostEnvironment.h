@@ -9,7 +9,8 @@
 //     env.eventLog().setPath("events.log");
 //
 // The parts are thread safe on their own. useDeviceRoot and nodeMap changes must happen while
-// no platform object exists.
+// no platform object exists. The server's trace tracks go to the timeline from the moment the
+// environment exists (it installs its trace sink on construction).
 #pragma once
 
 #include <string>
@@ -21,6 +22,7 @@
 #include "host/LaunchPolicyTable.h"
 #include "host/NodeMap.h"
 #include "host/Timeline.h"
+#include "host/TimelineTraceSink.h"
 
 namespace velmora {
 
@@ -50,10 +52,12 @@ public:
 
 private:
     HostEnvironment();
+    ~HostEnvironment();
 
     // Declaration order is construction order: the later parts refer to the earlier ones.
     HostClock mClock;
     Timeline mTimeline;
+    TimelineTraceSink mTraceSink;
     NodeMap mNodeMap;
     DeviceTree mDevice;
     HostProperties mProperties;

@@ -10,6 +10,7 @@ namespace {
 
 constexpr int kNodePid = 1;
 constexpr int kEventPid = 2;
+constexpr int kServerPid = 3;
 
 std::string jsonEscape(const std::string& in) {
     std::string out;
@@ -74,6 +75,8 @@ void Timeline::clear() {
     std::lock_guard<std::mutex> lock(mLock);
     mTracks.clear();
     mInstants.clear();
+    mCounters.clear();
+    mSlices.clear();
 }
 
 Timeline::Track* Timeline::findTrack(const std::string& key) {
@@ -111,6 +114,38 @@ void Timeline::recordInstant(const std::string& category, const std::string& nam
     const int64_t now = mClock.nowUs();
     std::lock_guard<std::mutex> lock(mLock);
     mInstants.push_back({now, category, name});
+}
+
+void Timeline::recordCounter(const std::string& track, int64_t value) {
+    const int64_t now = mClock.nowUs();
+    std::lock_guard<std::mutex> lock(mLock);
+    for (auto& counter : mCounters) {
+        if (counter.track == track) {
+            counter.samples.push_back({now, value});
+            return;
+        }
+    }
+    mCounters.push_back({track, {{now, value}}});
+}
+
+void Timeline::recordSlice(const std::string& name, int64_t beginUs, int64_t endUs, int tid) {
+    std::lock_guard<std::mutex> lock(mLock);
+    mSlices.push_back({beginUs, endUs, tid, name});
+}
+
+std::vector<Timeline::CounterSample> Timeline::counter(const std::string& track) const {
+    std::lock_guard<std::mutex> lock(mLock);
+    for (const auto& counter : mCounters) {
+        if (counter.track == track) {
+            return counter.samples;
+        }
+    }
+    return {};
+}
+
+std::vector<Timeline::Slice> Timeline::slices() const {
+    std::lock_guard<std::mutex> lock(mLock);
+    return mSlices;
 }
 
 std::vector<Timeline::NodeSummary> Timeline::summary() const {
@@ -170,7 +205,10 @@ std::string Timeline::chromeJson() const {
         "\"args\":{\"name\":\"device nodes\"}},\n";
     out +=
         "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":2,\"tid\":0,"
-        "\"args\":{\"name\":\"events\"}}";
+        "\"args\":{\"name\":\"events\"}},\n";
+    out +=
+        "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":3,\"tid\":0,"
+        "\"args\":{\"name\":\"velmora server\"}}";
     for (const auto& track : mTracks) {
         for (const auto& sample : track.samples) {
             double v = 0;
@@ -188,6 +226,22 @@ std::string Timeline::chromeJson() const {
                        ",\"tid\":0}";
             }
         }
+    }
+    // The server's tracks, named as on a device: counters and complete slices per thread.
+    for (const auto& counter : mCounters) {
+        for (const auto& sample : counter.samples) {
+            out += ",\n{\"name\":\"" + jsonEscape(counter.track) +
+                   "\",\"ph\":\"C\",\"ts\":" + std::to_string(sample.us) +
+                   ",\"pid\":" + std::to_string(kServerPid) +
+                   ",\"tid\":0,\"args\":{\"value\":" + std::to_string(sample.value) + "}}";
+        }
+    }
+    for (const auto& slice : mSlices) {
+        out += ",\n{\"name\":\"" + jsonEscape(slice.name) +
+               "\",\"ph\":\"X\",\"ts\":" + std::to_string(slice.beginUs) +
+               ",\"dur\":" + std::to_string(slice.endUs - slice.beginUs) +
+               ",\"pid\":" + std::to_string(kServerPid) + ",\"tid\":" + std::to_string(slice.tid) +
+               "}";
     }
     for (const auto& instant : mInstants) {
         out += ",\n{\"name\":\"" + jsonEscape(instant.name) + "\",\"cat\":\"" +

@@ -1,7 +1,9 @@
 // Records what the simulated or real device went through: every node write with its trace time,
-// and instant events (report lines of the device event log, scene changes, timed actions, host
-// calls of a replay). Produces the per-node summary and a timeline in Chrome's JSON trace format
-// (counter track per numeric node, instant events for the rest), which Perfetto's UI opens.
+// instant events (report lines of the device event log, scene changes, timed actions, host
+// calls of a replay), and the server's own trace tracks (counters and slices, under the names a
+// device capture shows them; fed by TimelineTraceSink). Produces the per-node summary and a
+// timeline in Chrome's JSON trace format (counter track per numeric node and per server counter,
+// complete events for server slices, instant events for the rest), which Perfetto's UI opens.
 //
 // Written by the device tree, the executor and the event log from any thread: thread safe.
 #pragma once
@@ -32,6 +34,16 @@ public:
         double min = 0;
         double max = 0;
     };
+    struct CounterSample {
+        int64_t us;
+        int64_t value;
+    };
+    struct Slice {
+        int64_t beginUs;
+        int64_t endUs;
+        int tid;
+        std::string name;
+    };
 
     explicit Timeline(HostClock& clock);
 
@@ -42,12 +54,18 @@ public:
     // A write that changed the node's value.
     void recordWrite(const std::string& key, const std::string& path, const std::string& text);
     void recordInstant(const std::string& category, const std::string& name);
+    // A server counter track took `value`; a server slice of thread `tid` ended.
+    void recordCounter(const std::string& track, int64_t value);
+    void recordSlice(const std::string& name, int64_t beginUs, int64_t endUs, int tid);
 
     // One entry per node seen, in order of first appearance.
     std::vector<NodeSummary> summary() const;
     std::vector<Instant> instants(const std::string& category) const;
     // Number of changing writes recorded for `key`.
     int changes(const std::string& key) const;
+    // The values server counter `track` took, in order; its slices in order of their end.
+    std::vector<CounterSample> counter(const std::string& track) const;
+    std::vector<Slice> slices() const;
 
     std::string chromeJson() const;
     // Writes chromeJson() to `path`. False (with `error` set) when the file cannot be written.
@@ -66,10 +84,17 @@ private:
 
     Track* findTrack(const std::string& key);
 
+    struct Counter {
+        std::string track;
+        std::vector<CounterSample> samples;
+    };
+
     HostClock& mClock;
-    mutable std::mutex mLock;  // guards mTracks and mInstants
+    mutable std::mutex mLock;  // guards everything below
     std::vector<Track> mTracks;
     std::vector<Instant> mInstants;
+    std::vector<Counter> mCounters;
+    std::vector<Slice> mSlices;
 };
 
 // Parses `text` as a number (integer or decimal). False for anything else.

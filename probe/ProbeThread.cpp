@@ -4,6 +4,7 @@
 #include "platform/PerfExecutor.h"
 #include "platform/VelmoraLog.h"
 #include "platform/VelmoraPlat.h"
+#include "trace/ServerTrace.h"
 
 using android::Mutex;
 using android::sp;
@@ -36,6 +37,23 @@ bool markWithdrawn(ProbeHandler::ProbeThread::ProbeQueue& queue, uint32_t tid) {
     item->timestamp = 0;
     queue.replaceValueFor(tid, item);
     return true;
+}
+
+// Traces how many threads the boosted queue holds live. Thread 0 is left out: it is never
+// boosted on the platform. Counted afresh rather than kept, so the figure cannot drift from the
+// queue; only when tracing, and the queue is small.
+void traceBoostedCount(const ProbeHandler::ProbeThread::ProbeQueue& boosted) {
+    if (!velmora::Trace::enabled()) {
+        return;
+    }
+    int64_t live = 0;
+    for (size_t i = 0; i < boosted.size(); ++i) {
+        const ProbeHandler::ProbeThread::ProbeItem& item = *boosted.valueAt(i);
+        if (item.timestamp != 0 && item.tid != 0) {
+            ++live;
+        }
+    }
+    velmora::Trace::counter(velmora::ServerTrace::kProbeBoostedTrack, live);
 }
 
 }  // namespace
@@ -100,6 +118,7 @@ void ProbeHandler::ProbeThread::addItemToBoostedQueue(uint32_t tid) {
 
 void ProbeHandler::ProbeThread::addItemToBoostedQueueLocked(uint32_t tid) {
     mBoostedQueue.replaceValueFor(tid, new ProbeItem(tid, mClock->now()));
+    traceBoostedCount(mBoostedQueue);
 }
 
 void ProbeHandler::ProbeThread::moveItemFromWaitQueueToBoosted(uint32_t tid) {
@@ -111,6 +130,7 @@ void ProbeHandler::ProbeThread::moveItemToUnboostQueue(uint32_t tid) {
     markWithdrawn(mWaitQueue, tid);
     if (markWithdrawn(mBoostedQueue, tid)) {
         handleUnboostItem(tid);
+        traceBoostedCount(mBoostedQueue);
     }
     mClock->signal(mCond);
 }

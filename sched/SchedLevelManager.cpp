@@ -9,6 +9,7 @@
 #include "platform/VelmoraLog.h"
 #include "platform/VelmoraPlat.h"
 #include "sched/EasGroupPrinter.h"
+#include "trace/ServerTrace.h"
 
 using velmora::kCmdDefaultSchedLevel;
 using velmora::kCmdZolaFollower;
@@ -309,7 +310,10 @@ int SchedLevelManager::updateCurrentSchedlevel() {
     const int ret = executor != nullptr ? executor->doSchedLevelAction(count, groups, levels) : -1;
     if (ret != 0) {
         VLOGD("doSchedLevelAction failed!");
+        return ret;
     }
+    // Only accepted levels: a refused hand-over is rolled back by the caller.
+    velmora::ServerTrace::schedLevels(count, groups, levels);
     return ret;
 }
 

@@ -13,6 +13,9 @@
 #include "platform/VelmoraPlat.h"
 #include "sched/SchedLevelManager.h"
 #include "server/VelmoraServer.h"
+#include "trace/TraceSlice.h"
+
+using velmora::TraceSlice;
 
 namespace {
 
@@ -63,6 +66,7 @@ void writeReply(int fd, const char* text, size_t length) {
 }  // namespace
 
 int VelmoraServer::velmoraSetConfig(int clientId, int tagLen, const int* tags, const int* configs) {
+    const TraceSlice slice("velmoraSetConfig", "clientId", clientId);
     if (!mInitialized) {
         return 1;
     }
@@ -126,6 +130,7 @@ int VelmoraServer::velmoraGetConfig(int tagLen, const int* tags, int* configs) {
 }
 
 void VelmoraServer::dumpVelmoraServerInfo(int fd, const std::vector<std::string>& args) {
+    const TraceSlice slice("dumpVelmoraServerInfo");
     if (fd < 0) {
         VLOGW("invalid dump FD, %d\n", fd);
         return;

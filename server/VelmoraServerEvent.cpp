@@ -11,6 +11,7 @@
 #include "probe/ProbeHandler.h"
 #include "sched/SchedLevelManager.h"
 #include "server/VelmoraServer.h"
+#include "trace/TraceSlice.h"
 
 using namespace velmora;
 
@@ -99,6 +100,7 @@ int VelmoraServer::doNotificationEvent(int cmdId, unsigned int payloadNum, const
 
 int VelmoraServer::velmoraEvent(int cmdId, const char* msg, unsigned int payloadNum,
                                 const int* payload) {
+    const TraceSlice slice("velmoraEvent", "cmdId", cmdId);
     const int enable = isVelmoraEnable(cmdId, payload);
     if (enable != 0) {
         return enable;

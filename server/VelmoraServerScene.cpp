@@ -1,13 +1,15 @@
 // Special scenes: several may be on, the one with the highest priority is applied. The scene
 // state changes under mMutex; the platform is called only after it has been released, so two
 // concurrent switches may reach the platform in either order. State is not rolled back when
-// the platform fails.
+// the platform fails. The applied scene is traced while mMutex is still held, so that the trace
+// track follows the state in the order it changed (a trace point takes no lock of its own).
 #include "config/Action.h"
 #include "config/CommandIds.h"
 #include "platform/PerfExecutor.h"
 #include "platform/VelmoraLog.h"
 #include "platform/VelmoraPlat.h"
 #include "server/VelmoraServer.h"
+#include "trace/ServerTrace.h"
 
 using namespace velmora;
 
@@ -30,6 +32,7 @@ int VelmoraServer::doSpecialSceneEvent(int cmdId, unsigned int payloadNum, const
             mOnEventSet.clear();
             previous = mCurSpecialCmdId;
             mCurSpecialCmdId = 0;
+            ServerTrace::scene(0);
         }
         return doSpecialAction(previous, kWithdraw);
     }
@@ -57,6 +60,7 @@ int VelmoraServer::doSpecialSceneEvent(int cmdId, unsigned int payloadNum, const
         }
         const int previous = mCurSpecialCmdId;
         mCurSpecialCmdId = cmdId;
+        ServerTrace::scene(cmdId);
         mMutex.unlock();
         if (previous == 0) {
             return doSpecialAction(cmdId, kApply);
@@ -77,6 +81,7 @@ int VelmoraServer::doSpecialSceneEvent(int cmdId, unsigned int payloadNum, const
     }
     const int next = getCmdIdWithMaxPrio(false);
     mCurSpecialCmdId = next;
+    ServerTrace::scene(next);
     mMutex.unlock();
     if (next == 0) {
         return doSpecialAction(cmdId, kWithdraw);

@@ -152,6 +152,26 @@ TEST_F(ReplayEndToEndTest, TimelineIsChromeJsonWithTheExpectedTracks) {
     EXPECT_NE(std::string::npos, json.find("\"name\":\"cpu.big.governor=performance\""));
 }
 
+// The server's own tracks, under the names and with the values a device capture shows.
+TEST_F(ReplayEndToEndTest, ServerTracksAreNamedAsOnTheDevice) {
+    const Timeline& timeline = HostEnvironment::get().timeline();
+    std::vector<int64_t> scenes;
+    for (const auto& sample : timeline.counter("velmora.scene"))
+        scenes.push_back(sample.value);
+    EXPECT_EQ((std::vector<int64_t>{4118, 0, 4119, 4224, 4230, 0}), scenes);
+    EXPECT_FALSE(timeline.counter("velmora.sched.top_app").empty());
+    std::vector<std::string> names;
+    for (const auto& slice : timeline.slices())
+        names.push_back(slice.name);
+    for (const char* name :
+         {"velmoraEvent cmdId=4119", "velmoraSetConfig clientId=1", "dumpVelmoraServerInfo"}) {
+        EXPECT_NE(names.end(), std::find(names.begin(), names.end(), name)) << name;
+    }
+    const std::string json = hosttest::readFile(*sDir + "/timeline.json");
+    EXPECT_NE(std::string::npos, json.find("{\"name\":\"velmora.scene\",\"ph\":\"C\""));
+    EXPECT_NE(std::string::npos, json.find("{\"name\":\"velmoraEvent cmdId=4119\",\"ph\":\"X\""));
+}
+
 TEST(ReplaySessionTest, BadTraceOrMissingConfigurationStopsBeforeAnyCall) {
     const std::string dir = hosttest::makeScratchDir("badtrace");
     hosttest::writeFile(dir + "/t.trace", "event 4099 0\n@100 setconfig 1 2=x\n");

@@ -1,0 +1,199 @@
+// What the server traces: the slice of each host entry point, and the counter tracks of the
+// applied scene, the merged frequency limits, the scheduler-group levels and the probe boosts,
+// as a recording trace sink receives them.
+#include <functional>
+#include <string>
+#include <vector>
+
+#include "tests/fakes/RecordingTraceSink.h"
+#include "tests/fakes/ServerTest.h"
+#include "trace/Trace.h"
+
+namespace velmora {
+namespace fake {
+namespace {
+
+using Ints = std::vector<int>;
+using Values = std::vector<int64_t>;
+using Names = std::vector<std::string>;
+using std::chrono::milliseconds;
+
+constexpr int kOn = 0;
+constexpr int kOff = -1;
+// The probe worker's boost delay and lifetime, and how late it may be on a loaded machine.
+constexpr milliseconds kBoostDelay{8};
+constexpr milliseconds kBoostLifetime{256};
+constexpr milliseconds kTolerance{250};
+
+const char* const kTraceCommands =
+    "<cmd id=\"4118\" name=\"scene_4118\"><act><duration>0</duration></act></cmd>"
+    "<cmd id=\"4119\" name=\"scene_4119\"><act><duration>0</duration></act></cmd>"
+    "<cmd id=\"12288\" name=\"little_cap\"><act><duration>0</duration>"
+    "<t2>1500000</t2></act></cmd>"
+    "<cmd id=\"4500\" name=\"top_app_up\"><act><duration>0</duration><t53>30</t53></act></cmd>";
+
+class ServerTraceTest : public ServerTest {
+protected:
+    void SetUp() override {
+        ServerTest::SetUp();
+        Trace::setSink(&mSink);
+        ASSERT_EQ(startServer(kTraceCommands), 0);
+        mSink.clear();
+    }
+    void TearDown() override {
+        ServerTest::TearDown();  // stops the probe worker before the sink goes
+        Trace::setSink(nullptr);
+    }
+
+    RecordingTraceSink mSink;
+};
+
+void event(VelmoraServer& server, int cmdId, int word) {
+    server.velmoraEvent(cmdId, "", 1, &word);
+}
+
+void setConfig(VelmoraServer& server, int clientId, Ints tags, Ints configs) {
+    server.velmoraSetConfig(clientId, static_cast<int>(tags.size()), tags.data(), configs.data());
+}
+
+struct SliceCase {
+    const char* label;
+    std::function<void(VelmoraServer&)> call;
+    Names slices;
+};
+
+class EntryPointSliceTest : public ServerTraceTest,
+                            public ::testing::WithParamInterface<SliceCase> {};
+
+TEST_P(EntryPointSliceTest, EachEntryPointIsOneSliceNamedWithItsId) {
+    GetParam().call(*mServer);
+    EXPECT_EQ(mSink.slices(), GetParam().slices);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Calls, EntryPointSliceTest,
+    ::testing::Values(
+        // Traced even when the command is unknown and the host gets 2 back.
+        SliceCase{"event",
+                  [](VelmoraServer& s) { event(s, 4097, kOn); },
+                  {"velmoraEvent cmdId=4097", "<end>"}},
+        SliceCase{"client",
+                  [](VelmoraServer& s) { setConfig(s, 2, {2}, {1200000}); },
+                  {"velmoraSetConfig clientId=2", "<end>"}},
+        SliceCase{"dump",
+                  [](VelmoraServer& s) {
+                      s.dumpVelmoraServerInfo(-1, {"--help"});  // refused, still traced
+                  },
+                  {"dumpVelmoraServerInfo", "<end>"}},
+        SliceCase{"reload",
+                  [](VelmoraServer& s) { s.velmoraEvent(20230, "", 0, nullptr); },
+                  {"velmoraEvent cmdId=20230", "reload", "<end>", "<end>"}},
+        // The notification hands its word on as a feature-switch request of client 0.
+        SliceCase{"notification",
+                  [](VelmoraServer& s) { event(s, 20225, 0); },
+                  {"velmoraEvent cmdId=20225", "velmoraSetConfig clientId=0", "<end>", "<end>"}}),
+    [](const ::testing::TestParamInfo<SliceCase>& info) { return info.param.label; });
+
+struct CounterCase {
+    const char* label;
+    Op refusingOp;  // the platform refuses this operation when `refused`
+    bool refused;
+    std::function<void(VelmoraServer&)> calls;
+    const char* track;
+    Values values;
+};
+
+class CounterTrackTest : public ServerTraceTest,
+                         public ::testing::WithParamInterface<CounterCase> {};
+
+TEST_P(CounterTrackTest, TrackFollowsWhatThePlatformAccepted) {
+    if (GetParam().refused) {
+        executor().setResult(GetParam().refusingOp, 1);
+    }
+    GetParam().calls(*mServer);
+    EXPECT_EQ(mSink.counter(GetParam().track), GetParam().values);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Decisions, CounterTrackTest,
+    ::testing::Values(
+        // 4119 outranks 4118: the track shows the applied scene, not the last one switched.
+        CounterCase{"scene_switch",
+                    Op::DoAction,
+                    false,
+                    [](VelmoraServer& s) {
+                        event(s, 4118, kOn);
+                        event(s, 4119, kOn);
+                        event(s, 4118, kOff);
+                        event(s, 4119, kOff);
+                    },
+                    "velmora.scene",
+                    {4118, 4119, 0}},
+        CounterCase{"client_restart",
+                    Op::DoAction,
+                    false,
+                    [](VelmoraServer& s) {
+                        event(s, 4118, kOn);
+                        s.velmoraEvent(20224, "", 0, nullptr);
+                    },
+                    "velmora.scene",
+                    {4118, 0}},
+        // The merged cap, lowest of the clients: JN's 1.2 GHz under KX's 1.5, then KX's again.
+        CounterCase{"client_cap",
+                    Op::SetConfig,
+                    false,
+                    [](VelmoraServer& s) {
+                        setConfig(s, 1, {2}, {1500000});
+                        setConfig(s, 2, {2}, {1200000});
+                        setConfig(s, 2, {2}, {0});
+                    },
+                    "velmora.freq.little_cpu_max",
+                    {1500000, 1200000, 1500000}},
+        CounterCase{"event_cap",
+                    Op::SetConfig,
+                    false,
+                    [](VelmoraServer& s) { event(s, 12288, kOn); },
+                    "velmora.freq.little_cpu_max",
+                    {1500000}},
+        CounterCase{"refused_cap",
+                    Op::SetConfig,
+                    true,
+                    [](VelmoraServer& s) { setConfig(s, 1, {2}, {1500000}); },
+                    "velmora.freq.little_cpu_max",
+                    {}},
+        CounterCase{"level_event",
+                    Op::SchedLevel,
+                    false,
+                    [](VelmoraServer& s) { s.velmoraEvent(4500, "", 0, nullptr); },
+                    "velmora.sched.top_app",
+                    {30}},
+        // Packed client level: group 3 (top app) in the high half, level -10 + 20 in the low.
+        CounterCase{"client_level",
+                    Op::SchedLevel,
+                    false,
+                    [](VelmoraServer& s) { setConfig(s, 1, {42}, {(3 << 16) | 10}); },
+                    "velmora.sched.top_app",
+                    {-10}},
+        CounterCase{"refused_level",
+                    Op::SchedLevel,
+                    true,
+                    [](VelmoraServer& s) { s.velmoraEvent(4500, "", 0, nullptr); },
+                    "velmora.sched.top_app",
+                    {}}),
+    [](const ::testing::TestParamInfo<CounterCase>& info) { return info.param.label; });
+
+TEST_F(ServerTraceTest, ProbeTrackCountsBoostsUntilWithdrawnOrExpired) {
+    const auto probe = [this](const char* msg, int state) {
+        mServer->velmoraEvent(4116, msg, 1, &state);
+    };
+    probe("pid=12|tid=34", kOn);
+    probe("pid=12|tid=35", kOn);
+    ASSERT_TRUE(mSink.waitForCounter("velmora.probe.boosted", 2, kBoostDelay + kTolerance));
+    probe("pid=12|tid=35", kOff);
+    ASSERT_TRUE(mSink.waitForCounter("velmora.probe.boosted", 0, kBoostLifetime + kTolerance));
+    EXPECT_EQ(mSink.counter("velmora.probe.boosted"), (Values{1, 2, 1, 0}));
+}
+
+}  // namespace
+}  // namespace fake
+}  // namespace velmora
