@@ -179,6 +179,9 @@ void BM_FastReplayHour(benchmark::State& state) {
         options.deviceRoot = gScratch + "/replay";
         options.timelinePath = gScratch + "/timeline.json";
         options.eventLogPath = gScratch + "/events.log";
+        // Argument 1: with the replay's analysis (holders, residency, spans), as velmora-replay
+        // runs; 0: without it, the floor the analysis is measured against.
+        options.insight = state.range(0) != 0;
         velmora::ReplaySession session(options, sink, sink);
         const auto start = Clock::now();
         if (session.run() != velmora::ReplaySession::kOk) {
@@ -192,7 +195,12 @@ void BM_FastReplayHour(benchmark::State& state) {
     }
     fclose(sink);
 }
-BENCHMARK(BM_FastReplayHour)->Iterations(1)->UseManualTime()->Unit(benchmark::kMillisecond);
+BENCHMARK(BM_FastReplayHour)
+    ->Arg(0)
+    ->Arg(1)
+    ->Iterations(1)
+    ->UseManualTime()
+    ->Unit(benchmark::kMillisecond);
 
 void BM_ParseHourFloor(benchmark::State& state) {
     const std::string trace = hourTrace();

@@ -108,8 +108,14 @@ int HostExecutor::doAction(const Action* action, unsigned int payloadNum, const 
         const int ret = mResolver.clearSource(source);
         if (mApplied.erase(cmdId) != 0) {
             mTimeline.recordInstant(category, describe(*action) + " off");
+            if (mObserver != nullptr)
+                mObserver->onCommandWithdrawn(cmdId, /*expired=*/false);
         }
         return ret;
+    }
+    if (mObserver != nullptr) {
+        // Before the nodes change, so that their new holder is known by name.
+        mObserver->onCommandApplied(cmdId, category, action->mName, timed ? action->mDuration : 0);
     }
     const int ret = mResolver.replaceSource(source, requestsOf(*action));
     if (timed) {
@@ -125,10 +131,10 @@ int HostExecutor::doAction(const Action* action, unsigned int payloadNum, const 
 
 int HostExecutor::doProbeAction(const Action& action, bool withdraw) {
     const std::string tid = std::to_string(mProbeTid);
-    if (withdraw) {
-        mBoosted.erase(mProbeTid);
-    } else {
-        mBoosted.insert(mProbeTid);
+    const bool changed =
+        withdraw ? mBoosted.erase(mProbeTid) != 0 : mBoosted.insert(mProbeTid).second;
+    if (changed && mObserver != nullptr) {
+        mObserver->onProbeBoost(mProbeTid, !withdraw);
     }
     if (mBoosted.empty()) {
         return mResolver.clearSource(kProbeSource);
@@ -143,6 +149,9 @@ void HostExecutor::onExpire(int cmdId) {
     std::lock_guard<std::mutex> lock(mLock);
     if (mTimers.armed(cmdId)) {
         return;  // re-armed after it fell due: the fresh application stays
+    }
+    if (mObserver != nullptr && mApplied.count(cmdId) != 0) {
+        mObserver->onCommandWithdrawn(cmdId, /*expired=*/true);
     }
     mResolver.clearSource("cmd:" + std::to_string(cmdId));
     if (mApplied.erase(cmdId) != 0) {
@@ -166,6 +175,9 @@ int HostExecutor::doPerfSetConfig(int id, int count, const int* tags, const int*
         // Merged values: 0 releases a limit (fork-on-big excepted, where 0 is a setting),
         // -1 was never set.
         const bool release = values[i] < 0 || (values[i] == 0 && tags[i] != kForkOnBigTag);
+        if (mObserver != nullptr) {
+            mObserver->onFreqConfig(id, key, release ? 0 : values[i]);
+        }
         ret |= release ? mResolver.clear(key, kFreqSource)
                        : mResolver.set(key, kFreqSource, std::to_string(values[i]));
     }
@@ -215,6 +227,12 @@ int HostExecutor::setProbeTid(unsigned int tid, int state) {
     std::lock_guard<std::mutex> lock(mLock);
     mProbeTid = tid;
     return 0;
+}
+
+void HostExecutor::setObserver(ExecutorObserver* observer) {
+    std::lock_guard<std::mutex> lock(mLock);
+    mObserver = observer;
+    mResolver.setObserver(observer);
 }
 
 bool HostExecutor::timedActionPending(int cmdId) const {

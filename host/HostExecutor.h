@@ -22,6 +22,7 @@
 #include <string>
 
 #include "host/DeviceTree.h"
+#include "host/ExecutorObserver.h"
 #include "host/HostClock.h"
 #include "host/NodeMap.h"
 #include "host/NodeResolver.h"
@@ -51,6 +52,9 @@ public:
     bool timedActionPending(int cmdId) const;
     // Number of threads holding a probe boost.
     size_t boostedThreads() const;
+    // Tells `observer` (null: nobody) about every request from now on; it must outlive the
+    // executor or be unset first.
+    void setObserver(ExecutorObserver* observer);
 
 private:
     // The node requests an action makes; logs pairs without a node. REQUIRES: mLock held.
@@ -66,6 +70,7 @@ private:
     unsigned int mProbeTid = 0;
     std::set<unsigned int> mBoosted;
     std::set<int> mApplied;  // commands whose action is applied
+    ExecutorObserver* mObserver = nullptr;
     // Last: its worker calls onExpire, which needs every member above.
     TimedActionScheduler mTimers;
 };

@@ -116,16 +116,30 @@ int NodeResolver::resolve(const std::string& key) {
     }
     const auto& requests = mRequests[key];
     std::string value = base;
+    const std::string* holder = nullptr;  // source whose request is in force; none: the baseline
     if (spec->kind == NodeKind::Floor || spec->kind == NodeKind::Cap) {
+        const bool floor = spec->kind == NodeKind::Floor;
         long long best = strtoll(base.c_str(), nullptr, 10);
+        long long held = 0;
+        uint64_t heldSeq = 0;
         for (const auto& entry : requests) {
             const long long v = strtoll(entry.second.value.c_str(), nullptr, 10);
             if (spec->kind == NodeKind::Cap && v <= 0) {
                 continue;  // 0 is "no limit", never a cap of zero
             }
-            if (spec->kind == NodeKind::Floor ? v > best : v < best) {
+            if (floor ? v > best : v < best) {
                 best = v;
             }
+            // The winning request; among equal ones the latest, which replaced the others.
+            if (holder == nullptr || (floor ? v > held : v < held) ||
+                (v == held && entry.second.seq > heldSeq)) {
+                holder = &entry.first;
+                held = v;
+                heldSeq = entry.second.seq;
+            }
+        }
+        if (holder != nullptr && held != best) {
+            holder = nullptr;  // the baseline is beyond every request
         }
         value = std::to_string(best);
     } else {
@@ -134,8 +148,12 @@ int NodeResolver::resolve(const std::string& key) {
             if (entry.second.seq > latest) {
                 latest = entry.second.seq;
                 value = entry.second.value;
+                holder = &entry.first;
             }
         }
+    }
+    if (mObserver != nullptr) {
+        mObserver->onNodeResolved(key, value, holder != nullptr ? *holder : std::string());
     }
     return mTree.write(key, value);
 }

@@ -19,6 +19,7 @@
 #include <vector>
 
 #include "host/DeviceTree.h"
+#include "host/ExecutorObserver.h"
 #include "host/NodeMap.h"
 #include "host/Timeline.h"
 
@@ -42,6 +43,8 @@ public:
     int clearSource(const std::string& source);
     // Sources holding a request for `key`, for the dump.
     std::vector<std::string> sources(const std::string& key) const;
+    // Told about every resolution and the source holding the result; null for none.
+    void setObserver(ExecutorObserver* observer) { mObserver = observer; }
 
 private:
     struct Request {
@@ -60,6 +63,7 @@ private:
     std::map<std::string, std::map<std::string, Request>> mRequests;  // key -> source -> request
     std::map<std::string, std::vector<std::string>> mSourceKeys;      // source -> its keys
     uint64_t mSeq = 0;
+    ExecutorObserver* mObserver = nullptr;
 };
 
 }  // namespace velmora

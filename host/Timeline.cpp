@@ -77,6 +77,19 @@ void Timeline::clear() {
     mInstants.clear();
     mCounters.clear();
     mSlices.clear();
+    mSpans.clear();
+    mCounterSource = nullptr;
+}
+
+void Timeline::recordSpan(const std::string& track, const std::string& category,
+                          const std::string& name, int64_t beginUs, int64_t endUs) {
+    std::lock_guard<std::mutex> lock(mLock);
+    mSpans.push_back({track, category, name, beginUs, endUs});
+}
+
+void Timeline::setCounterSource(CounterSource source) {
+    std::lock_guard<std::mutex> lock(mLock);
+    mCounterSource = std::move(source);
 }
 
 Timeline::Track* Timeline::findTrack(const std::string& key) {
@@ -210,12 +223,17 @@ std::string Timeline::chromeJson() const {
         "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":3,\"tid\":0,"
         "\"args\":{\"name\":\"velmora server\"}}";
     for (const auto& track : mTracks) {
-        for (const auto& sample : track.samples) {
+        for (size_t i = 0; i < track.samples.size(); ++i) {
+            const Sample& sample = track.samples[i];
             double v = 0;
             out += ",\n";
             if (parseNodeNumber(sample.text, &v)) {
-                out += "{\"name\":\"" + jsonEscape(track.key) +
-                       "\",\"ph\":\"C\",\"ts\":" + std::to_string(sample.us) +
+                // The holder rides in the category: counter args must all be numbers.
+                const std::string source =
+                    mCounterSource ? mCounterSource(track.key, i) : std::string();
+                out += "{\"name\":\"" + jsonEscape(track.key) + "\",\"ph\":\"C\"" +
+                       (source.empty() ? "" : ",\"cat\":\"" + jsonEscape(source) + "\"") +
+                       ",\"ts\":" + std::to_string(sample.us) +
                        ",\"pid\":" + std::to_string(kNodePid) +
                        ",\"tid\":0,\"args\":{\"value\":" + formatNumber(v) + "}}";
             } else {
@@ -248,6 +266,25 @@ std::string Timeline::chromeJson() const {
                jsonEscape(instant.category) +
                "\",\"ph\":\"i\",\"s\":\"g\",\"ts\":" + std::to_string(instant.us) +
                ",\"pid\":" + std::to_string(kEventPid) + ",\"tid\":0}";
+    }
+    // Spans: one named thread of the "events" process per track, tid 0 keeps the instants.
+    std::vector<std::string> spanTracks;
+    for (const auto& span : mSpans) {
+        size_t tid = 1;
+        while (tid <= spanTracks.size() && spanTracks[tid - 1] != span.track)
+            ++tid;
+        if (tid > spanTracks.size()) {
+            spanTracks.push_back(span.track);
+            out +=
+                ",\n{\"name\":\"thread_name\",\"ph\":\"M\",\"pid\":" + std::to_string(kEventPid) +
+                ",\"tid\":" + std::to_string(tid) + ",\"args\":{\"name\":\"" +
+                jsonEscape(span.track) + "\"}}";
+        }
+        out += ",\n{\"name\":\"" + jsonEscape(span.name) + "\",\"cat\":\"" +
+               jsonEscape(span.category) +
+               "\",\"ph\":\"X\",\"ts\":" + std::to_string(span.beginUs) +
+               ",\"dur\":" + std::to_string(span.endUs - span.beginUs) +
+               ",\"pid\":" + std::to_string(kEventPid) + ",\"tid\":" + std::to_string(tid) + "}";
     }
     out += "\n]}\n";
     return out;

@@ -9,6 +9,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <mutex>
 #include <string>
 #include <vector>
@@ -67,6 +68,17 @@ public:
     std::vector<CounterSample> counter(const std::string& track) const;
     std::vector<Slice> slices() const;
 
+    // A span of something that stayed applied (a scene, an on/off command, a timed action, a
+    // probe boost), drawn as a slice on the named track of the "events" process. Spans of one
+    // track must nest.
+    void recordSpan(const std::string& track, const std::string& category, const std::string& name,
+                    int64_t beginUs, int64_t endUs);
+    // Names the source that held a node's value in the sample-th sample of its track (0: the
+    // initial value, then one per change); counter samples carry it as their category. Unset:
+    // counters carry none.
+    using CounterSource = std::function<std::string(const std::string& key, size_t sample)>;
+    void setCounterSource(CounterSource source);
+
     std::string chromeJson() const;
     // Writes chromeJson() to `path`. False (with `error` set) when the file cannot be written.
     bool writeChromeJson(const std::string& path, std::string* error) const;
@@ -88,6 +100,13 @@ private:
         std::string track;
         std::vector<CounterSample> samples;
     };
+    struct Span {
+        std::string track;
+        std::string category;
+        std::string name;
+        int64_t beginUs;
+        int64_t endUs;
+    };
 
     HostClock& mClock;
     mutable std::mutex mLock;  // guards everything below
@@ -95,6 +114,8 @@ private:
     std::vector<Instant> mInstants;
     std::vector<Counter> mCounters;
     std::vector<Slice> mSlices;
+    std::vector<Span> mSpans;
+    CounterSource mCounterSource;
 };
 
 // Parses `text` as a number (integer or decimal). False for anything else.

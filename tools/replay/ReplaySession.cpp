@@ -1,7 +1,9 @@
 #include "tools/replay/ReplaySession.h"
 
 #include <pthread.h>
+#include <unistd.h>
 
+#include <memory>
 #include <set>
 #include <sstream>
 
@@ -13,6 +15,10 @@
 #include "host/profile/DeviceProfile.h"
 #include "platform/VelmoraPlat.h"
 #include "server/VelmoraServer.h"
+#include "tools/insight/HtmlReport.h"
+#include "tools/insight/InsightJson.h"
+#include "tools/insight/InsightSummary.h"
+#include "tools/insight/ReplayInsight.h"
 #include "tools/replay/ProgressLine.h"
 
 namespace velmora {
@@ -94,13 +100,21 @@ int ReplaySession::setUp() {
         fprintf(mErr, "velmora-replay: cannot write %s\n", mOptions.eventLogPath.c_str());
         return kSetupFailed;
     }
+    if (mOptions.insight) {
+        mInsight.reset(new ReplayInsight(env.clock(), env.nodeMap(),
+                                         [this](int cmdId) { return commandName(cmdId); }));
+    }
     // Every node gets its initial value on the timeline, also the ones nothing will touch.
     for (const auto& node : env.nodeMap().nodes()) {
         std::string text;
-        env.device().read(node.key, &text);
+        if (env.device().read(node.key, &text) && mInsight != nullptr)
+            mInsight->setInitial(node.key, text);
     }
     mServer.reset(new VelmoraServer());
     const int status = mServer->init();
+    if (auto* plat = dynamic_cast<HostPlatform*>(mServer->mPlatPtr); plat && mInsight) {
+        plat->executor()->setObserver(mInsight.get());
+    }
     fprintf(mOut, "init -> %d (device %s)\n", status, root.c_str());
     // 4 means the probe command is missing; everything else is running.
     if (status != 0 && status != 4) {
@@ -124,7 +138,50 @@ void ReplaySession::echo(const TraceCall& call, const std::string& result) {
     fflush(mOut);
 }
 
+std::string ReplaySession::commandName(int cmdId) const {
+    auto cached = mNames.find(cmdId);
+    if (cached != mNames.end())
+        return cached->second;
+    VelmoraParser* parser = mServer != nullptr && mServer->mPlatPtr != nullptr
+                                ? mServer->mPlatPtr->mParserPtr
+                                : nullptr;
+    if (parser == nullptr)
+        return "";
+    Action action;
+    pthread_rwlock_rdlock(&parser->mRwLock);
+    const int ret = parser->doParseLocked(cmdId, &action);
+    pthread_rwlock_unlock(&parser->mRwLock);
+    return mNames[cmdId] = ret == 0 ? action.mName : "";
+}
+
 int ReplaySession::perform(const TraceCall& call) {
+    CallRecord record;
+    record.kind = call.kind == TraceCall::Kind::Event       ? CallRecord::Kind::Event
+                  : call.kind == TraceCall::Kind::SetConfig ? CallRecord::Kind::SetConfig
+                                                            : CallRecord::Kind::Other;
+    record.id = call.id;
+    if (record.kind == CallRecord::Kind::Event) {
+        record.payload = call.payload;
+        record.msg = call.text;
+    } else if (record.kind == CallRecord::Kind::SetConfig) {
+        record.tags = call.tags;
+        record.values = call.values;
+    }
+    record.where = call.file + ":" + std::to_string(call.line);
+    record.text = call.source;
+    record.atUs = call.atMs >= 0 ? call.atMs * 1000 : -1;
+    if (call.kind == TraceCall::Kind::Reload)
+        mNames.clear();  // names may change with the configuration
+    // Begun before the clock moves, so that what falls due on the way belongs to this call.
+    if (mInsight != nullptr)
+        mInsight->beginCall(std::move(record));
+    const int status = performCall(call);
+    if (mInsight != nullptr)
+        mInsight->endCall(status);
+    return status;
+}
+
+int ReplaySession::performCall(const TraceCall& call) {
     HostEnvironment& env = HostEnvironment::get();
     // In virtual time this also lets the probe worker finish what the last call gave it, so a
     // line without a time runs after it, as it would a moment later on a device.
@@ -283,10 +340,71 @@ void ReplaySession::tearDown() {
     if (mServer == nullptr)
         return;
     waitForProbeBoosts();
+    if (auto* plat = dynamic_cast<HostPlatform*>(mServer->mPlatPtr)) {
+        plat->executor()->setObserver(nullptr);
+    }
     mServer.reset();
 }
 
+void ReplaySession::finishInsight() {
+    if (mInsight == nullptr)
+        return;
+    mResult = mInsight->finish();
+    if (auto* plat = mServer != nullptr ? dynamic_cast<HostPlatform*>(mServer->mPlatPtr) : nullptr)
+        plat->executor()->setObserver(nullptr);
+    mInsight.reset();
+    Timeline& timeline = HostEnvironment::get().timeline();
+    for (const auto& span : mResult.spans) {
+        timeline.recordSpan(span.track, span.category, span.name, span.beginUs, span.endUs);
+    }
+    auto holders = std::make_shared<std::map<std::string, std::vector<std::string>>>(
+        ReplayInsight::holdersByChange(mResult));
+    timeline.setCounterSource([holders](const std::string& key, size_t sample) {
+        auto it = holders->find(key);
+        return it != holders->end() && sample < it->second.size() ? it->second[sample]
+                                                                  : std::string();
+    });
+}
+
+bool ReplaySession::checkWritable(const std::string& path, std::string* error) {
+    const bool existed = access(path.c_str(), F_OK) == 0;
+    FILE* file = fopen(path.c_str(), "a");
+    if (file == nullptr) {
+        *error = "cannot write " + path;
+        return false;
+    }
+    fclose(file);
+    if (!existed)
+        unlink(path.c_str());
+    return true;
+}
+
+int ReplaySession::writeOutputs() {
+    if (!mOptions.writeFiles)
+        return kOk;
+    HostEnvironment& env = HostEnvironment::get();
+    std::string error;
+    if (!env.timeline().writeChromeJson(mOptions.timelinePath, &error) ||
+        (!mOptions.summaryJsonPath.empty() &&
+         !InsightJson::write(InsightJson::summary(mResult), mOptions.summaryJsonPath, &error)) ||
+        (!mOptions.reportPath.empty() &&
+         !HtmlReport::write(mResult, mOptions.reportPath, &error))) {
+        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+        return kSetupFailed;
+    }
+    fprintf(mOut, "\ntimeline: %s (open in https://ui.perfetto.dev)\nevent log: %s\n",
+            mOptions.timelinePath.c_str(), mOptions.eventLogPath.c_str());
+    if (!mOptions.summaryJsonPath.empty())
+        fprintf(mOut, "summary: %s\n", mOptions.summaryJsonPath.c_str());
+    if (!mOptions.reportPath.empty())
+        fprintf(mOut, "report: %s (open in any browser, works offline)\n",
+                mOptions.reportPath.c_str());
+    return kOk;
+}
+
 std::string ReplaySession::summaryText() const {
+    if (!mResult.nodes.empty())
+        return InsightSummary::table(mResult);
     std::string out;
     char line[512];
     snprintf(line, sizeof(line), "%-30s %14s %14s %8s %14s %14s\n", "node", "initial", "final",
@@ -312,22 +430,31 @@ std::string ReplaySession::summaryText() const {
 }
 
 int ReplaySession::run() {
+    if (mOptions.writeFiles) {
+        // Found out before anything is replayed, not after a long replay.
+        for (const std::string* path : {&mOptions.summaryJsonPath, &mOptions.reportPath}) {
+            std::string error;
+            if (!path->empty() && !checkWritable(*path, &error)) {
+                fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+                return kSetupFailed;
+            }
+        }
+    }
     const int result = mOptions.interactive ? replayInteractive() : replayFile();
     if (mServer == nullptr)
         return result;
+    finishInsight();
     tearDown();
     HostEnvironment& env = HostEnvironment::get();
     fprintf(mOut, "\n%d host calls, %d with a nonzero status, %zu report lines\n\n", mCalls,
             mFailed, env.eventLog().lines().size());
     fputs(summaryText().c_str(), mOut);
-    std::string error;
-    if (!env.timeline().writeChromeJson(mOptions.timelinePath, &error)) {
-        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
-        return kSetupFailed;
+    if (!mResult.nodes.empty()) {
+        fputs(("\n" + InsightSummary::residency(mResult)).c_str(), mOut);
+        fputs(("\n" + InsightSummary::warnings(mResult)).c_str(), mOut);
     }
-    fprintf(mOut, "\ntimeline: %s (open in https://ui.perfetto.dev)\nevent log: %s\n",
-            mOptions.timelinePath.c_str(), mOptions.eventLogPath.c_str());
-    return result;
+    const int written = writeOutputs();
+    return written != kOk ? written : result;
 }
 
 }  // namespace velmora

@@ -6,16 +6,20 @@
 #pragma once
 
 #include <cstdio>
+#include <map>
 #include <memory>
 #include <string>
 #include <utility>
 #include <vector>
 
+#include "tools/insight/InsightResult.h"
 #include "tools/replay/TraceParser.h"
 
 class VelmoraServer;
 
 namespace velmora {
+
+class ReplayInsight;
 
 struct ReplayOptions {
     std::string tracePath;                // ignored when interactive
@@ -29,7 +33,11 @@ struct ReplayOptions {
     std::string timelinePath = "velmora-timeline.json";
     std::string eventLogPath = "velmora-events.log";
     std::vector<std::pair<std::string, std::string>> properties;
-    bool quiet = false;  // no per-call lines
+    bool quiet = false;           // no per-call lines
+    std::string summaryJsonPath;  // everything the analysis found, as JSON; optional
+    std::string reportPath;       // self-contained HTML report; optional
+    bool writeFiles = true;       // false: timeline, summary JSON and report are not written
+    bool insight = true;          // false: no analysis (the plain summary), for measuring its cost
 };
 
 class ReplaySession {
@@ -53,8 +61,15 @@ public:
     std::string summaryText() const;
     int calls() const { return mCalls; }
     int failedCalls() const { return mFailed; }
+    // What the analysis found; complete after run() (or finishInsight()).
+    const InsightResult& insight() const { return mResult; }
+    // Ends the analysis at the current trace time. Called by run() before the tear-down.
+    void finishInsight();
+    // Message and false when `path` cannot be written (the file is left as it was).
+    static bool checkWritable(const std::string& path, std::string* error);
 
 private:
+    int performCall(const TraceCall& call);
     int replayFile();
     int replayInteractive();
     // Warns (on `err`) about calls that are valid but surely not meant: events of commands the
@@ -62,12 +77,17 @@ private:
     void warnAboutCalls(const std::vector<TraceCall>& calls);
     void waitForProbeBoosts();
     void echo(const TraceCall& call, const std::string& result);
+    std::string commandName(int cmdId) const;
+    int writeOutputs();
 
     ReplayOptions mOptions;
     FILE* mOut;
     FILE* mErr;
     FILE* mInput;
     std::unique_ptr<VelmoraServer> mServer;
+    std::unique_ptr<ReplayInsight> mInsight;  // watches the executor while the server runs
+    InsightResult mResult;
+    mutable std::map<int, std::string> mNames;  // commandName() cache, dropped on reload
     int mCalls = 0;
     int mFailed = 0;  // host calls with a nonzero status
 };

@@ -5,6 +5,7 @@
 #include <cstring>
 #include <string>
 
+#include "tools/replay/ComparisonRun.h"
 #include "tools/replay/InstalledExample.h"
 #include "tools/replay/ReplaySession.h"
 
@@ -27,6 +28,10 @@ void usage(FILE* to) {
         "  --timeline FILE      Chrome JSON timeline (default velmora-timeline.json)\n"
         "  --event-log FILE     device event log lines (default velmora-events.log)\n"
         "  --property KEY=VAL   system property seen by the server (repeatable)\n"
+        "  --summary-json FILE  what the analysis found, as JSON (docs/replay-insight.md)\n"
+        "  --report FILE.html   self-contained HTML report (plots, holders, warnings)\n"
+        "  --compare DIR_B      replay twice in virtual time, under the configuration and\n"
+        "                       under DIR_B's, and report the differences\n"
         "  --quiet              no line per call\n"
         "  --interactive        read calls from stdin\n",
         to);
@@ -36,6 +41,7 @@ void usage(FILE* to) {
 
 int main(int argc, char** argv) {
     velmora::ReplayOptions options;
+    std::string compareDir;
     for (int i = 1; i < argc; ++i) {
         const std::string arg = argv[i];
         auto value = [&](const char* name) -> const char* {
@@ -76,6 +82,12 @@ int main(int argc, char** argv) {
                 return velmora::ReplaySession::kBadInput;
             }
             options.properties.emplace_back(kv.substr(0, eq), kv.substr(eq + 1));
+        } else if (arg == "--summary-json") {
+            options.summaryJsonPath = value("--summary-json");
+        } else if (arg == "--report") {
+            options.reportPath = value("--report");
+        } else if (arg == "--compare") {
+            compareDir = value("--compare");
         } else if (arg == "--quiet") {
             options.quiet = true;
         } else if (arg == "--interactive") {
@@ -100,6 +112,10 @@ int main(int argc, char** argv) {
     }
     if (options.configDirs.empty()) {
         options.configDirs = velmora::defaultConfigDirs(options.tracePath, options.interactive);
+    }
+    if (!compareDir.empty()) {
+        velmora::ComparisonRun comparison(options, compareDir, stdout, stderr);
+        return comparison.run();
     }
     velmora::ReplaySession session(options, stdout, stderr);
     return session.run();

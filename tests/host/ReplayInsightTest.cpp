@@ -1,0 +1,273 @@
+// The replay's analysis end to end: small traces replayed in virtual time through the server on
+// the host layer, checking who holds each value, the time at each value, the warnings about what
+// stayed applied, the comparison of two configurations and the timeline's slices.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <cmath>
+#include <map>
+#include <nlohmann/json.hpp>
+#include <string>
+#include <vector>
+
+#include "host/HostEnvironment.h"
+#include "tests/host/HostTestSupport.h"
+#include "tools/insight/ReplayInsight.h"
+#include "tools/replay/ComparisonRun.h"
+#include "tools/replay/ReplaySession.h"
+
+namespace velmora {
+namespace {
+
+const char* kConfig = R"(<policy>
+  <cmd id="5376" name="defaults"><act><duration>0</duration><tag_51>0</tag_51><tag_52>0</tag_52>
+    <tag_53>0</tag_53><tag_54>0</tag_54><tag_55>0</tag_55><tag_56>0</tag_56><tag_57>0</tag_57>
+    <tag_58>0</tag_58></act></cmd>
+  <cmd id="4116" name="probe"><act><duration>100</duration><big_min>1497600</big_min></act></cmd>
+  <cmd id="4099" name="cold_launch"><act><duration>1500</duration><big_min>1804800</big_min></act></cmd>
+  <cmd id="4118" name="video"><act><gpu_max>600000000</gpu_max></act></cmd>
+  <cmd id="4119" name="game"><act><big_min>2419200</big_min></act></cmd>
+  <cmd id="4230" name="game_gpu"><act><priority>40</priority><gpu_governor>performance</gpu_governor></act></cmd>
+  <cmd id="12300" name="touch_floor"><act><duration>0</duration><little_min>1209600</little_min></act></cmd>
+</policy>
+)";
+
+// A configuration directory holding `config`.
+std::string configDir(const std::string& name, const std::string& config) {
+    const std::string dir = hosttest::makeScratchDir(name);
+    mkdir((dir + "/xml").c_str(), 0755);
+    hosttest::writeFile(dir + "/xml/velmora_config_cust.xml", config);
+    return dir;
+}
+
+struct Replayed {
+    std::string dir;
+    int status = -1;
+    InsightResult insight;
+};
+
+// Replays `trace` under `config` in a scratch directory, with every output written there.
+Replayed replay(const std::string& name, const std::string& trace,
+                const std::string& config = kConfig) {
+    Replayed run;
+    run.dir = configDir(name, config);
+    hosttest::writeFile(run.dir + "/t.trace", trace);
+    ReplayOptions options;
+    options.tracePath = run.dir + "/t.trace";
+    options.fast = true;
+    options.quiet = true;
+    options.deviceRoot = run.dir + "/device";
+    options.timelinePath = run.dir + "/timeline.json";
+    options.eventLogPath = run.dir + "/events.log";
+    options.summaryJsonPath = run.dir + "/summary.json";
+    FILE* out = fopen((run.dir + "/stdout.txt").c_str(), "w");
+    ReplaySession session(options, out, stderr);
+    run.status = session.run();
+    run.insight = session.insight();
+    fclose(out);
+    return run;
+}
+
+std::string holderAt(const Replayed& run, const std::string& key, int64_t ms) {
+    return ReplayInsight::holderAt(run.insight, key, ms * 1000);
+}
+
+struct HolderRow {
+    const char* what;
+    const char* trace;
+    const char* key;
+    int64_t atMs;
+    const char* holder;
+};
+
+class HolderTest : public testing::TestWithParam<HolderRow> {};
+
+TEST_P(HolderTest, NamesTheWinningRequest) {
+    const HolderRow& row = GetParam();
+    const Replayed run = replay("holder", row.trace);
+    ASSERT_EQ(ReplaySession::kOk, run.status);
+    EXPECT_EQ(row.holder, holderAt(run, row.key, row.atMs)) << row.what;
+}
+
+const char* kClientCaps =
+    "@0 setconfig 1 5=2016000\n@100 setconfig 3 5=1804800\n@200 setconfig 3 5=0\n@300\n";
+const char* kSceneOverAction = "@0 event 4099 0\n@500 event 4119 0\n@3000\n";
+
+INSTANTIATE_TEST_SUITE_P(
+    Rows, HolderTest,
+    testing::Values(
+        HolderRow{"one client's cap", kClientCaps, "cpu.big.max", 50, "KX"},
+        HolderRow{"a lower cap of another client wins", kClientCaps, "cpu.big.max", 150, "ZOLA"},
+        HolderRow{"released: the first cap again", kClientCaps, "cpu.big.max", 250, "KX"},
+        HolderRow{"a timed action's floor", kSceneOverAction, "cpu.big.min", 100,
+                  "action 4099 cold_launch"},
+        HolderRow{"a scene's higher floor replaces it", kSceneOverAction, "cpu.big.min", 1000,
+                  "scene 4119 game"},
+        HolderRow{"an on/off command", "@0 event 12300 0\n@10\n", "cpu.little.min", 5,
+                  "onoff 12300 touch_floor"},
+        HolderRow{"nothing asked", kClientCaps, "gpu.max", 150, "initial"}));
+
+TEST(ReplayInsightTest, ResidencySumsToTheTraceLengthAndFollowsTheLimits) {
+    const Replayed run = replay("residency", kSceneOverAction);
+    ASSERT_EQ(ReplaySession::kOk, run.status);
+    EXPECT_EQ(3000000, run.insight.endUs);
+    for (const auto& node : run.insight.nodes) {
+        if (!node.numeric)
+            continue;
+        int64_t sum = 0;
+        for (const auto& value : node.residencyUs)
+            sum += value.second;
+        EXPECT_EQ(run.insight.endUs, sum) << node.key;
+    }
+    // 500 ms at the launch floor, then the game's floor to the end.
+    const NodeInsight* bigMin = run.insight.node("cpu.big.min");
+    ASSERT_NE(nullptr, bigMin);
+    const std::vector<std::pair<std::string, int64_t>> expected = {{"2419200", 2500000},
+                                                                   {"1804800", 500000}};
+    EXPECT_EQ(expected, bigMin->residencyUs);
+}
+
+TEST(ReplayInsightTest, WarnsAboutEverythingLeftAppliedNamingTheCall) {
+    const Replayed run = replay("stuck",
+                                "@0 event 4118 0\n"                          // scene, never off
+                                "@100 event 4119 0\n@200 event 4230 0\n"     // governor scene under
+                                "@300 event 4230 -1\n"                       // 4119, switched off
+                                "@400 event 12300 0\n"                       // on/off left on
+                                "@500 setconfig 2 2=1401600\n"               // client cap
+                                "@600 event 4116 0 msg=\"pid=77|tid=78\"\n"  // boost at 608 ms
+                                "@650\n");
+    ASSERT_EQ(ReplaySession::kOk, run.status);
+    std::map<std::string, std::string> byKind;
+    for (const auto& warning : run.insight.warnings)
+        byKind[warning.kind] = warning.message;
+    EXPECT_NE(std::string::npos, byKind["scene"].find("4119 game")) << byKind["scene"];
+    EXPECT_NE(std::string::npos, byKind["governor_scene"].find("t.trace:3"))
+        << byKind["governor_scene"];
+    EXPECT_NE(std::string::npos, byKind["onoff"].find("12300 touch_floor was left on"));
+    EXPECT_NE(std::string::npos, byKind["client_limit"].find("JN never released cpu.little.max"));
+    EXPECT_NE(std::string::npos, byKind["probe_boost"].find("thread 78"));
+    EXPECT_NE(std::string::npos, byKind["probe_boost"].find("t.trace:7"));
+    // Scene 4118 was withdrawn when 4119 took over: no warning for it.
+    for (const auto& warning : run.insight.warnings)
+        EXPECT_EQ(std::string::npos, warning.message.find("4118")) << warning.message;
+}
+
+TEST(ReplayInsightTest, TimelineSlicesNestPerNamedTrack) {
+    const Replayed run = replay("slices",
+                                "@0 event 4119 0\n@100 event 4099 0\n@200 event 4099 0\n"
+                                "@300 event 12300 0\n@400 event 4116 0 msg=\"pid=5|tid=5\"\n"
+                                "@900 event 12300 -1\n@1000 event 4119 -1\n@4000\n");
+    ASSERT_EQ(ReplaySession::kOk, run.status);
+    const auto json = nlohmann::json::parse(hosttest::readFile(run.dir + "/timeline.json"));
+    std::map<int, std::string> trackNames;
+    std::map<int, std::vector<std::pair<int64_t, int64_t>>> slices;
+    bool counterWithSource = false;
+    for (const auto& event : json["traceEvents"]) {
+        const std::string ph = event["ph"];
+        if (ph != "C" && event["pid"] != 2)
+            continue;  // the server's own slices live in a process of their own
+        if (ph == "M" && event["name"] == "thread_name")
+            trackNames[event["tid"]] = event["args"]["name"];
+        if (ph == "X") {
+            EXPECT_FALSE(event["name"].get<std::string>().empty());
+            ASSERT_GE(event["dur"].get<int64_t>(), 0);
+            slices[event["tid"]].emplace_back(
+                event["ts"], event["ts"].get<int64_t>() + event["dur"].get<int64_t>());
+        }
+        if (ph == "C" && event.contains("cat") && event["cat"] == "scene 4119 game")
+            counterWithSource = true;
+    }
+    EXPECT_TRUE(counterWithSource);
+    std::vector<std::string> names;
+    for (const auto& track : slices) {
+        ASSERT_EQ(1u, trackNames.count(track.first)) << "slices on an unnamed track";
+        names.push_back(trackNames[track.first]);
+        std::vector<int64_t> open;  // ends of the enclosing slices
+        for (const auto& slice : track.second) {
+            while (!open.empty() && open.back() <= slice.first)
+                open.pop_back();
+            EXPECT_TRUE(open.empty() || slice.second <= open.back())
+                << trackNames[track.first] << " overlaps at " << slice.first;
+            open.push_back(slice.second);
+        }
+    }
+    // The re-armed launch is two slices; the probe boost lasted its 256 ms.
+    EXPECT_EQ(
+        (std::vector<std::string>{"on/off commands", "probe boosts", "scenes", "timed actions"}),
+        names);
+    const auto& summary = nlohmann::json::parse(hosttest::readFile(run.dir + "/summary.json"));
+    int launches = 0;
+    for (const auto& span : summary["spans"]) {
+        launches += span["name"] == "4099 cold_launch";
+        if (span["category"] == "probe") {
+            EXPECT_EQ(408.0, span["begin_ms"].get<double>());
+            EXPECT_EQ(664.0, span["end_ms"].get<double>());
+        }
+    }
+    EXPECT_EQ(2, launches);
+}
+
+TEST(ReplayInsightTest, ComparesTwoConfigurationsDifferingInOneValue) {
+    const std::string trace = "@0 event 4099 0\n@100 setconfig 1 5=2016000\n@2000\n";
+    const Replayed a = replay("compare-a", trace);
+    std::string configB = kConfig;
+    configB.replace(configB.find("1804800"), 7, "1497600");
+    const std::string dirB = configDir("compare-b", configB);
+    ReplayOptions options;
+    options.tracePath = a.dir + "/t.trace";
+    options.quiet = true;
+    options.deviceRoot = a.dir + "/device";
+    options.timelinePath = a.dir + "/timeline.json";
+    options.eventLogPath = a.dir + "/events.log";
+    options.summaryJsonPath = a.dir + "/comparison.json";
+    FILE* out = fopen((a.dir + "/compare.txt").c_str(), "w");
+    EXPECT_EQ(ReplaySession::kOk, ComparisonRun(options, dirB, out, stderr).run());
+    fclose(out);
+    const auto json = nlohmann::json::parse(hosttest::readFile(a.dir + "/comparison.json"));
+    EXPECT_EQ(0, json["first_divergence"]["call"]["index"]);
+    EXPECT_EQ("0 cpu.big.min=1804800", json["first_divergence"]["a"]);
+    EXPECT_EQ("0 cpu.big.min=1497600", json["first_divergence"]["b"]);
+    ASSERT_EQ(1u, json["nodes"].size());
+    EXPECT_EQ("cpu.big.min", json["nodes"][0]["key"]);
+    EXPECT_EQ(1500.0, std::abs(json["nodes"][0]["residency"][0]["delta_ms"].get<double>()));
+
+    // A configuration B that does not load, as XML or for the server: one message, exit 2,
+    // nothing written.
+    for (const char* config : {"<policy><cmd>", "<policy></policy>"}) {
+        const std::string broken = configDir("compare-broken", config);
+        options.summaryJsonPath = broken + "/comparison.json";
+        options.timelinePath = broken + "/timeline.json";
+        FILE* err = tmpfile();
+        EXPECT_EQ(ReplaySession::kSetupFailed, ComparisonRun(options, broken, stdout, err).run());
+        rewind(err);
+        char message[512] = {0};
+        ASSERT_NE(nullptr, fgets(message, sizeof(message), err));
+        EXPECT_EQ(0u, std::string(message).find("velmora-replay: configuration " + broken +
+                                                " does not load: "))
+            << message;
+        EXPECT_EQ(nullptr, fgets(message, sizeof(message), err)) << "a second message: " << message;
+        fclose(err);
+        EXPECT_EQ("<missing>", hosttest::readFile(broken + "/comparison.json"));
+        EXPECT_EQ("<missing>", hosttest::readFile(broken + "/timeline.json"));
+    }
+}
+
+TEST(ReplayInsightTest, UnwritableOutputStopsBeforeAnyCall) {
+    const std::string dir = configDir("unwritable", kConfig);
+    hosttest::writeFile(dir + "/t.trace", "event 4099 0\n");
+    for (const char* which : {"json", "report"}) {
+        ReplayOptions options;
+        options.tracePath = dir + "/t.trace";
+        options.fast = true;
+        (std::string(which) == "json" ? options.summaryJsonPath : options.reportPath) =
+            dir + "/no/such/dir/out";
+        FILE* err = tmpfile();
+        ReplaySession session(options, stdout, err);
+        EXPECT_EQ(ReplaySession::kSetupFailed, session.run()) << which;
+        EXPECT_EQ(0, session.calls()) << which;
+        fclose(err);
+    }
+}
+
+}  // namespace
+}  // namespace velmora

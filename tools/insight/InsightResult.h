@@ -1,0 +1,77 @@
+// What one replay found out, as plain data: per node who held its value and for how long it sat
+// at each value, the spans of what stayed applied, the end-of-replay warnings and a digest per
+// call (for comparing two runs). Built by ReplayInsight::finish; read by the summary, the JSON
+// writer, the HTML report and the comparison.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace velmora {
+
+// The host call that caused something: where it is in the trace and how it reads.
+struct CallRef {
+    int index = -1;     // position among the replayed calls, -1 for none
+    std::string where;  // "file:line"
+    std::string text;   // the call as written
+    int64_t us = 0;     // trace time of the call
+};
+
+struct HolderSegment {
+    int64_t fromUs = 0;
+    std::string value;
+    std::string heldBy;  // "initial" when no request beats the node's initial value
+    int call = -1;       // index of the call during which it began, -1 for none
+};
+
+struct NodeInsight {
+    std::string key;
+    std::string initial;
+    std::string final;
+    std::string heldBy;  // holder of the final value
+    int changes = 0;
+    bool numeric = true;
+    // Time spent at each value, most time first (numeric nodes only); sums to the trace length.
+    std::vector<std::pair<std::string, int64_t>> residencyUs;
+    std::vector<HolderSegment> segments;  // value or holder changes, from 0 on
+};
+
+struct SpanInsight {
+    std::string track;     // "scenes", "on/off commands", ... ("scenes 2" when they overlap)
+    std::string category;  // "scene", "onoff", "action", "probe", "memlat"
+    std::string name;
+    int64_t beginUs = 0;
+    int64_t endUs = 0;
+    bool open = false;  // still applied at the end of the trace
+};
+
+struct StuckWarning {
+    std::string
+        kind;  // "scene", "governor_scene", "onoff", "client_limit", "probe_boost", "memlat"
+    std::string message;
+    CallRef call;  // the call that applied it
+};
+
+struct InsightResult {
+    int64_t endUs = 0;  // trace length
+    std::vector<NodeInsight> nodes;
+    std::vector<SpanInsight> spans;
+    std::vector<StuckWarning> warnings;
+    // Per call: its status, and a digest of its status and of every node change it caused, for
+    // finding where two runs part.
+    std::vector<int> callStatus;
+    std::vector<uint64_t> callDigests;
+    std::vector<CallRef> calls;
+
+    const NodeInsight* node(const std::string& key) const {
+        for (const auto& n : nodes) {
+            if (n.key == key)
+                return &n;
+        }
+        return nullptr;
+    }
+};
+
+}  // namespace velmora

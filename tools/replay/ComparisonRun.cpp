@@ -1,0 +1,123 @@
+#include "tools/replay/ComparisonRun.h"
+
+#include <tinyxml2.h>
+#include <unistd.h>
+
+#include "tools/insight/InsightJson.h"
+#include "tools/insight/ReplayComparison.h"
+
+namespace velmora {
+
+namespace {
+
+constexpr const char* kConfigFile = "/xml/velmora_config_cust.xml";
+
+}  // namespace
+
+ComparisonRun::ComparisonRun(ReplayOptions options, std::string compareDir, FILE* out, FILE* err)
+    : mOptions(std::move(options)), mCompareDir(std::move(compareDir)), mOut(out), mErr(err) {}
+
+std::string ComparisonRun::loadError(const std::string& dir) {
+    const std::string path = dir + kConfigFile;
+    if (access(path.c_str(), R_OK) != 0)
+        return "no readable " + path;
+    tinyxml2::XMLDocument doc;
+    if (doc.LoadFile(path.c_str()) != tinyxml2::XML_SUCCESS)
+        return doc.ErrorStr();
+    const tinyxml2::XMLElement* root = doc.RootElement();
+    if (root == nullptr || std::string(root->Name()) != "policy")
+        return path + ": the root element is not <policy>";
+    return "";
+}
+
+int ComparisonRun::run() {
+    if (mOptions.interactive || mOptions.tracePath.empty()) {
+        fprintf(mErr, "velmora-replay: --compare needs a trace file\n");
+        return ReplaySession::kBadInput;
+    }
+    std::string error = loadError(mCompareDir);
+    if (error.empty()) {
+        // Well-formed XML can still fail the server's start-up (no start-up command 5376, say):
+        // find that out now, not after run A has written its files.
+        ReplayOptions trial = mOptions;
+        trial.configDirs = {mCompareDir};
+        trial.eventLogPath = "/dev/null";
+        FILE* sink = fopen("/dev/null", "w");
+        FILE* why = tmpfile();
+        if (sink != nullptr && why != nullptr) {
+            ReplaySession session(trial, sink, why);
+            if (session.setUp() != ReplaySession::kOk) {
+                char line[512] = {0};
+                rewind(why);
+                if (fgets(line, sizeof(line), why) != nullptr) {
+                    error = line;
+                    error.erase(0,
+                                error.find(": ") == std::string::npos ? 0 : error.find(": ") + 2);
+                    if (!error.empty() && error.back() == '\n')
+                        error.pop_back();
+                }
+                if (error.empty())
+                    error = "the server does not start with it";
+            }
+        }
+        if (sink != nullptr)
+            fclose(sink);
+        if (why != nullptr)
+            fclose(why);
+    }
+    if (!error.empty()) {
+        fprintf(mErr, "velmora-replay: configuration %s does not load: %s\n", mCompareDir.c_str(),
+                error.c_str());
+        return ReplaySession::kSetupFailed;
+    }
+    for (const std::string* path : {&mOptions.summaryJsonPath, &mOptions.reportPath}) {
+        std::string why;
+        if (!path->empty() && !ReplaySession::checkWritable(*path, &why)) {
+            fprintf(mErr, "velmora-replay: %s\n", why.c_str());
+            return ReplaySession::kSetupFailed;
+        }
+    }
+    // Both runs in virtual time: the same trace gives the same answers, so every difference is
+    // the configuration's.
+    ReplayOptions a = mOptions;
+    a.fast = true;
+    a.summaryJsonPath.clear();
+    ReplaySession sessionA(a, mOut, mErr);
+    const int resultA = sessionA.run();
+    if (resultA != ReplaySession::kOk)
+        return resultA;
+    const InsightResult insightA = sessionA.insight();
+
+    ReplayOptions b = a;
+    b.configDirs = {mCompareDir};
+    b.writeFiles = false;
+    b.eventLogPath = "/dev/null";
+    b.quiet = true;
+    FILE* quiet = fopen("/dev/null", "w");
+    ReplaySession sessionB(b, quiet != nullptr ? quiet : mOut, mErr);
+    const int resultB = sessionB.run();
+    if (quiet != nullptr)
+        fclose(quiet);
+    if (resultB != ReplaySession::kOk)
+        return resultB;
+
+    std::string labelA = mOptions.configDirs.empty() ? mOptions.tracePath : mOptions.configDirs[0];
+    if (mOptions.configDirs.empty()) {
+        const size_t slash = labelA.find_last_of('/');
+        labelA = slash == std::string::npos ? "." : labelA.substr(0, slash);
+    }
+    ReplayComparison comparison(labelA, insightA, mCompareDir, sessionB.insight());
+    fprintf(mOut, "\n%s", comparison.text().c_str());
+    if (!mOptions.summaryJsonPath.empty()) {
+        std::string why;
+        if (!InsightJson::write(InsightJson::comparison(comparison), mOptions.summaryJsonPath,
+                                &why)) {
+            fprintf(mErr, "velmora-replay: %s\n", why.c_str());
+            return ReplaySession::kSetupFailed;
+        }
+        fprintf(mOut, "comparison: %s\n", mOptions.summaryJsonPath.c_str());
+    }
+    return ReplaySession::kOk;
+}
+
+}  // namespace velmora
