@@ -72,12 +72,6 @@ TEST_F(FreqManagerTest, UnmergedTagsPassThroughUnrecorded) {
     EXPECT_TRUE(s.littleMin.empty());  // client floors never reach the event tables
 }
 
-TEST_F(FreqManagerTest, EmptyRequestReachesThePlatform) {
-    EXPECT_EQ(client(2, {}), 0);
-    ASSERT_EQ(setCalls().size(), 1u);
-    EXPECT_TRUE(setCalls()[0].tags.empty());
-}
-
 TEST_F(FreqManagerTest, RequestWithoutATableIsAppliedButNotRecorded) {
     EXPECT_EQ(client(-5, {{kL, 1000000}, {kB, 900000}, {3, 1}}), 0);
     EXPECT_EQ(lastSent(-5, {kL, kB, 3}), (Ints{1000000, 900000, 1}));

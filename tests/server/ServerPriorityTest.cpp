@@ -2,7 +2,6 @@
 // that are read, the rebuild on reload, and the selection rules with their tie-breaks.
 #include <map>
 #include <ostream>
-#include <set>
 #include <string>
 #include <vector>
 
@@ -60,18 +59,6 @@ using StepList = std::vector<std::pair<int, int>>;
 TEST_F(ServerPriorityTest, WithoutConfiguredPrioritiesOnlyTheBuiltinsExist) {
     start(kBuiltinScenes + scene(4122) + scene(4300));
     EXPECT_EQ(priorities(), kBuiltins);
-    // The built-in order: 4119 over 4118 over 4121 over 4120.
-    ASSERT_EQ(on(4120), 0);
-    ASSERT_EQ(on(4121), 0);
-    ASSERT_EQ(on(4118), 0);
-    ASSERT_EQ(on(4119), 0);
-    EXPECT_EQ(steps(), StepList({{4120, kOn},
-                                 {4120, kOff},
-                                 {4121, kOn},
-                                 {4121, kOff},
-                                 {4118, kOn},
-                                 {4118, kOff},
-                                 {4119, kOn}}));
     EXPECT_EQ(on(4122), -1);
     EXPECT_EQ(on(4300), -1);
     EXPECT_TRUE(
@@ -215,33 +202,6 @@ TEST_F(ServerPriorityTest, PriorityReadersTakeTheLastMatchingPair) {
     EXPECT_EQ(server.getPriority(&gov), 0);
     Action noKey(4300, "", 0, 1, {"priority ", "30"});
     EXPECT_EQ(server.getInterPriority(&noKey), 0);
-}
-
-TEST_F(ServerPriorityTest, GovernorSelection) {
-    VelmoraServer server;
-    VelmoraServer* s = &server;
-    android::Mutex::Autolock lock(s->mMutex);
-    s->mPriorityMap[4230] = 50;
-    s->mPriorityMap[4240] = 50;
-    s->mPriorityMap[4250] = 80;
-    s->mOnEventSet = {4118, 4119, 4230, 4240};
-    s->mCurSpecialCmdId = 4118;
-    // Only under scene 4119, and only for governor scenes.
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 0);
-    s->mCurSpecialCmdId = 4119;
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4121), 0);
-    // A tie goes to the new scene.
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 4240);
-    s->mOnEventSet.insert(4250);
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 4250);
-    EXPECT_EQ(s->getCmdIdWithMaxPrio(false), 4119);
-    // A scene without priority still beats an empty choice.
-    s->mOnEventSet = {4300};
-    EXPECT_EQ(s->getCmdIdWithMaxPrio(true), 4300);
-    s->mOnEventSet = {4118};
-    EXPECT_EQ(s->getCmdIdWithMaxPrio(true), 0);
-    s->mOnEventSet.clear();
-    EXPECT_EQ(s->getCmdIdWithMaxPrio(false), 0);
 }
 
 }  // namespace
