@@ -180,12 +180,6 @@ TEST_F(VelmoraLoadXmlTest, IdsThatAreNotDecimalIntegersAreSkippedSilently) {
     EXPECT_EQ(LogCapture::countContaining("cmdId"), 0);
 }
 
-TEST_F(VelmoraLoadXmlTest, TypeThatIsNotAnIntegerReadsAsZero) {
-    writeCustConfig(policyXml("<cmd id=\"4400\"><a type=\"fast\"><k>1</k></a></cmd>"));
-    ASSERT_TRUE(load());
-    EXPECT_EQ(mLoader.chains.at(4400)[1].type, 0);
-}
-
 }  // namespace
 }  // namespace fake
 }  // namespace velmora

@@ -1,9 +1,6 @@
-// The command parser: what a parse copies, and reloads swapping the configuration while other
-// threads parse.
+// The command parser: what a parse copies, and reloads swapping the configuration.
 #include "config/VelmoraParser.h"
 
-#include <atomic>
-#include <thread>
 #include <vector>
 
 #include "platform/VelmoraPlat.h"
@@ -83,20 +80,6 @@ TEST_F(VelmoraParserTest, MissingTargetOrMapIsAnError) {
 
 class VelmoraParserReloadTest : public ServerTest {};
 
-TEST_F(VelmoraParserReloadTest, FailedReloadKeepsTheOldConfiguration) {
-    ASSERT_EQ(startServer("<cmd id=\"4400\"><a><duration>50</duration><t1>900</t1></a></cmd>"),
-              0);
-    writeCustConfig("<policy><broken></policy>");
-    EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "load xml map failed!"));
-
-    const int on = 0;
-    executor().clear();
-    EXPECT_EQ(mServer->velmoraEvent(4400, "", 1, &on), 0);
-    ASSERT_EQ(executor().calls(Op::DoAction).size(), 1u);
-    EXPECT_EQ(executor().calls(Op::DoAction)[0].duration, 50);
-}
-
 TEST_F(VelmoraParserReloadTest, ReloadReplacesCommands) {
     ASSERT_EQ(startServer("<cmd id=\"4400\"><a><duration>50</duration></a></cmd>"), 0);
     writeCustConfig(policyXml(std::string(kStartupCommands) +
@@ -106,37 +89,6 @@ TEST_F(VelmoraParserReloadTest, ReloadReplacesCommands) {
     EXPECT_EQ(mServer->velmoraEvent(4400, "", 1, &on), 2);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doParse failed! cmdId=4400, errno=1"));
     EXPECT_EQ(mServer->velmoraEvent(4401, "", 1, &on), 0);
-}
-
-TEST_F(VelmoraParserReloadTest, ReloadRacesWithParsesOnOtherThreads) {
-    const std::string commands = "<cmd id=\"4400\"><a><duration>50</duration><t1>900</t1></a></cmd>";
-    ASSERT_EQ(startServer(commands), 0);
-    std::atomic<bool> stop{false};
-    std::atomic<int> failures{0};
-    std::vector<std::thread> parsers;
-    for (int t = 0; t < 3; ++t) {
-        parsers.emplace_back([&] {
-            const int on = 0;
-            while (!stop.load()) {
-                if (mServer->velmoraEvent(4400, "", 1, &on) != 0) {
-                    ++failures;
-                }
-            }
-        });
-    }
-    for (int i = 0; i < 30; ++i) {
-        EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
-    }
-    stop = true;
-    for (auto& thread : parsers) {
-        thread.join();
-    }
-    EXPECT_EQ(failures.load(), 0);
-    for (const auto& call : executor().calls(Op::DoAction)) {
-        if (call.id == 4400) {
-            ASSERT_EQ(call.tagValues, (std::vector<int>{1, 900}));
-        }
-    }
 }
 
 TEST_F(VelmoraParserReloadTest, ReloadWithoutParserIsRefused) {

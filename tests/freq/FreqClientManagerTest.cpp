@@ -27,6 +27,15 @@ TEST_F(FreqManagerTest, WithdrawnCapSendsZeroUnlessAnEventCaps) {
     EXPECT_EQ(snapshot().kx.at(kB), 1200000);  // the last copy is kept
 }
 
+// 1 is the smallest value that caps, for another client's request and for an event's.
+TEST_F(FreqManagerTest, CapOfOneIsACapLikeAnyOther) {
+    ASSERT_EQ(client(1, {{kL, 1}}), 0);
+    ASSERT_EQ(client(2, {{kL, 5}}), 0);
+    EXPECT_EQ(lastSent(2, {kL}), (Ints{1}));
+    ASSERT_EQ(event(12288, kOn, {{kL, 1500000}}), 0);
+    EXPECT_EQ(lastSent(12288, {kL}), (Ints{1}));
+}
+
 TEST_F(FreqManagerTest, ThermalTagsTakeTheSmallestPositiveButNoEventCap) {
     ASSERT_EQ(client(3, {{kIpaSwitch, 70000}}), 0);
     ASSERT_EQ(client(1, {{kIpaSwitch, 80000}}), 0);
@@ -61,12 +70,6 @@ TEST_F(FreqManagerTest, UnmergedTagsPassThroughUnrecorded) {
     EXPECT_EQ(s.kx.count(1), 0u);
     EXPECT_EQ(s.kx.count(3), 0u);
     EXPECT_TRUE(s.littleMin.empty());  // client floors never reach the event tables
-}
-
-TEST_F(FreqManagerTest, EmptyRequestReachesThePlatform) {
-    EXPECT_EQ(client(2, {}), 0);
-    ASSERT_EQ(setCalls().size(), 1u);
-    EXPECT_TRUE(setCalls()[0].tags.empty());
 }
 
 TEST_F(FreqManagerTest, RequestWithoutATableIsAppliedButNotRecorded) {

@@ -94,10 +94,7 @@ const Write kWrites[] = {
     {"cpu.little.min", "1804800", V::kAccepted, "1804800"},
     {"cpu.little.min", "1500000", V::kRounded, "1593600"},  // a floor rounds up
     {"cpu.little.max", "1500000", V::kRounded, "1497600"},  // a cap rounds down
-    {"cpu.little.min", "18048000", V::kRefused, "18048000 is above the top frequency 1804800 kHz"},
-    {"gpu.max", "600000", V::kRefused, "600000 is below the lowest frequency 257000000 Hz"},
     {"cpu.big.governor", "performace", V::kRefused, "the device has no governor 'performace'"},
-    {"sched.group.top_app", "300", V::kRefused, "300 is outside -20..40"},
     {"memlat.ratio_b", "6O", V::kRefused, "'6O' is not a number"},
     {"memlat.ratio_b", "0.6", V::kAccepted, "0.6"},
     {"probe.tid", "anything", V::kAccepted, "anything"},

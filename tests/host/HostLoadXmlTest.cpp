@@ -81,19 +81,6 @@ TEST_F(HostLoadXmlTest, GovernorScenesAndMemoryLatencyKeepStringPairs) {
     EXPECT_EQ((std::vector<std::string>{"mem_latency_ratio_b", "0.6"}), first(20481)->mParams);
 }
 
-TEST_F(HostLoadXmlTest, EveryActionElementBecomesOneRecordInOrder) {
-    ASSERT_NE(nullptr, load(R"(<cmd id="4100"><a><duration>10</duration></a>
-        <a><duration>20</duration></a><a/></cmd>)"));
-    const Action* action = first(4100);
-    ASSERT_NE(nullptr, action);
-    ASSERT_NE(nullptr, action->mNext);
-    ASSERT_NE(nullptr, action->mNext->mNext);
-    EXPECT_EQ(10, action->mDuration);
-    EXPECT_EQ(20, action->mNext->mDuration);
-    EXPECT_EQ(0, action->mNext->mNext->mDuration);  // no duration element: 0
-    EXPECT_EQ("unknown", action->mName);
-}
-
 // Parameters the vocabulary does not know are left out, each with a log line naming the
 // command and the element; the rest of the action survives.
 TEST_F(HostLoadXmlTest, NotUnderstoodParametersAreLoggedAndLeftOut) {
@@ -119,14 +106,6 @@ TEST_F(HostLoadXmlTest, NotUnderstoodParametersAreLoggedAndLeftOut) {
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
                                 "config: cmdId=4300 (gov): unknown parameter <warp_drive>, "
                                 "ignored"));
-}
-
-TEST_F(HostLoadXmlTest, MissingConfigurationInEveryDirectoryFailsTheLoad) {
-    HostEnvironment::get().properties().setConfigDirs({mDir + "/missing"});
-    std::unique_ptr<VelmoraLoadXml> loader(createVelmoraLoadXml());
-    EXPECT_EQ(nullptr, loader->loadXmlMap());
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
-                                "velmora_config_cust.xml is not exit or file is invalid!"));
 }
 
 }  // namespace

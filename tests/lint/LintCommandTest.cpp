@@ -61,21 +61,6 @@ TEST(LintCommandTest, ExplainListsEveryCommandsDispatch) {
     EXPECT_EQ(result.status, 0);
 }
 
-TEST(LintCommandTest, ExplainMarksASceneThatIsAlwaysRefused) {
-    ScratchDir dir;
-    const auto result = runLint(
-        {"--explain"},
-        dir.write("c.xml", withBase("<cmd id=\"4130\" name=\"s\"><a><big_max>1</big_max></a>"
-                                    "</cmd>\n")));
-    const auto lines = result.outLines();
-    ASSERT_GE(lines.size(), 9u) << result.out;
-    EXPECT_EQ(lines[6], "4130 s (line 4): special scene, priority none, duration 0, 1 pair");
-    EXPECT_EQ(lines[8],
-              "    -> payload 0/-1 switches the scene on/off; the highest priority on is applied "
-              "(this one never: no valid priority)");
-    EXPECT_EQ(result.status, 2);
-}
-
 TEST(LintCommandTest, ExplainPrintsTheServerRuleBehindAFinding) {
     ScratchDir dir;
     const auto result =

@@ -79,10 +79,6 @@ const Row kRows[] = {
      {"F:6: error: parameter <big_min> of command 4099 has no text: the loader drops the whole "
       "action"},
      2},
-    {"IdBeyondTheIntRangeWraps",
-     withBase("<cmd id=\"4294971395\"><a><duration>10</duration></a></cmd>\n"),
-     {"F:4: warning: id \"4294971395\" does not fit an int: the loader reads it as 4099"},
-     0},
     {"IdBelowFour",
      withBase("<cmd id=\"3\" name=\"a\"><a><duration>10</duration></a></cmd>\n"),
      {"F:4: warning: command id 3 is below 4: the platform cannot tell it from the client ids "
@@ -95,12 +91,6 @@ const Row kRows[] = {
               "<big_mn>1497600</big_mn></a></cmd>\n"),
      {"F:5: warning: unknown parameter <big_mn> in command 4099: the host conversion leaves it "
       "out; did you mean <big_min>?"},
-     0},
-    {"UnknownParameterOfGovernorScene",
-     withBase("<cmd id=\"4230\" name=\"g\"><a><priority>40</priority>\n"
-              "<cpu_governor>performance</cpu_governor></a></cmd>\n"),
-     {"F:5: warning: unknown parameter <cpu_governor> in command 4230: the host conversion "
-      "leaves it out; did you mean <gpu_governor>?"},
      0},
     {"ValueNotAnInteger",
      withBase("<cmd id=\"4099\" name=\"a\"><a><duration>10</duration>\n"
@@ -125,22 +115,6 @@ const Row kRows[] = {
      "<cmd id=\"4116\"><a><duration>50</duration></a></cmd>\n</policy>\n",
      {"F:3: error: start-up command 5376 with a single pair needs <group_hmp>, not <group_vip>: "
       "the server's init fails"},
-     2},
-    {"StartupThreePairs",
-     "<policy>\n<cmd id=\"5376\"><a><duration>0</duration><group_vip>10</group_vip>"
-     "<group_root>0</group_root><group_boost>0</group_boost></a></cmd>\n"
-     "<cmd id=\"4116\"><a><duration>50</duration></a></cmd>\n</policy>\n",
-     {"F:2: error: start-up command 5376 has 3 group pairs: it needs one (<group_hmp>) or eight "
-      "(the EAS groups <group_boost>..<group_background>); the server's init fails"},
-     2},
-    {"StartupEightPairsWithHmp",
-     "<policy>\n<cmd id=\"5376\"><a><duration>0</duration><group_boost>0</group_boost>"
-     "<group_vip>0</group_vip><group_top_app>0</group_top_app><group_root>0</group_root>\n"
-     "<group_hmp>0</group_hmp><group_system_background>0</group_system_background>"
-     "<group_key_background>0</group_key_background><group_background>0</group_background>"
-     "</a></cmd>\n<cmd id=\"4116\"><a><duration>50</duration></a></cmd>\n</policy>\n",
-     {"F:3: error: start-up command 5376 with eight pairs takes only EAS groups: <group_hmp> "
-      "makes the server's init fail"},
      2},
     {"StartupTimed",
      "<policy>\n<cmd id=\"5376\"><a><duration>100</duration><group_hmp>0</group_hmp></a></cmd>\n"
@@ -188,22 +162,11 @@ const Row kRows[] = {
      {"F:5: error: duration-0 command 4101 has 9 pairs: scheduling-level events take 1..8 group "
       "pairs; every event fails (status 3)"},
      2},
-    {"SchedLevelEmptyAction",  // an action without parameters is a duration-0 one with no pairs
-     withBase("<cmd id=\"4101\">\n<a/></cmd>\n"),
-     {"F:5: error: duration-0 command 4101 has 0 pairs: scheduling-level events take 1..8 group "
-      "pairs; every event fails (status 3)"},
-     2},
 
     // --- On/off commands.
     {"OnOffValueBelowOne",
      withBase("<cmd id=\"12288\"><a><duration>0</duration>\n<big_max>0</big_max></a></cmd>\n"),
      {"F:5: error: on/off command 12288: <big_max> value 0 is below 1; every switch fails (-1)"},
-     2},
-    {"OnOffForeignTag",
-     withBase("<cmd id=\"12288\"><a><duration>0</duration>\n<fork_on_big>1</fork_on_big>"
-              "</a></cmd>\n"),
-     {"F:5: error: on/off command 12288 carries <fork_on_big> (tag 20): on/off commands take "
-      "only tags 1, 2, 4, 5, 7, 8 and 10; every switch fails (-1)"},
      2},
     {"OnOffFloorAboveCap",
      withBase("<cmd id=\"13568\"><a><duration>0</duration><gpu_max>600000000</gpu_max>\n"
@@ -228,19 +191,10 @@ const Row kRows[] = {
      {"F:5: warning: special scene 4118 priority 600 is outside 1..500: ignored, the built-in "
       "priority 100 stays"},
      0},
-    {"ScenePriorityOutOfRange",
-     withBase("<cmd id=\"4130\"><a>\n<priority>0</priority></a></cmd>\n"),
-     {"F:5: error: special scene 4130 priority 0 is outside 1..500: every switch is refused (-1)"},
-     2},
     {"GovernorSceneWithoutPriority",  // an integer tag 101 does not count for governor scenes
      withBase("<cmd id=\"4300\">\n<a><tag_101>30</tag_101><big_governor>performance"
               "</big_governor></a></cmd>\n"),
      {"F:5: error: governor scene 4300 has no <priority>: every switch is refused (-1)"},
-     2},
-    {"GovernorScenePriorityNotANumber",
-     withBase("<cmd id=\"4300\"><a>\n<priority>high</priority></a></cmd>\n"),
-     {"F:5: error: governor scene 4300 priority 'high' (0) is outside 1..500: every switch is "
-      "refused (-1)"},
      2},
     {"LastSceneNeverGetsPriority",
      withBase("<cmd id=\"4352\"><a><priority>50</priority></a></cmd>\n"),
@@ -283,12 +237,6 @@ const Row kRows[] = {
       "F:5: note: did you mean 'performance'? the device offers schedutil, performance, "
       "powersave"},
      2},
-    {"RatioNotANumber",
-     withBase("<cmd id=\"20481\"><a><duration>0</duration>\n"
-              "<mem_latency_ratio_b>6O</mem_latency_ratio_b></a></cmd>\n"),
-     {"F:5: error: <mem_latency_ratio_b> '6O' of command 20481: '6O' is not a number of "
-      "memlat.ratio_b, the device refuses the write"},
-     2},
     {"FloorAboveCapOfAnotherLimit",
      withBase(
          "<cmd id=\"12288\"><a><duration>0</duration>\n<big_max>1804800</big_max></a></cmd>\n"
@@ -310,11 +258,6 @@ const Row kRows[] = {
      withBase("<cmd id=\"20300\"><a><duration>10</duration></a></cmd>\n"),
      {"F:4: warning: command 20300 is never read: events with this id never read the "
       "configuration"},
-     0},
-    {"MemoryLatencyFromEventText",
-     withBase("<cmd id=\"20480\"><a><duration>0</duration></a></cmd>\n"),
-     {"F:4: warning: command 20480 is never read: events take their ratios from the event text, "
-      "this entry is unused"},
      0},
 };
 

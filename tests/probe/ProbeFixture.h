@@ -1,13 +1,9 @@
 // Fixture for the probe handler and its worker, run against a bare platform object whose
-// executor records every call. The handler is declared last so that it (and with it the worker)
-// goes before the platform and the executor it uses.
+// executor records every call, on a virtual clock (advance() moves it). The handler is declared
+// last so that it (and with it the worker) goes before the platform and the executor it uses.
 #pragma once
 
 #include <gtest/gtest.h>
-#include <unistd.h>
-
-#include <chrono>
-#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
@@ -17,19 +13,14 @@
 #include "probe/ProbeHandler.h"
 #include "probe/ProbeThread.h"
 #include "tests/fakes/FakeExecutor.h"
+#include "tests/fakes/FakeProbeClock.h"
 #include "tests/fakes/LogCapture.h"
 
 namespace velmora {
 namespace fake {
 
-using Clock = std::chrono::steady_clock;  // CLOCK_MONOTONIC, the worker's clock
-using std::chrono::milliseconds;
-
-constexpr milliseconds kBoostDelay{8};
-constexpr milliseconds kBoostLifetime{256};
-// How late the worker (or any wait below) may be on a loaded, sanitized build. Only upper
-// bounds use it; lower bounds are exact.
-constexpr milliseconds kTolerance{250};
+constexpr int kBoostDelayMs = 8;
+constexpr int kBoostLifetimeMs = 256;
 
 using ProbeThread = ProbeHandler::ProbeThread;
 
@@ -59,13 +50,19 @@ protected:
     void SetUp() override {
         LogCapture::start();
         mPlat.mExecutorPtr = &mExecutor;
+        FakeProbeClock::install();
     }
-    void TearDown() override { mHandler.reset(); }
+    void TearDown() override {
+        mHandler.reset();
+        FakeProbeClock::uninstall();
+    }
 
     void startHandler(Action* action = makeProbeAction(8)) {
         mHandler = std::make_unique<ProbeHandler>(&mPlat, action);
     }
     ProbeThread& thread() { return *mHandler->mProbeThreadPtr; }
+    // Moves the worker's time on by `ms`; returns once it has made the passes due on the way.
+    void advance(int ms) { FakeProbeClock::last().advance(ms); }
 
     int probe(int pid, int tid, int state) {
         const std::string msg = "pid=" + std::to_string(pid) + "|tid=" + std::to_string(tid);
@@ -79,17 +76,6 @@ protected:
         }
         return out;
     }
-    // Time of the first setProbeTid(tid, state); fails the test when there is none.
-    Clock::time_point tidCallTime(unsigned int tid, int state) const {
-        for (const auto& call : mExecutor.calls(Op::ProbeTid)) {
-            if (call.tid == tid && call.state == state) {
-                return call.when;
-            }
-        }
-        ADD_FAILURE() << "no setProbeTid(" << tid << ", " << state << ")";
-        return Clock::time_point::max();
-    }
-
     // Queue views, read under the worker's lock. -1: no entry; 0: withdrawn.
     int64_t waitTimestamp(uint32_t tid) { return timestampIn(&ProbeThread::mWaitQueue, tid); }
     int64_t boostedTimestamp(uint32_t tid) { return timestampIn(&ProbeThread::mBoostedQueue, tid); }
@@ -105,18 +91,6 @@ protected:
         ProbeThread& t = thread();
         android::Mutex::Autolock lock(t.mLock);
         return t.mWaitQueue.size() + t.mBoostedQueue.size();
-    }
-
-    // Polls `done` every millisecond; true once it holds, false after `timeout`.
-    static bool waitUntil(const std::function<bool()>& done, milliseconds timeout = kTolerance) {
-        const auto deadline = Clock::now() + timeout;
-        while (!done()) {
-            if (Clock::now() > deadline) {
-                return false;
-            }
-            usleep(1000);
-        }
-        return true;
     }
 
     FakeExecutor mExecutor;

@@ -1,6 +1,6 @@
-// The probe worker and its queues: when boosts and withdrawals reach the platform, and what the
-// queue operations do with the worker's lock held by the test (so that the worker cannot make
-// a pass in between and the outcome does not depend on timing).
+// The probe worker and its queues on a virtual clock: the exact instants boosts and withdrawals
+// reach the platform, and what the queue operations do with the worker's lock held by the test
+// (so that the worker cannot make a pass in between).
 #include <utils/Mutex.h>
 
 #include "tests/probe/ProbeFixture.h"
@@ -11,47 +11,53 @@ namespace {
 
 using android::Mutex;
 
-class ProbeThreadTest : public ProbeFixture {};
-
-TEST_F(ProbeThreadTest, WithdrawsAfterLifetimeAndDropsEntry) {
-    startHandler();
-    const auto queued = Clock::now();
-    {
+class ProbeThreadTest : public ProbeFixture {
+protected:
+    void queue(int pid, uint32_t tid) {
         Mutex::Autolock lock(thread().mLock);
-        thread().addItemToQueue(12, 34);
+        thread().addItemToQueue(pid, tid);
     }
-    ASSERT_TRUE(mExecutor.waitFor(Op::ProbeTid, 2, kBoostDelay + kBoostLifetime + kTolerance));
+    void withdraw(uint32_t tid) {
+        Mutex::Autolock lock(thread().mLock);
+        thread().moveItemToUnboostQueue(tid);
+    }
+};
 
+TEST_F(ProbeThreadTest, BoostsAfterTheDelayAndWithdrawsAtTheEndOfTheLifetime) {
+    startHandler();
+    queue(12, 34);
+    advance(kBoostDelayMs - 1);
+    EXPECT_TRUE(mExecutor.calls().empty());
+    advance(1);
+    EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{34, 0}}));
+    advance(kBoostLifetimeMs - 1);
+    EXPECT_EQ(tidCalls().size(), 1u);
+    advance(1);
     EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{34, 0}, {34, -1}}));
-    const auto boosted = tidCallTime(34, 0);
-    const auto withdrawn = tidCallTime(34, -1);
-    EXPECT_GE(withdrawn - queued, kBoostDelay + kBoostLifetime);
-    EXPECT_LE(withdrawn - boosted, kBoostLifetime + kTolerance);
-    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 2, kTolerance));
     const auto actions = mExecutor.calls(Op::DoAction);
+    ASSERT_EQ(actions.size(), 2u);
+    EXPECT_EQ(actions[0].payload, (std::vector<int>{0}));
     EXPECT_EQ(actions[1].payload, (std::vector<int>{-1}));
-
-    EXPECT_TRUE(waitUntil([&] { return queuedCount() == 0; }));
+    advance(1);
+    EXPECT_EQ(queuedCount(), 0u);
     EXPECT_EQ(mExecutor.calls().size(), 4u);
 }
 
-// The worker sleeps for the remaining delay of the smallest pending thread id even when a
-// larger one falls due earlier; both are then boosted in the same pass.
+// The worker sleeps for the remaining delay of the last pending item it visits (the smallest
+// thread id) even when a larger one falls due earlier; both are then boosted in the same pass.
 TEST_F(ProbeThreadTest, SleepsForSmallestPendingThreadId) {
     startHandler();
-    Clock::time_point smallQueued;
-    {
-        // Holding the lock keeps the worker from looking at tid 9 alone.
-        Mutex::Autolock lock(thread().mLock);
-        thread().addItemToQueue(1, 9);
-        usleep(2000);
-        smallQueued = Clock::now();
-        thread().addItemToQueue(1, 5);
-    }
-    ASSERT_TRUE(mExecutor.waitFor(Op::ProbeTid, 2, kBoostDelay + kTolerance));
-
-    EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{9, 0}, {5, 0}}));
-    EXPECT_GE(tidCallTime(9, 0) - smallQueued, kBoostDelay);
+    queue(1, 20);
+    advance(1);
+    queue(1, 9);
+    advance(1);
+    queue(1, 5);
+    advance(kBoostDelayMs - 2);  // 20 is boosted; 9 is due in 1 ms, 5 in 2
+    EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{20, 0}}));
+    advance(1);
+    EXPECT_EQ(tidCalls().size(), 1u);
+    advance(1);
+    EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{20, 0}, {9, 0}, {5, 0}}));
 }
 
 TEST_F(ProbeThreadTest, WaitingThreadWithdrawnNeverReachesPlatform) {
@@ -62,25 +68,23 @@ TEST_F(ProbeThreadTest, WaitingThreadWithdrawnNeverReachesPlatform) {
         thread().moveItemToUnboostQueue(34);
         EXPECT_EQ(waitTimestampLocked(34), 0);
     }
-    EXPECT_TRUE(waitUntil([&] { return queuedCount() == 0; }));
+    advance(kBoostDelayMs);
+    EXPECT_EQ(queuedCount(), 0u);
     EXPECT_TRUE(mExecutor.calls().empty());
 }
 
+// Thread id 0 moves through the queues but never reaches the platform; past its lifetime it
+// expires like any other, and the worker goes back to waiting instead of polling for it.
 TEST_F(ProbeThreadTest, ThreadIdZeroIsMovedButNeverSentByWorker) {
     startHandler();
-    {
-        Mutex::Autolock lock(thread().mLock);
-        thread().addItemToQueue(1, 0);
-    }
-    ASSERT_TRUE(waitUntil([&] { return boostedTimestamp(0) > 0; }, kBoostDelay + kTolerance));
-    const int64_t boostedAt = boostedTimestamp(0);
+    queue(1, 0);
+    advance(kBoostDelayMs);
+    EXPECT_GT(boostedTimestamp(0), 0);
     EXPECT_EQ(waitTimestamp(0), -1);
-
-    // Past its lifetime the entry expires like any other, without a withdrawal on the
-    // platform, and the worker goes back to waiting instead of polling for it forever.
-    ASSERT_TRUE(waitUntil([&] { return boostedTimestamp(0) == -1; }, kBoostLifetime + kTolerance));
-    const auto expiry = Clock::time_point(std::chrono::nanoseconds(boostedAt)) + kBoostLifetime;
-    EXPECT_GE(Clock::now(), expiry);
+    advance(kBoostLifetimeMs - 1);
+    EXPECT_GT(boostedTimestamp(0), 0);
+    advance(2);
+    EXPECT_EQ(boostedTimestamp(0), -1);
     EXPECT_TRUE(mExecutor.calls().empty());
 }
 
@@ -117,80 +121,67 @@ TEST_F(ProbeThreadTest, WithdrawnMainThreadStillMarksProcessBoosted) {
 
 TEST_F(ProbeThreadTest, RepeatedRequestKeepsTimerUntilWithdrawn) {
     startHandler();
-    Mutex::Autolock lock(thread().mLock);
-    thread().addItemToQueue(1, 34);
-    const int64_t first = waitTimestampLocked(34);
+    queue(1, 34);
+    const int64_t first = waitTimestamp(34);
     ASSERT_GT(first, 0);
-    usleep(2000);
-    thread().addItemToQueue(1, 34);
-    EXPECT_EQ(waitTimestampLocked(34), first);
-    EXPECT_EQ(thread().mWaitQueue.size(), 1u);
-
-    thread().moveItemToUnboostQueue(34);
-    thread().addItemToQueue(1, 34);  // a withdrawn entry is replaced by a fresh one
-    EXPECT_GT(waitTimestampLocked(34), first);
-    EXPECT_EQ(thread().mWaitQueue.size(), 1u);
+    advance(2);
+    queue(1, 34);
+    EXPECT_EQ(waitTimestamp(34), first);
+    withdraw(34);
+    queue(1, 34);  // a withdrawn entry is replaced by a fresh one
+    EXPECT_GT(waitTimestamp(34), first);
+    EXPECT_EQ(queuedCount(), 1u);
     EXPECT_TRUE(mExecutor.calls().empty());
 }
 
-TEST_F(ProbeThreadTest, RefusedThreadGetsNoActionButStillMoves) {
-    mExecutor.setResult(Op::ProbeTid, -3);
-    startHandler();
-    {
-        Mutex::Autolock lock(thread().mLock);
-        thread().addItemToQueue(12, 34);
+// What the platform answers decides what else it is asked and what is logged; the queues move
+// on regardless. Rows: setProbeTid result, doAction result, executor present.
+struct PlatformRow {
+    int tidResult;
+    int actionResult;
+    bool executor;
+    size_t actions;  // doAction calls for a boost and its withdrawal
+    int failureLogs;
+};
+
+class ProbePlatformTest : public ProbeThreadTest,
+                          public ::testing::WithParamInterface<PlatformRow> {};
+
+TEST_P(ProbePlatformTest, PlatformAnswersDoNotStopTheQueues) {
+    const PlatformRow& row = GetParam();
+    mExecutor.setResult(Op::ProbeTid, row.tidResult);
+    mExecutor.setResult(Op::DoAction, row.actionResult);
+    if (!row.executor) {
+        mPlat.mExecutorPtr = nullptr;
     }
-    ASSERT_TRUE(mExecutor.waitFor(Op::ProbeTid, 1, kBoostDelay + kTolerance));
-    EXPECT_TRUE(waitUntil([&] { return boostedTimestamp(34) > 0; }));
-    EXPECT_TRUE(mExecutor.calls(Op::DoAction).empty());
-    EXPECT_EQ(LogCapture::countContaining("doAction failed"), 0);
+    startHandler();
+    queue(12, 34);
+    advance(kBoostDelayMs);
+    EXPECT_GT(boostedTimestamp(34), 0);
+    withdraw(34);
+    EXPECT_EQ(mExecutor.calls(Op::ProbeTid).size(), row.executor ? 2u : 0u);
+    EXPECT_EQ(mExecutor.calls(Op::DoAction).size(), row.actions);
+    EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, "handleBoostItem doAction failed"),
+              row.failureLogs);
+    EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, "handleUnBoostItem doAction failed"),
+              row.failureLogs);
 }
 
-TEST_F(ProbeThreadTest, FailedActionsAreLoggedAtDebug) {
-    mExecutor.setResult(Op::DoAction, 5);
-    startHandler();
-    {
-        Mutex::Autolock lock(thread().mLock);
-        thread().addItemToQueue(12, 34);
-    }
-    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 1, kBoostDelay + kTolerance));
-    EXPECT_TRUE(waitUntil([&] { return boostedTimestamp(34) > 0; }));
-    {
-        Mutex::Autolock lock(thread().mLock);
-        thread().moveItemToUnboostQueue(34);
-    }
-    EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, "handleBoostItem doAction failed"), 1);
-    EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, "handleUnBoostItem doAction failed"), 1);
-    EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{34, 0}, {34, -1}}));
-}
-
-TEST_F(ProbeThreadTest, MissingExecutorIsNotAnError) {
-    mPlat.mExecutorPtr = nullptr;
-    startHandler();
-    {
-        Mutex::Autolock lock(thread().mLock);
-        thread().addItemToQueue(12, 34);
-    }
-    EXPECT_TRUE(waitUntil([&] { return boostedTimestamp(34) > 0; }, kBoostDelay + kTolerance));
-    {
-        Mutex::Autolock lock(thread().mLock);
-        thread().moveItemToUnboostQueue(34);
-    }
-    EXPECT_TRUE(mExecutor.calls().empty());
-    EXPECT_EQ(LogCapture::countContaining("doAction failed"), 0);
-}
+INSTANTIATE_TEST_SUITE_P(Rows, ProbePlatformTest,
+                         ::testing::Values(PlatformRow{0, 0, true, 2, 0},
+                                           PlatformRow{-3, 0, true, 0, 0},  // refused thread
+                                           PlatformRow{0, 5, true, 2, 1},   // failed action
+                                           PlatformRow{0, 0, false, 0, 0}));
 
 // Duration of the probe action handed to the constructor -> duration the platform sees.
-class ProbeActionCapTest : public ProbeFixture,
+class ProbeActionCapTest : public ProbeThreadTest,
                            public ::testing::WithParamInterface<std::pair<int, int>> {};
 
 TEST_P(ProbeActionCapTest, StartupActionDurationIsCappedAt100) {
     startHandler(makeProbeAction(GetParam().first));
-    {
-        Mutex::Autolock lock(thread().mLock);
-        thread().addItemToQueue(12, 34);
-    }
-    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 1, kBoostDelay + kTolerance));
+    queue(12, 34);
+    advance(kBoostDelayMs);
+    ASSERT_EQ(mExecutor.calls(Op::DoAction).size(), 1u);
     EXPECT_EQ(mExecutor.calls(Op::DoAction)[0].duration, GetParam().second);
 }
 

@@ -258,15 +258,6 @@ TEST_F(SchedLevelManagerTest, FailedFirstReferenceEventStillCountsAsRecorded) {
     EXPECT_EQ(sendCount(), 0u);
 }
 
-TEST_F(SchedLevelManagerTest, EventWithoutExecutorIsRolledBack) {
-    easDefaults();
-    const Tables before = snapshot();
-    mPlat.mExecutorPtr = nullptr;
-    EXPECT_EQ(event(4500, {53, 20}), -1);
-    EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, kSendFailed), 2);
-    EXPECT_TRUE(snapshot() == before);
-}
-
 }  // namespace
 }  // namespace fake
 }  // namespace velmora

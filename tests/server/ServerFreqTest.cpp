@@ -129,11 +129,20 @@ TEST_F(ServerFreqTest, NotificationEnablesUploadOnceAndForAll) {
     EXPECT_EQ(executor().calls(Op::SetConfig).size(), 3u);
 }
 
+TEST_F(ServerFreqTest, EmptyRequestReachesTheFrequencyManager) {
+    EXPECT_EQ(mServer->velmoraSetConfig(1, 0, nullptr, nullptr), 0);
+    ASSERT_EQ(executor().calls(Op::SetConfig).size(), 1u);
+    EXPECT_EQ(lastSet().id, 1);
+    EXPECT_TRUE(lastSet().tags.empty());
+}
+
 TEST_F(ServerFreqTest, QueriesGoStraightToThePlatform) {
     executor().setConfigValue(24, 2419200);
     const int tags[] = {24, 99};
     int values[] = {-1, -1};
+    EXPECT_EQ(dump("--logon"), "velmora log is ON\n\n");
     EXPECT_EQ(mServer->velmoraGetConfig(2, tags, values), 0);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO, "velmoraGetConfig tagLen=2"));
     EXPECT_EQ(values[0], 2419200);
     EXPECT_EQ(values[1], -1);
     executor().setResult(Op::GetConfig, 1);

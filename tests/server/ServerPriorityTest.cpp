@@ -2,7 +2,6 @@
 // that are read, the rebuild on reload, and the selection rules with their tie-breaks.
 #include <map>
 #include <ostream>
-#include <set>
 #include <string>
 #include <vector>
 
@@ -60,18 +59,6 @@ using StepList = std::vector<std::pair<int, int>>;
 TEST_F(ServerPriorityTest, WithoutConfiguredPrioritiesOnlyTheBuiltinsExist) {
     start(kBuiltinScenes + scene(4122) + scene(4300));
     EXPECT_EQ(priorities(), kBuiltins);
-    // The built-in order: 4119 over 4118 over 4121 over 4120.
-    ASSERT_EQ(on(4120), 0);
-    ASSERT_EQ(on(4121), 0);
-    ASSERT_EQ(on(4118), 0);
-    ASSERT_EQ(on(4119), 0);
-    EXPECT_EQ(steps(), StepList({{4120, kOn},
-                                 {4120, kOff},
-                                 {4121, kOn},
-                                 {4121, kOff},
-                                 {4118, kOn},
-                                 {4118, kOff},
-                                 {4119, kOn}}));
     EXPECT_EQ(on(4122), -1);
     EXPECT_EQ(on(4300), -1);
     EXPECT_TRUE(
@@ -120,10 +107,8 @@ INSTANTIATE_TEST_SUITE_P(
         PriorityRow{"builtin_overridden", 4118, "<t1>5</t1><t101>150</t101>", 150},
         PriorityRow{"upper_bound", 4118, "<t101>500</t101>", 500},
         PriorityRow{"lower_bound", 4120, "<t101>1</t101>", 1},
-        PriorityRow{"above_range_keeps_builtin", 4118, "<t101>600</t101>", 100},
         PriorityRow{"just_above_range_keeps_builtin", 4121, "<t101>501</t101>", 70},
         PriorityRow{"zero_keeps_builtin", 4118, "<t101>0</t101>", 100},
-        PriorityRow{"negative_keeps_builtin", 4119, "<t101>-5</t101>", 200},
         // Several tag-101 pairs: the last one wins, even when it is out of range.
         PriorityRow{"last_tag_wins", 4118, "<t101>30</t101><t2>1</t2><t101>40</t101>", 40},
         PriorityRow{"invalid_last_tag_wins", 4118, "<t101>150</t101><t101>600</t101>", 100},
@@ -217,69 +202,6 @@ TEST_F(ServerPriorityTest, PriorityReadersTakeTheLastMatchingPair) {
     EXPECT_EQ(server.getPriority(&gov), 0);
     Action noKey(4300, "", 0, 1, {"priority ", "30"});
     EXPECT_EQ(server.getInterPriority(&noKey), 0);
-}
-
-TEST_F(ServerPriorityTest, DecisionCodesOfOnAndOffEvents) {
-    VelmoraServer server;
-    VelmoraServer* s = &server;
-    android::Mutex::Autolock lock(s->mMutex);
-    // 0: apply alone; 1: does not outrank; 3: withdraw the previous one first.
-    EXPECT_EQ(s->doOnEvent(4118, 100, 0), 0);
-    s->mCurSpecialCmdId = 4118;
-    EXPECT_EQ(s->doOnEvent(4120, 20, 100), 1);
-    EXPECT_EQ(s->doOnEvent(4121, 100, 100), 1);
-    EXPECT_EQ(s->doOnEvent(4119, 200, 100), 3);
-    s->mCurSpecialCmdId = 4119;
-    EXPECT_EQ(s->mOnEventSet, std::set<int32_t>({4118, 4119, 4120, 4121}));
-
-    int next = -5;
-    int flag = -5;
-    // 2: the ended scene was not applied.
-    EXPECT_EQ(s->doOffEvent(4120, &next, &flag), 2);
-    EXPECT_EQ(next, -5);
-    // 3: the best remaining scene follows.
-    EXPECT_EQ(s->doOffEvent(4119, &next, &flag), 3);
-    EXPECT_EQ(next, 4118);
-    EXPECT_EQ(flag, 0);
-    EXPECT_EQ(s->mCurSpecialCmdId, 4118);
-    EXPECT_EQ(s->doOffEvent(4121, &next, &flag), 2);
-    // 0: nothing left, the ended scene is reported back.
-    flag = -5;
-    EXPECT_EQ(s->doOffEvent(4118, &next, &flag), 0);
-    EXPECT_EQ(next, 4118);
-    EXPECT_EQ(flag, -5);
-    EXPECT_EQ(s->mCurSpecialCmdId, 0);
-    EXPECT_TRUE(s->mOnEventSet.empty());
-}
-
-TEST_F(ServerPriorityTest, GovernorSelection) {
-    VelmoraServer server;
-    VelmoraServer* s = &server;
-    android::Mutex::Autolock lock(s->mMutex);
-    s->mPriorityMap[4230] = 50;
-    s->mPriorityMap[4240] = 50;
-    s->mPriorityMap[4250] = 80;
-    s->mOnEventSet = {4118, 4119, 4230, 4240};
-    s->mCurSpecialCmdId = 4118;
-    // Only under scene 4119, and only for governor scenes.
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 0);
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOffEvent(), 0);
-    s->mCurSpecialCmdId = 4119;
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4121), 0);
-    // A tie goes to the new scene when switching on, to the smaller cmdId otherwise.
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 4240);
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOffEvent(), 4230);
-    s->mOnEventSet.insert(4250);
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOnEvent(4240), 4250);
-    EXPECT_EQ(s->getMaxGovPrioCmdIdInOffEvent(), 4250);
-    EXPECT_EQ(s->getCmdIdWithMaxPrio(false), 4119);
-    // A scene without priority still beats an empty choice.
-    s->mOnEventSet = {4300};
-    EXPECT_EQ(s->getCmdIdWithMaxPrio(true), 4300);
-    s->mOnEventSet = {4118};
-    EXPECT_EQ(s->getCmdIdWithMaxPrio(true), 0);
-    s->mOnEventSet.clear();
-    EXPECT_EQ(s->getCmdIdWithMaxPrio(false), 0);
 }
 
 }  // namespace

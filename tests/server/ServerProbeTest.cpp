@@ -1,11 +1,7 @@
 // Probe events (4116) through velmoraEvent: what reaches the platform and when, the statuses
-// the host gets back, the probe action taken from the configuration at start-up and on reload,
-// and reloads racing with probe events and the worker.
-#include <unistd.h>
-
-#include <atomic>
+// the host gets back, and the probe action taken from the configuration at start-up and on
+// reload. The worker runs on the system's clock here: these are the real-time tests of it.
 #include <string>
-#include <thread>
 #include <vector>
 
 #include "probe/ProbeHandler.h"
@@ -21,8 +17,8 @@ using std::chrono::milliseconds;
 constexpr int kProbe = 4116;
 constexpr int kReload = 20230;
 constexpr milliseconds kBoostDelay{8};
-// How late the worker (or the host threads of the race) may be on a loaded, sanitized build.
-constexpr milliseconds kTolerance{250};
+// Only bounds how long a broken worker is waited for.
+constexpr milliseconds kTolerance{10000};
 
 // kStartupCommands with the probe command's duration and parameter replaced.
 std::string commandsWithProbe(int duration, int value) {
@@ -64,10 +60,9 @@ TEST_F(ServerProbeTest, BoostsAfterDelayWithConfiguredActionAndWithdrawsOnReques
     EXPECT_EQ(tidCalls(), (TidCalls{{34, 0}}));
     const auto calls = executor().calls();
     ASSERT_EQ(calls.size(), 2u);
-    // The thread is selected before the action runs, neither before the delay nor long after.
+    // The thread is selected before the action runs, not before the delay.
     EXPECT_EQ(calls[0].op, Op::ProbeTid);
     EXPECT_GE(calls[0].when - queued, kBoostDelay);
-    EXPECT_LE(calls[0].when - queued, kBoostDelay + kTolerance);
     EXPECT_EQ(calls[1].op, Op::DoAction);
     EXPECT_EQ(calls[1].id, kProbe);
     EXPECT_EQ(calls[1].name, "probe");
@@ -79,20 +74,6 @@ TEST_F(ServerProbeTest, BoostsAfterDelayWithConfiguredActionAndWithdrawsOnReques
     EXPECT_EQ(tidCalls(), (TidCalls{{34, 0}, {34, -1}}));
     ASSERT_EQ(executor().calls(Op::DoAction).size(), 2u);
     EXPECT_EQ(executor().calls(Op::DoAction)[1].payload, (std::vector<int>{-1}));
-}
-
-TEST_F(ServerProbeTest, HandlerFailuresComeBackToHost) {
-    ASSERT_EQ(startServer(), 0);
-    executor().clear();
-    EXPECT_EQ(probe("pid=12", 0), 1);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmora: get msg info failed!"));
-    EXPECT_EQ(probe("", 0), -1);
-    EXPECT_EQ(probe("pid=12|tid=34", 3), 2);
-    const int twoStates[2] = {0, 0};
-    EXPECT_EQ(mServer->velmoraEvent(kProbe, "pid=12|tid=34", 2, twoStates), 2);
-    EXPECT_EQ(mServer->velmoraEvent(kProbe, "pid=12|tid=34", 1, nullptr), 2);
-    EXPECT_EQ(LogCapture::count(ANDROID_LOG_ERROR, "velmoraEvent do probe handle failed!"), 5);
-    EXPECT_FALSE(executor().waitFor(Op::ProbeTid, 1, 3 * kBoostDelay));
 }
 
 TEST_F(ServerProbeTest, ThreadOfBoostedProcessSkipsDelay) {
@@ -136,74 +117,6 @@ TEST_F(ServerProbeTest, ReleasingComponentsStopsPendingProbeWork) {
     const size_t before = executor().calls(Op::ProbeTid).size();
     EXPECT_FALSE(executor().waitFor(Op::ProbeTid, before + 1, 3 * kBoostDelay));
     EXPECT_EQ(probe("pid=12|tid=34", -1), 4);
-}
-
-// Reloads replace the probe action while host threads queue, boost and withdraw threads and
-// the worker boosts them: every action the platform sees is one of the two configured ones,
-// intact, and the reloaded one is in force afterwards.
-TEST_F(ServerProbeTest, ReloadRacesWithProbeEventsAndWorker) {
-    ASSERT_EQ(startServer(), 0);
-    writeCustConfig(policyXml(commandsWithProbe(8, 2000)));
-    executor().clear();
-    // Keeps the action in use a little longer while the lock is held.
-    executor().setActionHook([](const Action*) { usleep(100); });
-
-    std::atomic<int> failures{0};
-    std::thread reloader([&] {
-        for (int i = 0; i < 20; ++i) {
-            failures += mServer->velmoraEvent(kReload, "", 0, nullptr) != 0;
-            usleep(500);
-        }
-    });
-    std::vector<std::thread> probers;
-    for (int p = 0; p < 2; ++p) {
-        probers.emplace_back([&, p] {
-            for (int i = 0; i < 150; ++i) {
-                // Every tenth thread is its process's main thread, so later threads of that
-                // process are boosted on the calling thread instead of the worker.
-                const int pid = 100 + p * 100 + i / 10;
-                const int tid = i % 10 == 0 ? pid : 1000 + p * 1000 + i;
-                const std::string msg =
-                    "pid=" + std::to_string(pid) + "|tid=" + std::to_string(tid);
-                const int state = i % 3 == 2 ? -1 : 0;
-                failures += mServer->velmoraEvent(kProbe, msg.c_str(), 1, &state) != 0;
-                usleep(i % 4 == 0 ? 2000 : 200);
-            }
-        });
-    }
-    reloader.join();
-    for (auto& t : probers) {
-        t.join();
-    }
-    EXPECT_EQ(failures.load(), 0);
-
-    const auto raced = executor().calls(Op::DoAction);
-    EXPECT_FALSE(raced.empty());
-    for (const auto& call : raced) {
-        EXPECT_EQ(call.id, kProbe);
-        EXPECT_EQ(call.name, "probe");
-        EXPECT_EQ(call.duration, 8);
-        EXPECT_TRUE(call.tagValues == (std::vector<int>{1, 1000}) ||
-                    call.tagValues == (std::vector<int>{1, 2000}));
-        EXPECT_TRUE(call.payload == std::vector<int>{0} || call.payload == std::vector<int>{-1});
-    }
-
-    // The probe action after the last reload: the action run right after selecting a fresh
-    // thread (both happen under the worker's lock, so nothing comes in between).
-    EXPECT_EQ(probe("pid=9998|tid=9999", 0), 0);
-    std::vector<int> lastTagValues;
-    const auto deadline = Clock::now() + kBoostDelay + kTolerance;
-    while (lastTagValues.empty() && Clock::now() < deadline) {
-        const auto calls = executor().calls();
-        for (size_t i = 0; i + 1 < calls.size(); ++i) {
-            if (calls[i].op == Op::ProbeTid && calls[i].tid == 9999 &&
-                calls[i + 1].op == Op::DoAction) {
-                lastTagValues = calls[i + 1].tagValues;
-            }
-        }
-        usleep(1000);
-    }
-    EXPECT_EQ(lastTagValues, (std::vector<int>{1, 2000}));
 }
 
 }  // namespace

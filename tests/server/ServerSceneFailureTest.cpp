@@ -1,13 +1,7 @@
 // Special scenes when something goes wrong: invalid payloads, platform failures and a missing
-// executor, a scene dropped by a reload, and host threads switching scenes concurrently while the
-// configuration is reloaded.
+// executor, and a scene dropped by a reload.
 #include <fcntl.h>
 #include <unistd.h>
-
-#include <algorithm>
-#include <atomic>
-#include <random>
-#include <thread>
 
 #include "config/Action.h"
 #include "tests/server/SceneTestSupport.h"
@@ -114,94 +108,6 @@ TEST_F(ServerSceneTest, DebugLogTracesEverySceneAction) {
     LogCapture::clear();
     ASSERT_EQ(off(4119), 0);
     EXPECT_EQ(LogCapture::countContaining("doSpecialAction"), 0);
-}
-
-// Host threads switch scenes concurrently; whatever the interleaving, the current scene must
-// be a switched-on scene of the highest priority, and none when nothing is on. Checked under
-// mMutex while the switches run and once they are done.
-::testing::AssertionResult currentIsBest(const SceneState& s) {
-    if (s.on.empty()) {
-        if (s.cur == 0) {
-            return ::testing::AssertionSuccess();
-        }
-        return ::testing::AssertionFailure() << "nothing on but current scene " << s.cur;
-    }
-    if (s.on.count(s.cur) == 0) {
-        return ::testing::AssertionFailure() << "current scene " << s.cur << " is not on";
-    }
-    int best = -1;
-    for (int id : s.on) {
-        auto it = s.prio.find(id);
-        best = std::max(best, it == s.prio.end() ? 0 : it->second);
-    }
-    const int cur = s.prio.count(s.cur) ? s.prio.at(s.cur) : 0;
-    if (cur != best) {
-        return ::testing::AssertionFailure()
-               << "current scene " << s.cur << " has priority " << cur << ", best on is " << best;
-    }
-    return ::testing::AssertionSuccess();
-}
-
-TEST_F(ServerSceneTest, ConcurrentSwitchesKeepTheBestSceneCurrent) {
-    // 4122 (150) and 4123 (70, tied with 4121) join the built-ins and governor scenes.
-    start(kSceneCommands + scene(4122, "<t101>150</t101>") + scene(4123, "<t101>70</t101>"));
-    const std::vector<int> ids = {4118, 4119, 4120, 4121, 4122, 4123, 4230, 4240, 4250, 4260};
-    constexpr int kThreads = 4;
-    constexpr int kSwitchesPerThread = 300;
-
-    std::atomic<bool> done{false};
-    std::atomic<int> violations{0};
-    std::thread checker([&] {
-        while (!done.load()) {
-            if (!currentIsBest(snapshot(mServer.get()))) {
-                ++violations;
-            }
-            std::this_thread::yield();
-        }
-    });
-    std::vector<std::thread> workers;
-    for (int t = 0; t < kThreads; ++t) {
-        workers.emplace_back([&, t] {
-            std::mt19937 rng(1234 + t);
-            for (int i = 0; i < kSwitchesPerThread; ++i) {
-                const int id = ids[rng() % ids.size()];
-                const int value = (rng() % 2) ? kOn : kOff;
-                mServer->velmoraEvent(id, "", 1, &value);
-                if (t == 0 && i % 97 == 96) {
-                    mServer->velmoraEvent(kClientRestart, "", 0, nullptr);
-                }
-            }
-        });
-    }
-    // Reloads rebuild the priority table (parser write lock, then mMutex) while switches run
-    // (mMutex released before the parser's read lock is taken): a lock-order slip hangs here.
-    workers.emplace_back([&] {
-        for (int i = 0; i < 10; ++i) {
-            EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
-            std::this_thread::yield();
-        }
-    });
-    for (auto& w : workers) {
-        w.join();
-    }
-    done = true;
-    checker.join();
-
-    EXPECT_EQ(violations.load(), 0);
-    const SceneState last = state();
-    EXPECT_TRUE(currentIsBest(last));
-    // Switching everything off leaves no scene; the last scene applied is withdrawn last.
-    steps();
-    for (int id : ids) {
-        off(id);
-    }
-    EXPECT_TRUE(state().on.empty());
-    EXPECT_EQ(state().cur, 0);
-    const Steps tail = steps();
-    if (last.cur != 0) {
-        ASSERT_FALSE(tail.empty());
-        EXPECT_EQ(tail.back().payload, std::vector<int>({kOff}));
-    }
 }
 
 }  // namespace

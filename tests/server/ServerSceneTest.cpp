@@ -116,17 +116,6 @@ TEST_F(ServerSceneTest, GovernorSceneAboveScene4119TakesOverLikeAnyScene) {
     EXPECT_EQ(state().cur, 4119);
 }
 
-TEST_F(ServerSceneTest, GovernorScenesWaitUnderOtherScenes) {
-    start();
-    ASSERT_EQ(on(4118), 0);
-    steps();
-    EXPECT_EQ(on(4230), 0);
-    EXPECT_EQ(on(4250), 0);
-    EXPECT_EQ(off(4250), 0);
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(state().cur, 4118);
-}
-
 TEST_F(ServerSceneTest, ClientRestartWithdrawsTheCurrentSceneAndForgetsTheRest) {
     start();
     // Without a current scene a restart has nothing to withdraw.

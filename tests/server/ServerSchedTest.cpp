@@ -145,13 +145,9 @@ INSTANTIATE_TEST_SUITE_P(
     ::testing::Values(
         BadDefaultsRow{"ThreePairs", "<t51>0</t51><t52>0</t52><t53>0</t53>", ANDROID_LOG_ERROR,
                        "init default group failed! tagLen must be (eas:8, hmp:1)"},
-        BadDefaultsRow{"SingleEasPair", "<t51>0</t51>", ANDROID_LOG_ERROR,
-                       "init default group failed! tagLen must be (eas:8, hmp:1)"},
         BadDefaultsRow{"HmpAmongEasPairs", easXml("t50"), ANDROID_LOG_ERROR,
                        "invalid eas group, group tag is 0"},
         BadDefaultsRow{"NinePairs", easXml() + "<t51>0</t51>", ANDROID_LOG_DEBUG,
-                       "cmdId(5376) (duration=0): group num is invalid, max group num is 8!"},
-        BadDefaultsRow{"NoPairs", "", ANDROID_LOG_DEBUG,
                        "cmdId(5376) (duration=0): group num is invalid, max group num is 8!"},
         BadDefaultsRow{"FrequencyTag", easXml("t42"), ANDROID_LOG_DEBUG,
                        "cmdId(5376) (duration=0) does not support other tags except sched "

@@ -20,6 +20,12 @@ TEST_F(VelmoraServerInitTest, StartsOnMinimalConfiguration) {
     EXPECT_EQ(env().lastPlat->mServerPtr, mServer.get());
     ASSERT_NE(env().lastPlat->mParserPtr, nullptr);
     EXPECT_EQ(env().lastPlat->mParserPtr->mServerPtr, mServer.get());
+    EXPECT_EQ(dump("--help"),
+              "--help: print debug usage\n"
+              "--logon: open debug log\n"
+              "--logoff: close debug log\n"
+              "--freqlist: print set freq list\n"
+              "--easgrouplist: print set eas group list\n\n");
 }
 
 TEST_F(VelmoraServerInitTest, MissingPlatformFails) {
