@@ -153,20 +153,6 @@ TEST_F(ProbeHandlerTest, StoppedHandlerLeavesPlatformAlone) {
     EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{10, 0}}));
 }
 
-// On the system's clock, in real time: deleting the handler while the worker polls a boosted
-// thread and waits out a delay stops it, and nothing reaches the platform afterwards.
-TEST_F(ProbeHandlerTest, DeletingHandlerStopsWorkerOnTheSystemClock) {
-    FakeProbeClock::uninstall();
-    startHandler();
-    EXPECT_EQ(probe(10, 10, 0), 0);
-    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 1, std::chrono::seconds(10)));
-    EXPECT_EQ(probe(12, 34, 0), 0);
-
-    mHandler.reset();
-    const size_t before = mExecutor.calls(Op::ProbeTid).size();
-    EXPECT_FALSE(mExecutor.waitFor(Op::ProbeTid, before + 1, std::chrono::milliseconds(24)));
-}
-
 }  // namespace
 }  // namespace fake
 }  // namespace velmora

@@ -146,19 +146,6 @@ TEST_F(SchedLevelManagerTest, EventOverwritesLevelsTheZolaClientSet) {
     EXPECT_EQ(onlySent(), easLevels(ZOLA_SCHED_LEVEL_NONE, {{53, 30}}));
 }
 
-TEST_F(SchedLevelManagerTest, OnlyTheFirstReferenceEventIsKept) {
-    easDefaults();
-    ASSERT_EQ(event(4114, {53, 20}), 0);
-    ASSERT_EQ(event(4114, {53, 30}), 0);
-    EXPECT_EQ(snapshot().zolaFirst, allGroups(ZOLA_SCHED_LEVEL_NONE, {{53, 20}}));
-    mExecutor.clear();
-
-    // 53 now holds the second 4114's level, so 4113 has nothing to move.
-    EXPECT_EQ(event(4113, {53, 0}), 0);
-    EXPECT_EQ(sendCount(), 0u);
-    EXPECT_EQ(snapshot().zola[53], 30);
-}
-
 TEST_F(SchedLevelManagerTest, FollowerBeforeAnyReferenceWritesUnsetGroups) {
     easDefaults();
     EXPECT_EQ(event(4113, {53, 10}), 0);

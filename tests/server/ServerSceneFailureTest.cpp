@@ -1,8 +1,5 @@
 // Special scenes when something goes wrong: invalid payloads, platform failures and a missing
 // executor, and a scene dropped by a reload.
-#include <fcntl.h>
-#include <unistd.h>
-
 #include "config/Action.h"
 #include "tests/server/SceneTestSupport.h"
 
@@ -84,8 +81,7 @@ TEST_F(ServerSceneTest, SceneDroppedByAReloadCannotBeWithdrawn) {
     start();
     ASSERT_EQ(on(4118), 0);
     steps();
-    writeCustConfig(policyXml(std::string(kStartupCommands) + scene(4119)));
-    ASSERT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
+    ASSERT_EQ(reload(scene(4119)), 0);
     // Withdrawing 4118 fails to parse (2); applying 4119 succeeds (0).
     EXPECT_EQ(on(4119), 2);
     EXPECT_TRUE(
@@ -96,15 +92,12 @@ TEST_F(ServerSceneTest, SceneDroppedByAReloadCannotBeWithdrawn) {
 
 TEST_F(ServerSceneTest, DebugLogTracesEverySceneAction) {
     start();
-    const int fd = open("/dev/null", O_WRONLY);
-    ASSERT_GE(fd, 0);
-    mServer->dumpVelmoraServerInfo(fd, {"--logon"});
+    dump("--logon");
     ASSERT_EQ(on(4118), 0);
     ASSERT_EQ(on(4119), 0);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO, "doSpecialAction cmdId is 4118, payload is -1"));
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO, "doSpecialAction cmdId is 4119, payload is 0"));
-    mServer->dumpVelmoraServerInfo(fd, {"--logoff"});
-    close(fd);
+    dump("--logoff");
     LogCapture::clear();
     ASSERT_EQ(off(4119), 0);
     EXPECT_EQ(LogCapture::countContaining("doSpecialAction"), 0);

@@ -46,29 +46,19 @@ TEST_F(ServerSceneTest, LowerScenesWaitInTheSetUntilTheHigherOneEnds) {
     steps();
     EXPECT_EQ(on(4120), 0);
     EXPECT_EQ(on(4121), 0);
+    // A waiting scene switched off, and a scene that was never on, leave the platform alone.
+    EXPECT_EQ(off(4120), 0);
+    EXPECT_EQ(off(4119), 0);
     EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(state().on, std::set<int32_t>({4118, 4120, 4121}));
+    EXPECT_EQ(state().on, std::set<int32_t>({4118, 4121}));
     EXPECT_EQ(state().cur, 4118);
 
     // The best waiting scene (4121, 70) comes next, then 4120 (20).
+    EXPECT_EQ(on(4120), 0);
     EXPECT_EQ(off(4118), 0);
     EXPECT_EQ(steps(), Steps({withdraw(4118), apply(4121)}));
     EXPECT_EQ(off(4121), 0);
     EXPECT_EQ(steps(), Steps({withdraw(4121), apply(4120)}));
-}
-
-TEST_F(ServerSceneTest, WaitingSceneSwitchedOffLeavesThePlatformAlone) {
-    start();
-    ASSERT_EQ(on(4118), 0);
-    ASSERT_EQ(on(4120), 0);
-    steps();
-    EXPECT_EQ(off(4120), 0);
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(state().on, std::set<int32_t>({4118}));
-    // A scene that was never on is just as harmless.
-    EXPECT_EQ(off(4121), 0);
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(state().cur, 4118);
 }
 
 TEST_F(ServerSceneTest, GovernorScenesUnderScene4119) {
@@ -126,10 +116,14 @@ TEST_F(ServerSceneTest, ClientRestartWithdrawsTheCurrentSceneAndForgetsTheRest) 
     steps();
     const auto prioBefore = state().prio;
 
-    EXPECT_EQ(restart(), 0);
+    // The withdrawal's result is passed through.
+    executor().setResult(Op::DoAction, 9);
+    EXPECT_EQ(restart(), 9);
+    executor().setResult(Op::DoAction, 0);
     EXPECT_EQ(steps(), Steps({withdraw(4118)}));
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO,
                                 "client may rebooted, clean special scene set, cmdId is 20224"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4118"));
     EXPECT_EQ(state().cur, 0);
     EXPECT_TRUE(state().on.empty());
     EXPECT_EQ(state().prio, prioBefore);
@@ -139,15 +133,6 @@ TEST_F(ServerSceneTest, ClientRestartWithdrawsTheCurrentSceneAndForgetsTheRest) 
     EXPECT_EQ(off(4120), 0);
     EXPECT_EQ(on(4121), 0);
     EXPECT_EQ(steps(), Steps({apply(4121)}));
-}
-
-TEST_F(ServerSceneTest, ClientRestartPassesTheWithdrawResultThrough) {
-    start();
-    ASSERT_EQ(on(4119), 0);
-    executor().setResult(Op::DoAction, 9);
-    EXPECT_EQ(restart(), 9);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4119"));
-    EXPECT_EQ(state().cur, 0);
 }
 
 TEST_F(ServerSceneTest, UnconfiguredPriorityIsRefusedWithoutTouchingTheState) {

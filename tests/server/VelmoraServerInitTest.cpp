@@ -67,8 +67,8 @@ TEST_F(VelmoraServerInitTest, EmptyConfigurationFailsParserCreation) {
 }
 
 TEST_F(VelmoraServerInitTest, MissingStartupCommandLeavesServerUninitialised) {
-    writeCustConfig(policyXml(
-        "<cmd id=\"4116\" name=\"probe\"><act><duration>8</duration></act></cmd>"));
+    writeCustConfig(
+        policyXml("<cmd id=\"4116\" name=\"probe\"><act><duration>8</duration></act></cmd>"));
     mServer = std::make_unique<VelmoraServer>();
     EXPECT_EQ(mServer->init(), 2);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "init default group sched level failed!"));
@@ -78,9 +78,9 @@ TEST_F(VelmoraServerInitTest, MissingStartupCommandLeavesServerUninitialised) {
 }
 
 TEST_F(VelmoraServerInitTest, MissingProbeCommandKeepsServerRunning) {
-    writeCustConfig(policyXml(
-        "<cmd id=\"5376\"><act><duration>0</duration><t50>0</t50></act></cmd>"
-        "<cmd id=\"4400\"><act><duration>100</duration><t1>1000</t1></act></cmd>"));
+    writeCustConfig(
+        policyXml("<cmd id=\"5376\"><act><duration>0</duration><t50>0</t50></act></cmd>"
+                  "<cmd id=\"4400\"><act><duration>100</duration><t1>1000</t1></act></cmd>"));
     mServer = std::make_unique<VelmoraServer>();
     EXPECT_EQ(mServer->init(), 4);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "doParse probe event failed!"));
