@@ -73,21 +73,6 @@ INSTANTIATE_TEST_SUITE_P(
         PriorityRow{"scene_4352_never_configured", 4352, "<s_priority>60</s_priority>", 0}),
     [](const ::testing::TestParamInfo<PriorityRow>& info) { return std::string(info.param.what); });
 
-TEST_F(ServerSceneTest, EqualPrioritiesGoToTheSmallerCmdId) {
-    start(scene(4118) + scene(4119) + scene(4121, "<t101>100</t101>"));
-    ASSERT_EQ(on(4119), 0);
-    ASSERT_EQ(on(4121), 0);
-    ASSERT_EQ(on(4118), 0);
-    steps();
-    EXPECT_EQ(off(4119), 0);
-    EXPECT_EQ(steps(), Steps({withdraw(4119), apply(4118)}));
-    // An equal priority never takes over the current scene.
-    EXPECT_EQ(off(4118), 0);
-    EXPECT_EQ(steps(), Steps({withdraw(4118), apply(4121)}));
-    EXPECT_EQ(on(4118), 0);
-    EXPECT_EQ(steps(), Steps());
-}
-
 TEST_F(ServerSceneTest, ReloadRebuildsTheTableFromScratch) {
     start(scene(4118, "<t101>150</t101>") + scene(4119) + scene(4120) + scene(4121) +
           scene(4130, "<t101>300</t101>") + scene(4131) +
