@@ -16,8 +16,6 @@ constexpr int kB = VELMORA_TAG_BIG_CPU_MAX_FREQ;
 constexpr int kFork = VELMORA_TAG_FORK_ON_BIG_CLUSTER;
 constexpr int kIpaSwitch = VELMORA_TAG_IPA_SWITCH_TEMP;
 
-// ---- Client requests -----------------------------------------------------------------------
-
 TEST_F(FreqManagerTest, WithdrawnCapSendsZeroUnlessAnEventCaps) {
     ASSERT_EQ(client(1, {{kB, 0}, {kIpaSwitch, 0}}), 0);
     EXPECT_EQ(lastSent(1, {kB, kIpaSwitch}), (Ints{0, 0}));
@@ -122,8 +120,6 @@ TEST_F(FreqManagerTest, EventIdWithoutOnOffIsRejectedSilently) {
     EXPECT_TRUE(mExec.calls().empty());
     EXPECT_TRUE(LogCapture::lines().empty());
 }
-
-// ---- Feature switch and statistics ---------------------------------------------------------
 
 TEST_F(FreqManagerTest, FeatureSwitchOnlyEverTurnsUploadOn) {
     const int tag = VELMORA_TAG_FEATURE_SWITCH;

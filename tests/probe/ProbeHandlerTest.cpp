@@ -91,20 +91,6 @@ TEST_F(ProbeHandlerTest, StateMinusOneWithdrawsBoostedThreadOnce) {
     EXPECT_EQ(mExecutor.calls().size(), 4u);
 }
 
-TEST_F(ProbeHandlerTest, UpdateReplacesActionWithoutCap) {
-    startHandler();
-    Action* chain = makeProbeAction(5000, 2000);
-    chain->mNext = makeProbeAction(7, 7);  // the whole chain is taken over and freed later
-    EXPECT_EQ(mHandler->updateProbeThread(chain), 0);
-
-    EXPECT_EQ(probe(12, 34, 0), 0);
-    advance(kBoostDelayMs);
-    ASSERT_EQ(mExecutor.calls(Op::DoAction).size(), 1u);
-    const auto action = mExecutor.calls(Op::DoAction)[0];
-    EXPECT_EQ(action.duration, 5000);
-    EXPECT_EQ(action.tagValues, (std::vector<int>{1, 2000}));
-}
-
 TEST_F(ProbeHandlerTest, ActionChainsAreFreedOnUpdateAndWithHandler) {
     int first = 0;
     int second = 0;

@@ -24,7 +24,7 @@ std::string ratioText(const std::string& big, const std::string& little) {
 }
 
 class ServerMemlatencyTest : public ServerTest {
-protected:
+  protected:
     void start(const std::string& extra = "") {
         ASSERT_EQ(startServer(extra), 0);
         executor().clear();
@@ -60,93 +60,78 @@ TEST_F(ServerMemlatencyTest, RatiosReachThePlatformAsStringPairs) {
 TEST_F(ServerMemlatencyTest, RatioKeepsAtMost510Characters) {
     start();
     const std::string fits(510, '3');
+    const std::string tooLong(511, '3');
     EXPECT_EQ(ratio(ratioText(fits, fits)), 0);
-    const auto calls = actions();
+    auto calls = actions();
     ASSERT_EQ(calls.size(), 1u);
     EXPECT_EQ(calls[0].params[1], fits);
     EXPECT_EQ(calls[0].params[3], fits);
-}
 
-// Refused events: texts that do not carry both ratios fail to parse; payloads other than
-// exactly one 0 or -1 are refused for both ids before the text is looked at.
-const std::string kTooLong(511, '3');
-const char* const kParserFailed = "parser failed! cmdId=20480";
-
-struct RefusedRow {
-    const char* what;
-    int cmdId;
-    std::string msg;
-    std::vector<int> payload;  // empty: null pointer
-    unsigned int payloadNum;
-    std::string log;
-};
-
-class ServerMemlatencyRefusedTest : public ServerMemlatencyTest,
-                                    public ::testing::WithParamInterface<RefusedRow> {};
-
-TEST_P(ServerMemlatencyRefusedTest, ReturnsThreeAndLeavesThePlatformAlone) {
-    start(kLatencyCommand);
-    const RefusedRow& row = GetParam();
-    const int* payload = row.payload.empty() ? nullptr : row.payload.data();
-    EXPECT_EQ(mServer->velmoraEvent(row.cmdId, row.msg.c_str(), row.payloadNum, payload), 3);
-    EXPECT_EQ(LogCapture::count(ANDROID_LOG_ERROR, row.log), 1) << row.log;
+    executor().clear();
+    EXPECT_EQ(ratio(ratioText(tooLong, "0.7")), 3);
+    EXPECT_EQ(ratio(ratioText("0.5", tooLong)), 3);
+    EXPECT_EQ(LogCapture::count(ANDROID_LOG_ERROR, "parser failed! cmdId=20480"), 2);
     EXPECT_TRUE(actions().empty());
 }
 
-std::string payloadInvalid(int cmdId) {
-    return "payload is invalid! cmdId=" + std::to_string(cmdId);
+// Event texts that do not carry both ratios.
+struct TextRow {
+    const char* what;
+    const char* msg;  // null: no text at all
+};
+
+class ServerMemlatencyTextTest : public ServerMemlatencyTest,
+                                 public ::testing::WithParamInterface<TextRow> {};
+
+TEST_P(ServerMemlatencyTextTest, FailsToParse) {
+    start();
+    const int on = kOn;
+    EXPECT_EQ(mServer->velmoraEvent(kRatioEvent, GetParam().msg, 1, &on), 3);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "parser failed! cmdId=20480"));
+    EXPECT_TRUE(actions().empty());
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Rows, ServerMemlatencyRefusedTest,
-    ::testing::Values(
-        RefusedRow{"first_ratio_too_long",
-                   kRatioEvent,
-                   ratioText(kTooLong, "0.7"),
-                   {kOn},
-                   1,
-                   kParserFailed},
-        RefusedRow{"second_ratio_too_long",
-                   kRatioEvent,
-                   ratioText("0.5", kTooLong),
-                   {kOn},
-                   1,
-                   kParserFailed},
-        RefusedRow{"second_ratio_missing",
-                   kRatioEvent,
-                   "pid=12|tid=34|ratio_b=0.5",
-                   {kOn},
-                   1,
-                   kParserFailed},
-        RefusedRow{"second_ratio_empty",
-                   kRatioEvent,
-                   "pid=12|tid=34|ratio_b=0.5 ratio_l=",
-                   {kOn},
-                   1,
-                   kParserFailed},
-        RefusedRow{"ratios_glued",
-                   kRatioEvent,
-                   "pid=12|tid=34|ratio_b=0.5ratio_l=0.7",
-                   {kOn},
-                   1,
-                   kParserFailed},
-        RefusedRow{"pid_not_a_number",
-                   kRatioEvent,
-                   "pid=x|tid=34|ratio_b=0.5 ratio_l=0.7",
-                   {kOn},
-                   1,
-                   kParserFailed},
-        RefusedRow{
-            "tid_missing", kRatioEvent, "pid=12|ratio_b=0.5 ratio_l=0.7", {kOn}, 1, kParserFailed},
-        RefusedRow{"probe_text", kRatioEvent, "pid=12|tid=34", {kOn}, 1, kParserFailed},
-        // A broken text too: the payload check comes first.
-        RefusedRow{"ratio_payload_one", kRatioEvent, "pid=12", {1}, 1, payloadInvalid(20480)},
-        RefusedRow{"ratio_two_ints", kRatioEvent, "pid=12", {0, 0}, 2, payloadInvalid(20480)},
-        RefusedRow{"latency_payload_one", kLatencyEvent, "pid=12", {1}, 1, payloadInvalid(20481)},
-        RefusedRow{"latency_two_ints", kLatencyEvent, "pid=12", {-1, 0}, 2, payloadInvalid(20481)},
-        RefusedRow{
-            "latency_payload_minus_two", kLatencyEvent, "pid=12", {-2}, 1, payloadInvalid(20481)}),
-    [](const ::testing::TestParamInfo<RefusedRow>& info) { return std::string(info.param.what); });
+    Rows, ServerMemlatencyTextTest,
+    ::testing::Values(TextRow{"second_ratio_missing", "pid=12|tid=34|ratio_b=0.5"},
+                      TextRow{"second_ratio_empty", "pid=12|tid=34|ratio_b=0.5 ratio_l="},
+                      TextRow{"ratios_glued", "pid=12|tid=34|ratio_b=0.5ratio_l=0.7"},
+                      TextRow{"pid_not_a_number", "pid=x|tid=34|ratio_b=0.5 ratio_l=0.7"},
+                      TextRow{"tid_missing", "pid=12|ratio_b=0.5 ratio_l=0.7"},
+                      TextRow{"probe_text", "pid=12|tid=34"}),
+    [](const ::testing::TestParamInfo<TextRow>& info) { return std::string(info.param.what); });
+
+// Payloads other than exactly one 0 or -1 are refused for both ids before anything is parsed.
+struct PayloadRow {
+    const char* what;
+    int cmdId;
+    unsigned int payloadNum;
+    std::vector<int> payload;  // empty: null pointer
+};
+
+class ServerMemlatencyPayloadTest : public ServerMemlatencyTest,
+                                    public ::testing::WithParamInterface<PayloadRow> {};
+
+TEST_P(ServerMemlatencyPayloadTest, IsRefused) {
+    start(kLatencyCommand);
+    const PayloadRow& row = GetParam();
+    const int* payload = row.payload.empty() ? nullptr : row.payload.data();
+    // A broken text too: the payload check comes first.
+    EXPECT_EQ(mServer->velmoraEvent(row.cmdId, "pid=12", row.payloadNum, payload), 3);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
+                                "payload is invalid! cmdId=" + std::to_string(row.cmdId)));
+    EXPECT_EQ(LogCapture::countContaining("parser failed"), 0);
+    EXPECT_TRUE(actions().empty());
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Rows, ServerMemlatencyPayloadTest,
+    ::testing::Values(PayloadRow{"ratio_payload_one", kRatioEvent, 1, {1}},
+                      PayloadRow{"ratio_two_ints", kRatioEvent, 2, {0, 0}},
+                      PayloadRow{"latency_payload_one", kLatencyEvent, 1, {1}},
+                      PayloadRow{"latency_two_ints", kLatencyEvent, 2, {-1, 0}},
+                      PayloadRow{"latency_payload_minus_two", kLatencyEvent, 1, {-2}}),
+    [](const ::testing::TestParamInfo<PayloadRow>& info) { return std::string(info.param.what); });
 
 TEST_F(ServerMemlatencyTest, ConfiguredLatencyCommandIsSwitchedOnAndOff) {
     start(kLatencyCommand);
