@@ -111,6 +111,11 @@ TEST_F(FreqInfoUploadTest, FinalDataWithoutTrackedValuesWritesNothing) {
     EXPECT_EQ(reportBodies().size(), 1u);
 }
 
+TEST_F(FreqInfoUploadTest, FinalValueAboveMaximumLeavesItsFieldEmpty) {
+    request(2, {2, 5, 8}, {1000000, 3000000, 0}, {1000000, 3000000, 0});
+    EXPECT_EQ(reportBodies(), (Strings{",1,1000,,-1,2>"}));
+}
+
 TEST_F(FreqInfoUploadTest, UnknownClientStillTriggersAReport) {
     request(1, {2}, {1000000}, {1000000});
     request(-5, {2}, {500000}, {500000});  // origin ignored, state unchanged

@@ -81,6 +81,8 @@ TEST_F(ServerFreqTest, OnOffCapMergesWithClientsAndLeavesTheirLimitBehind) {
     EXPECT_EQ(onOff(12288, kOff), 0);
     EXPECT_EQ(lastSet().id, 12288);
     EXPECT_EQ(lastSet().values, (Ints{1800000}));
+    EXPECT_EQ(setConfig(1, {2}, {1800000}), 0);
+    EXPECT_EQ(lastSet().values, (Ints{1800000}));
 }
 
 TEST_F(ServerFreqTest, InvalidOnOffFrequencyCommandsAreRefused) {
