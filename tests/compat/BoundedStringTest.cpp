@@ -41,45 +41,34 @@ TEST(SnprintfSMissingTest, RejectsMissingDestination) {
     EXPECT_EQ(buf[0], 'z');
 }
 
+// Integers: the fields read are counted, a missing field stays as it was, and empty input is
+// the end of the input.
 TEST(SscanfSTest, ReadsIntegersAndCountsFields) {
     int pid = 0;
     int tid = 0;
     EXPECT_EQ(sscanf_s("pid=12|tid=34", "pid=%d|tid=%d", &pid, &tid), 2);
     EXPECT_EQ(pid, 12);
     EXPECT_EQ(tid, 34);
-}
-
-TEST(SscanfSTest, MissingFieldsAreNotCounted) {
-    int pid = 0;
-    int tid = -7;
+    tid = -7;
     EXPECT_EQ(sscanf_s("pid=12", "pid=%d|tid=%d", &pid, &tid), 1);
     EXPECT_EQ(tid, -7);
     EXPECT_EQ(sscanf_s("pid=x|tid=3", "pid=%d|tid=%d", &pid, &tid), 0);
-}
-
-TEST(SscanfSTest, EmptyInputIsEndOfFile) {
-    int pid = 0;
-    int tid = 0;
     EXPECT_EQ(sscanf_s("", "pid=%d|tid=%d", &pid, &tid), -1);
     EXPECT_EQ(sscanf_s(nullptr, "pid=%d", &pid), -1);
 }
 
-TEST(SscanfSTest, StringStopsAtWhiteSpace) {
+// Strings stop at white space; strings, characters and scan sets honour the buffer size, and
+// a zero-sized buffer fails the conversion.
+TEST(SscanfSTest, BufferConversionsHonourTheSize) {
     char first[8];
     char second[8];
     EXPECT_EQ(sscanf_s("a=0.5 b=0.7", "a=%s b=%s", first, sizeof(first), second, sizeof(second)),
               2);
     EXPECT_STREQ(first, "0.5");
     EXPECT_STREQ(second, "0.7");
-}
-
-TEST(SscanfSTest, ZeroSizedBufferFailsTheConversion) {
     char buf[4] = "abc";
     EXPECT_EQ(sscanf_s("xyz", "%s", buf, static_cast<size_t>(0)), 0);
     EXPECT_STREQ(buf, "abc");
-}
-
-TEST(SscanfSTest, CharactersAndScanSetsHonourTheSize) {
     char two[2];
     EXPECT_EQ(sscanf_s("ab", "%2c", two, sizeof(two)), 1);
     EXPECT_EQ(two[0], 'a');

@@ -147,9 +147,9 @@ TEST_F(VelmoraLoadXmlTest, RecordsFollowTheDocument) {
 }
 
 TEST_F(VelmoraLoadXmlTest, FirstDefinitionOfAnIdWins) {
-    writeCustConfig(policyXml(
-        "<cmd id=\"4400\" name=\"first\"><act><bad></bad></act></cmd>"
-        "<cmd id=\"4400\" name=\"second\"><act><k>1</k></act></cmd>"));
+    writeCustConfig(
+        policyXml("<cmd id=\"4400\" name=\"first\"><act><bad></bad></act></cmd>"
+                  "<cmd id=\"4400\" name=\"second\"><act><k>1</k></act></cmd>"));
     ASSERT_TRUE(load());
     const auto& chain = mLoader.chains.at(4400);
     ASSERT_EQ(chain.size(), 1u);  // the first had no usable action, and still wins

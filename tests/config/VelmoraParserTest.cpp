@@ -53,23 +53,6 @@ TEST_F(VelmoraParserTest, CopiesTheRecordAfterTheHead) {
     EXPECT_EQ(target.mNext, head->mNext->mNext);
 }
 
-TEST_F(VelmoraParserTest, UnknownCommandLeavesTargetUntouched) {
-    addChain(4400, 1);
-    Action target;
-    target.mDuration = 77;
-    EXPECT_EQ(mParser.doParseLocked(4401, &target), 1);
-    EXPECT_EQ(target.mDuration, 77);
-    EXPECT_EQ(target.mCmdId, -1);
-}
-
-TEST_F(VelmoraParserTest, HeadOnlyChainParsesToNothing) {
-    addChain(4400, 0);
-    Action target;
-    EXPECT_EQ(mParser.doParseLocked(4400, &target), 0);
-    EXPECT_EQ(target.mDuration, -1);
-    EXPECT_EQ(target.mCmdId, -1);
-}
-
 TEST_F(VelmoraParserTest, MissingTargetOrMapIsAnError) {
     EXPECT_EQ(mParser.doParseLocked(4400, nullptr), 2);
     VelmoraParser empty;
@@ -79,17 +62,6 @@ TEST_F(VelmoraParserTest, MissingTargetOrMapIsAnError) {
 }
 
 class VelmoraParserReloadTest : public ServerTest {};
-
-TEST_F(VelmoraParserReloadTest, ReloadReplacesCommands) {
-    ASSERT_EQ(startServer("<cmd id=\"4400\"><a><duration>50</duration></a></cmd>"), 0);
-    writeCustConfig(policyXml(std::string(kStartupCommands) +
-                              "<cmd id=\"4401\"><a><duration>60</duration></a></cmd>"));
-    EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
-    const int on = 0;
-    EXPECT_EQ(mServer->velmoraEvent(4400, "", 1, &on), 2);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doParse failed! cmdId=4400, errno=1"));
-    EXPECT_EQ(mServer->velmoraEvent(4401, "", 1, &on), 0);
-}
 
 TEST_F(VelmoraParserReloadTest, ReloadWithoutParserIsRefused) {
     ASSERT_EQ(startServer(), 0);

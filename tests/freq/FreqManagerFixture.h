@@ -27,9 +27,8 @@ protected:
 
     // Copy of the manager's guarded state, taken under its lock.
     struct Snapshot {
-        FreqClientManager::TagMap kx, jn, zola, min;
+        FreqClientManager::TagMap kx, jn, min;
         FreqClientManager::EventMap littleMin, littleMax, bigMin, bigMax, gpuMin, gpuMax;
-        int32_t maxFreq[FreqInfoUpload::kTrackedTags];
         bool maxFreqRead;
         bool uploadEnabled;
     };
@@ -77,7 +76,6 @@ protected:
         Snapshot s;
         s.kx = mMgr.mKxConfigMap;
         s.jn = mMgr.mJnConfigMap;
-        s.zola = mMgr.mZolaConfigMap;
         s.min = mMgr.mMinConfigMap;
         s.littleMin = mMgr.mLittleMinFreqMap;
         s.littleMax = mMgr.mLittleMaxFreqMap;
@@ -87,9 +85,6 @@ protected:
         s.gpuMax = mMgr.mGpuMaxFreqMap;
         s.maxFreqRead = mMgr.mMaxFreqRead;
         s.uploadEnabled = mMgr.mUploadEnabled;
-        for (int i = 0; i < FreqInfoUpload::kTrackedTags; ++i) {
-            s.maxFreq[i] = mMgr.mFreqInfoUpload.mMaxFreq[i];
-        }
         return s;
     }
 

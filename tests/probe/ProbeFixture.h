@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 #include <memory>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "config/Action.h"
@@ -36,14 +37,7 @@ inline Action* makeProbeAction(int duration, int value = 1000) {
 }
 
 // setProbeTid(tid, state) as recorded, for comparing whole sequences.
-struct TidCall {
-    unsigned int tid;
-    int state;
-    bool operator==(const TidCall& o) const { return tid == o.tid && state == o.state; }
-};
-inline std::ostream& operator<<(std::ostream& os, const TidCall& c) {
-    return os << "{" << c.tid << ", " << c.state << "}";
-}
+using TidCall = std::pair<unsigned int, int>;
 
 class ProbeFixture : public ::testing::Test {
 protected:

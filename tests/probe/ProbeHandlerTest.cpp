@@ -78,10 +78,7 @@ TEST_F(ProbeHandlerTest, StateMinusOneWithdrawsBoostedThreadOnce) {
     // The withdrawal is made on the caller's thread, before handle() returns.
     EXPECT_EQ(probe(12, 34, -1), 0);
     EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{34, 0}, {34, -1}}));
-    const auto actions = mExecutor.calls(Op::DoAction);
-    ASSERT_EQ(actions.size(), 2u);
-    EXPECT_EQ(actions[1].payload, (std::vector<int>{-1}));
-    EXPECT_EQ(actions[1].name, "probe");
+    EXPECT_EQ(mExecutor.calls(Op::DoAction).size(), 2u);
 
     // The worker drops the entry; neither a second withdrawal nor the lifetime calls again.
     advance(1);
@@ -89,20 +86,6 @@ TEST_F(ProbeHandlerTest, StateMinusOneWithdrawsBoostedThreadOnce) {
     EXPECT_EQ(probe(12, 34, -1), 0);
     advance(kBoostLifetimeMs);
     EXPECT_EQ(mExecutor.calls().size(), 4u);
-}
-
-TEST_F(ProbeHandlerTest, UpdateReplacesActionWithoutCap) {
-    startHandler();
-    Action* chain = makeProbeAction(5000, 2000);
-    chain->mNext = makeProbeAction(7, 7);  // the whole chain is taken over and freed later
-    EXPECT_EQ(mHandler->updateProbeThread(chain), 0);
-
-    EXPECT_EQ(probe(12, 34, 0), 0);
-    advance(kBoostDelayMs);
-    ASSERT_EQ(mExecutor.calls(Op::DoAction).size(), 1u);
-    const auto action = mExecutor.calls(Op::DoAction)[0];
-    EXPECT_EQ(action.duration, 5000);
-    EXPECT_EQ(action.tagValues, (std::vector<int>{1, 2000}));
 }
 
 TEST_F(ProbeHandlerTest, ActionChainsAreFreedOnUpdateAndWithHandler) {
@@ -151,20 +134,6 @@ TEST_F(ProbeHandlerTest, StoppedHandlerLeavesPlatformAlone) {
     EXPECT_EQ(probe(10, 10, -1), 0);
     advance(kBoostLifetimeMs);
     EXPECT_EQ(tidCalls(), (std::vector<TidCall>{{10, 0}}));
-}
-
-// On the system's clock, in real time: deleting the handler while the worker polls a boosted
-// thread and waits out a delay stops it, and nothing reaches the platform afterwards.
-TEST_F(ProbeHandlerTest, DeletingHandlerStopsWorkerOnTheSystemClock) {
-    FakeProbeClock::uninstall();
-    startHandler();
-    EXPECT_EQ(probe(10, 10, 0), 0);
-    ASSERT_TRUE(mExecutor.waitFor(Op::DoAction, 1, std::chrono::seconds(10)));
-    EXPECT_EQ(probe(12, 34, 0), 0);
-
-    mHandler.reset();
-    const size_t before = mExecutor.calls(Op::ProbeTid).size();
-    EXPECT_FALSE(mExecutor.waitFor(Op::ProbeTid, before + 1, std::chrono::milliseconds(24)));
 }
 
 }  // namespace

@@ -50,20 +50,16 @@ protected:
     FreqInfoUpload mUpload;
 };
 
-TEST_F(FreqInfoUploadTest, FormatsTheDocumentedExampleLine) {
+// The documented example line; date fields padded to two digits; a time that cannot be
+// represented falls back to a fixed date.
+TEST_F(FreqInfoUploadTest, FormatsTheLine) {
+    EXPECT_EQ(mUpload.formatFreqInfo(makeTime(2027, 1, 2, 3, 4, 5), 2, 0, 0, 0),
+              "#ARG1:<20270102030405,2,-1,-1,-1,0>");
     mUpload.updateFreqClient(1, 5, 1209600);
     mUpload.updateReason(1);
     EXPECT_EQ(
         mUpload.formatFreqInfo(makeTime(2026, 11, 15, 12, 14, 56), 1, kLittleMax, 1209600, -1),
         "#ARG1:<20261115121456,1,-1,1209,,4>");
-}
-
-TEST_F(FreqInfoUploadTest, PadsDateFieldsToTwoDigits) {
-    EXPECT_EQ(mUpload.formatFreqInfo(makeTime(2027, 1, 2, 3, 4, 5), 2, 0, 0, 0),
-              "#ARG1:<20270102030405,2,-1,-1,-1,0>");
-}
-
-TEST_F(FreqInfoUploadTest, UnrepresentableTimeFallsBackToFixedDate) {
     const struct tm when = FreqInfoUpload::getReportTime(std::numeric_limits<time_t>::max());
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "get local time failed!"));
     EXPECT_EQ(mUpload.formatFreqInfo(when, 3, -1, -1, -1).substr(0, 21), "#ARG1:<19000101000001");

@@ -101,8 +101,6 @@ TEST_F(SchedLevelManagerTest, InvalidClientIdTakesNoLock) {
     EXPECT_EQ(LogCapture::count(ANDROID_LOG_ERROR, "invalid clientId is 4"), 2);
 }
 
-// ---- Rejected client requests ----
-
 struct RejectedRequestRow {
     const char* name;
     int clientId;

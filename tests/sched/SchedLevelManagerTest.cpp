@@ -9,15 +9,6 @@ namespace velmora {
 namespace fake {
 namespace {
 
-// ---- Defaults (command 5376) ----
-
-TEST_F(SchedLevelManagerTest, DefaultLevelsAreNotRangeChecked) {
-    std::vector<int> pairs = easPairs(0);
-    pairs[1] = 99;
-    EXPECT_EQ(event(5376, pairs), 0);
-    EXPECT_EQ(snapshot().defaults[51], 99);
-}
-
 TEST_F(SchedLevelManagerTest, EightPairsOfOneTagChangeOnlyThatGroup) {
     std::vector<int> pairs;
     for (int i = 0; i < 8; ++i) {
@@ -53,8 +44,6 @@ TEST_F(SchedLevelManagerTest, RepeatedDefaultsDiscardClientRequests) {
     ASSERT_EQ(event(4500, {54, 10}), 0);
     EXPECT_EQ(onlySent(), easLevels(ZOLA_SCHED_LEVEL_NONE, {{53, 20}, {54, 10}}));
 }
-
-// ---- Rejected events: nothing changes, nothing is sent ----
 
 struct RejectedEventRow {
     const char* name;
@@ -120,8 +109,6 @@ TEST_F(SchedLevelManagerTest, NullActionIsRejected) {
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "doEventSchedLevel failed, action is NULL!"));
 }
 
-// ---- Events feed the ZOLA source ----
-
 TEST_F(SchedLevelManagerTest, LaterPairForTheSameGroupWins) {
     easDefaults();
     EXPECT_EQ(event(4500, {53, 20, 53, 30}), 0);
@@ -146,27 +133,12 @@ TEST_F(SchedLevelManagerTest, EventOverwritesLevelsTheZolaClientSet) {
     EXPECT_EQ(onlySent(), easLevels(ZOLA_SCHED_LEVEL_NONE, {{53, 30}}));
 }
 
-TEST_F(SchedLevelManagerTest, OnlyTheFirstReferenceEventIsKept) {
-    easDefaults();
-    ASSERT_EQ(event(4114, {53, 20}), 0);
-    ASSERT_EQ(event(4114, {53, 30}), 0);
-    EXPECT_EQ(snapshot().zolaFirst, allGroups(ZOLA_SCHED_LEVEL_NONE, {{53, 20}}));
-    mExecutor.clear();
-
-    // 53 now holds the second 4114's level, so 4113 has nothing to move.
-    EXPECT_EQ(event(4113, {53, 0}), 0);
-    EXPECT_EQ(sendCount(), 0u);
-    EXPECT_EQ(snapshot().zola[53], 30);
-}
-
 TEST_F(SchedLevelManagerTest, FollowerBeforeAnyReferenceWritesUnsetGroups) {
     easDefaults();
     EXPECT_EQ(event(4113, {53, 10}), 0);
     EXPECT_EQ(onlySent()[53], 10);
     EXPECT_FALSE(snapshot().zolaFirstSeen);
 }
-
-// ---- The merge ----
 
 struct MergeRow {
     const char* name;
@@ -221,8 +193,6 @@ TEST_F(SchedLevelManagerTest, DirectHandOverReportsFailureOnceAndKeepsTheMerge) 
     EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, kSendFailed), 1);
     EXPECT_EQ(snapshot().current[53], 30);
 }
-
-// ---- Platform failures roll an event back ----
 
 TEST_F(SchedLevelManagerTest, FailedEventIsRolledBackAndLoggedTwice) {
     easDefaults();

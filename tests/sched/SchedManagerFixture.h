@@ -36,13 +36,8 @@ struct Tables {
 
 // All nine tags at `level`, with `overrides` on top.
 inline LevelMap allGroups(int level, const LevelMap& overrides = {}) {
-    LevelMap table;
-    for (int tag = 50; tag <= 58; ++tag) {
-        table[tag] = level;
-    }
-    for (const auto& entry : overrides) {
-        table[entry.first] = entry.second;
-    }
+    LevelMap table = easLevels(level, overrides);
+    table.emplace(50, level);  // kept when `overrides` names it
     return table;
 }
 

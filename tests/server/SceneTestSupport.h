@@ -68,7 +68,7 @@ inline SceneState snapshot(VelmoraServer* s) {
 }
 
 class ServerSceneTest : public ServerTest {
-  protected:
+protected:
     void start(const std::string& extra = kSceneCommands) {
         ASSERT_EQ(startServer(extra), 0);
         executor().clear();
@@ -77,6 +77,11 @@ class ServerSceneTest : public ServerTest {
     int on(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOn); }
     int off(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOff); }
     int restart() { return mServer->velmoraEvent(kClientRestart, "", 0, nullptr); }
+    // Replaces the configuration with the start-up commands and `extra`, then reloads it.
+    int reload(const std::string& extra) {
+        writeCustConfig(policyXml(std::string(kStartupCommands) + extra));
+        return mServer->velmoraEvent(20230, "", 0, nullptr);
+    }
     // The doAction calls recorded since the last call, then forgets them.
     Steps steps() {
         Steps out;

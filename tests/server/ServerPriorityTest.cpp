@@ -1,71 +1,17 @@
 // Special-scene priorities: built-in values, configured values that override them, the ranges
 // that are read, the rebuild on reload, and the selection rules with their tie-breaks.
-#include <map>
-#include <ostream>
 #include <string>
-#include <vector>
 
 #include "config/Action.h"
-#include "tests/fakes/ServerTest.h"
+#include "tests/server/SceneTestSupport.h"
 
 namespace velmora {
 namespace fake {
 namespace {
 
-constexpr int kOn = 0;
-constexpr int kOff = -1;
-
-std::string scene(int cmdId, const std::string& body = "") {
-    return "<cmd id=\"" + std::to_string(cmdId) + "\" name=\"scene_" + std::to_string(cmdId) +
-           "\"><act><duration>0</duration>" + body + "</act></cmd>";
-}
-
-const std::string kBuiltinScenes = scene(4118) + scene(4119) + scene(4120) + scene(4121);
-
 using PriorityMap = std::map<int32_t, int32_t>;
+const std::string kBuiltinScenes = scene(4118) + scene(4119) + scene(4120) + scene(4121);
 const PriorityMap kBuiltins = {{4118, 100}, {4119, 200}, {4120, 20}, {4121, 70}};
-
-class ServerPriorityTest : public ServerTest {
-  protected:
-    void start(const std::string& extra) {
-        ASSERT_EQ(startServer(extra), 0);
-        executor().clear();
-        LogCapture::clear();
-    }
-    int on(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOn); }
-    int off(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOff); }
-    int reload(const std::string& extra) {
-        writeCustConfig(policyXml(std::string(kStartupCommands) + extra));
-        return mServer->velmoraEvent(20230, "", 0, nullptr);
-    }
-    PriorityMap priorities() {
-        VelmoraServer* s = mServer.get();
-        android::Mutex::Autolock lock(s->mMutex);
-        return s->mPriorityMap;
-    }
-    // (cmdId, payload) of every doAction since the last call.
-    std::vector<std::pair<int, int>> steps() {
-        std::vector<std::pair<int, int>> out;
-        for (const ExecutorCall& c : executor().calls(Op::DoAction)) {
-            out.emplace_back(c.id, c.payload.size() == 1 ? c.payload[0] : 999);
-        }
-        executor().clear();
-        return out;
-    }
-};
-
-using StepList = std::vector<std::pair<int, int>>;
-
-TEST_F(ServerPriorityTest, WithoutConfiguredPrioritiesOnlyTheBuiltinsExist) {
-    start(kBuiltinScenes + scene(4122) + scene(4300));
-    EXPECT_EQ(priorities(), kBuiltins);
-    EXPECT_EQ(on(4122), -1);
-    EXPECT_EQ(on(4300), -1);
-    EXPECT_TRUE(
-        LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4122"));
-    EXPECT_TRUE(
-        LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4300"));
-}
 
 // One configured scene per row: the priority it ends up with (0: none, the scene is refused).
 struct PriorityRow {
@@ -75,28 +21,24 @@ struct PriorityRow {
     int expected;
 };
 
-std::ostream& operator<<(std::ostream& os, const PriorityRow& r) {
-    return os << r.what;
-}
-
-class ServerPriorityRowTest : public ServerPriorityTest,
+class ServerPriorityRowTest : public ServerSceneTest,
                               public ::testing::WithParamInterface<PriorityRow> {};
 
 TEST_P(ServerPriorityRowTest, ConfiguredPriorityDecidesWhetherTheSceneRuns) {
     const PriorityRow& row = GetParam();
     start(scene(row.cmdId, row.body));
-    const PriorityMap map = priorities();
+    const PriorityMap map = state().prio;
     const auto it = map.find(row.cmdId);
     EXPECT_EQ(it == map.end() ? 0 : it->second, row.expected);
 
     if (row.expected > 0) {
         EXPECT_EQ(on(row.cmdId), 0);
-        EXPECT_EQ(steps(), StepList({{row.cmdId, kOn}}));
+        EXPECT_EQ(steps(), Steps({apply(row.cmdId)}));
     } else {
         EXPECT_EQ(on(row.cmdId), -1);
         EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is " +
                                                            std::to_string(row.cmdId)));
-        EXPECT_EQ(steps(), StepList());
+        EXPECT_EQ(steps(), Steps());
     }
 }
 
@@ -131,30 +73,15 @@ INSTANTIATE_TEST_SUITE_P(
         PriorityRow{"scene_4352_never_configured", 4352, "<s_priority>60</s_priority>", 0}),
     [](const ::testing::TestParamInfo<PriorityRow>& info) { return std::string(info.param.what); });
 
-TEST_F(ServerPriorityTest, EqualPrioritiesGoToTheSmallerCmdId) {
-    start(scene(4118) + scene(4119) + scene(4121, "<t101>100</t101>"));
-    ASSERT_EQ(on(4119), 0);
-    ASSERT_EQ(on(4121), 0);
-    ASSERT_EQ(on(4118), 0);
-    steps();
-    EXPECT_EQ(off(4119), 0);
-    EXPECT_EQ(steps(), StepList({{4119, kOff}, {4118, kOn}}));
-    // An equal priority never takes over the current scene.
-    EXPECT_EQ(off(4118), 0);
-    EXPECT_EQ(steps(), StepList({{4118, kOff}, {4121, kOn}}));
-    EXPECT_EQ(on(4118), 0);
-    EXPECT_EQ(steps(), StepList());
-}
-
-TEST_F(ServerPriorityTest, ReloadRebuildsTheTableFromScratch) {
+TEST_F(ServerSceneTest, ReloadRebuildsTheTableFromScratch) {
     start(scene(4118, "<t101>150</t101>") + scene(4119) + scene(4120) + scene(4121) +
           scene(4130, "<t101>300</t101>") + scene(4131) +
           scene(4300, "<s_priority>40</s_priority>"));
-    ASSERT_EQ(priorities().at(4118), 150);
-    ASSERT_EQ(priorities().at(4300), 40);
+    ASSERT_EQ(state().prio.at(4118), 150);
+    ASSERT_EQ(state().prio.at(4300), 40);
     ASSERT_EQ(on(4118), 0);
     ASSERT_EQ(on(4131), -1);  // leaves a 0 entry behind
-    ASSERT_EQ(priorities().count(4131), 1u);
+    ASSERT_EQ(state().prio.count(4131), 1u);
 
     ASSERT_EQ(reload(kBuiltinScenes + scene(4130, "<t101>60</t101>") + scene(4131) +
                      scene(4122, "<t101>90</t101>") + scene(4300)),
@@ -162,31 +89,31 @@ TEST_F(ServerPriorityTest, ReloadRebuildsTheTableFromScratch) {
     PriorityMap expected = kBuiltins;
     expected[4130] = 60;
     expected[4122] = 90;
-    EXPECT_EQ(priorities(), expected);
+    EXPECT_EQ(state().prio, expected);
 
     // The scene state survives: 4118 stays current and now outranks 4130.
     steps();
     EXPECT_EQ(on(4130), 0);
-    EXPECT_EQ(steps(), StepList());
+    EXPECT_EQ(steps(), Steps());
     EXPECT_EQ(on(4300), -1);
     EXPECT_EQ(off(4118), 0);
-    EXPECT_EQ(steps(), StepList({{4118, kOff}, {4130, kOn}}));
+    EXPECT_EQ(steps(), Steps({withdraw(4118), apply(4130)}));
 }
 
-TEST_F(ServerPriorityTest, FailedReloadKeepsThePriorities) {
+TEST_F(ServerSceneTest, FailedReloadKeepsThePriorities) {
     start(kBuiltinScenes + scene(4130, "<t101>300</t101>"));
-    const PriorityMap before = priorities();
+    const PriorityMap before = state().prio;
     writeCustConfig(policyXml("<cmd name=\"no id\"><act><duration>1</duration></act></cmd>"));
     EXPECT_EQ(mServer->velmoraEvent(20230, "", 0, nullptr), 0);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "load xml map failed!"));
-    EXPECT_EQ(priorities(), before);
+    EXPECT_EQ(state().prio, before);
     EXPECT_EQ(on(4130), 0);
-    EXPECT_EQ(steps(), StepList({{4130, kOn}}));
+    EXPECT_EQ(steps(), Steps({apply(4130)}));
 }
 
 // The selection functions on hand-made state: the return codes and tie-breaks of branches the
 // host's event sequences do not reach.
-TEST_F(ServerPriorityTest, PriorityReadersTakeTheLastMatchingPair) {
+TEST_F(ServerSceneTest, PriorityReadersTakeTheLastMatchingPair) {
     VelmoraServer server;
     Action plain;
     plain.mParamNum = 3;

@@ -1,31 +1,90 @@
 // Special scenes through velmoraEvent: which scene is withdrawn and which applied, in which
-// order and with which payload, governor scenes under scene 4119, client restarts and scenes
-// the configuration leaves without a priority.
+// order and with which payload, governor scenes under scene 4119, client restarts, scenes the
+// configuration leaves without a priority, and what goes wrong: invalid payloads, platform
+// failures, a missing executor and a scene dropped by a reload.
+#include <utility>
+
+#include "config/Action.h"
 #include "tests/server/SceneTestSupport.h"
 
 namespace velmora {
 namespace fake {
 namespace {
 
-TEST_F(ServerSceneTest, HigherSceneTakesOverAndHandsBack) {
-    start();
-    EXPECT_EQ(on(4118), 0);
-    EXPECT_EQ(steps(), Steps({apply(4118)}));
-    EXPECT_EQ(on(4119), 0);
-    EXPECT_EQ(steps(), Steps({withdraw(4118), apply(4119)}));
-    EXPECT_EQ(state().cur, 4119);
-    // Switching the current scene on again changes nothing.
-    EXPECT_EQ(on(4119), 0);
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(state().on, std::set<int32_t>({4118, 4119}));
-    EXPECT_EQ(off(4119), 0);
-    EXPECT_EQ(steps(), Steps({withdraw(4119), apply(4118)}));
-    EXPECT_EQ(state().cur, 4118);
-    EXPECT_EQ(off(4118), 0);
-    EXPECT_EQ(steps(), Steps({withdraw(4118)}));
-    EXPECT_EQ(state().cur, 0);
-    EXPECT_TRUE(state().on.empty());
+// One host event and the doAction calls it must cause, in order.
+struct Move {
+    int cmdId;
+    int word;
+    Steps expected;
+};
+Move onMove(int cmdId, Steps expected = {}) {
+    return {cmdId, kOn, std::move(expected)};
 }
+Move offMove(int cmdId, Steps expected = {}) {
+    return {cmdId, kOff, std::move(expected)};
+}
+
+// A sequence of scene switches, and the current scene and the set of scenes on at the end.
+struct SceneScript {
+    const char* name;
+    int cur;
+    std::set<int32_t> on;
+    std::string commands;
+    std::vector<Move> moves;
+};
+
+class ServerSceneScriptTest : public ServerSceneTest,
+                              public ::testing::WithParamInterface<SceneScript> {};
+
+TEST_P(ServerSceneScriptTest, PlatformSeesEachSwitch) {
+    const SceneScript& script = GetParam();
+    start(script.commands);
+    for (size_t i = 0; i < script.moves.size(); ++i) {
+        const Move& move = script.moves[i];
+        EXPECT_EQ(mServer->velmoraEvent(move.cmdId, "", 1, &move.word), 0) << "move " << i;
+        EXPECT_EQ(steps(), move.expected) << "move " << i;
+    }
+    EXPECT_EQ(state().cur, script.cur);
+    EXPECT_EQ(state().on, script.on);
+}
+
+// clang-format off
+INSTANTIATE_TEST_SUITE_P(
+    Scripts, ServerSceneScriptTest,
+    ::testing::Values(
+        // Switching the current scene on again changes nothing.
+        SceneScript{"HigherSceneTakesOverAndHandsBack", 0, {}, kSceneCommands,
+                    {onMove(4118, {apply(4118)}), onMove(4119, {withdraw(4118), apply(4119)}),
+                     onMove(4119), offMove(4119, {withdraw(4119), apply(4118)}),
+                     offMove(4118, {withdraw(4118)})}},
+        // A waiting scene switched off, and one never on, leave the platform alone; the best
+        // waiting scene (4121, 70) comes next, then 4120 (20).
+        SceneScript{"LowerScenesWaitUntilTheHigherOneEnds", 4120, {4120}, kSceneCommands,
+                    {onMove(4118, {apply(4118)}), onMove(4120), offMove(4120), offMove(4119),
+                     offMove(4118, {withdraw(4118)}), onMove(4118, {apply(4118)}), onMove(4120),
+                     onMove(4121), offMove(4118, {withdraw(4118), apply(4121)}),
+                     offMove(4121, {withdraw(4121), apply(4120)})}},
+        // Under 4119 governor scenes are applied on their own and 4119 stays current. A tie
+        // goes to the scene just switched on; a lower one re-applies the best one that is on,
+        // among tied ones the smaller cmdId. Off withdraws nothing and re-applies the best
+        // remaining one.
+        SceneScript{"GovernorScenesUnderScene4119", 4119, {4119}, kSceneCommands,
+                    {onMove(4119, {apply(4119)}), onMove(4230, {apply(4230)}),
+                     onMove(4240, {apply(4240)}), onMove(4250, {apply(4230)}),
+                     offMove(4240, {apply(4230)}), offMove(4230, {apply(4250)}), offMove(4250)}},
+        // Above 4119 a governor scene takes over like any scene; under it one only waits.
+        SceneScript{"GovernorSceneAboveScene4119", 4119, {4119, 4230}, kSceneCommands,
+                    {onMove(4119, {apply(4119)}), onMove(4230, {apply(4230)}),
+                     onMove(4260, {withdraw(4119), apply(4260)}), onMove(4240), offMove(4240),
+                     offMove(4260, {withdraw(4260), apply(4119)})}},
+        // Equal priorities go to the smaller cmdId, and never take over the current scene.
+        SceneScript{"EqualPrioritiesGoToTheSmallerCmdId", 4121, {4118, 4121},
+                    scene(4118) + scene(4119) + scene(4121, "<t101>100</t101>"),
+                    {onMove(4119, {apply(4119)}), onMove(4121), onMove(4118),
+                     offMove(4119, {withdraw(4119), apply(4118)}),
+                     offMove(4118, {withdraw(4118), apply(4121)}), onMove(4118)}}),
+    [](const ::testing::TestParamInfo<SceneScript>& info) { return info.param.name; });
+// clang-format on
 
 TEST_F(ServerSceneTest, PlatformGetsTheConfiguredActionWithOnePayloadInt) {
     // The duration only gates dispatch: a timed scene still goes through the scene path with
@@ -40,82 +99,6 @@ TEST_F(ServerSceneTest, PlatformGetsTheConfiguredActionWithOnePayloadInt) {
     EXPECT_EQ(calls[0].payload, std::vector<int>({kOn}));
 }
 
-TEST_F(ServerSceneTest, LowerScenesWaitInTheSetUntilTheHigherOneEnds) {
-    start();
-    ASSERT_EQ(on(4118), 0);
-    steps();
-    EXPECT_EQ(on(4120), 0);
-    EXPECT_EQ(on(4121), 0);
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(state().on, std::set<int32_t>({4118, 4120, 4121}));
-    EXPECT_EQ(state().cur, 4118);
-
-    // The best waiting scene (4121, 70) comes next, then 4120 (20).
-    EXPECT_EQ(off(4118), 0);
-    EXPECT_EQ(steps(), Steps({withdraw(4118), apply(4121)}));
-    EXPECT_EQ(off(4121), 0);
-    EXPECT_EQ(steps(), Steps({withdraw(4121), apply(4120)}));
-}
-
-TEST_F(ServerSceneTest, WaitingSceneSwitchedOffLeavesThePlatformAlone) {
-    start();
-    ASSERT_EQ(on(4118), 0);
-    ASSERT_EQ(on(4120), 0);
-    steps();
-    EXPECT_EQ(off(4120), 0);
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(state().on, std::set<int32_t>({4118}));
-    // A scene that was never on is just as harmless.
-    EXPECT_EQ(off(4121), 0);
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(state().cur, 4118);
-}
-
-TEST_F(ServerSceneTest, GovernorScenesUnderScene4119) {
-    start();
-    ASSERT_EQ(on(4119), 0);
-    steps();
-    // Applied on their own, 4119 stays current; a tie goes to the scene just switched on.
-    EXPECT_EQ(on(4230), 0);
-    EXPECT_EQ(steps(), Steps({apply(4230)}));
-    EXPECT_EQ(on(4240), 0);
-    EXPECT_EQ(steps(), Steps({apply(4240)}));
-    // A lower governor scene re-applies the best one that is on; among the tied ones that is
-    // the smaller cmdId, not the one applied last.
-    EXPECT_EQ(on(4250), 0);
-    EXPECT_EQ(steps(), Steps({apply(4230)}));
-    EXPECT_EQ(state().cur, 4119);
-    EXPECT_EQ(state().on, std::set<int32_t>({4119, 4230, 4240, 4250}));
-
-    // Off: nothing is withdrawn; the best remaining governor scene is re-applied, a tie going
-    // to the smaller cmdId.
-    EXPECT_EQ(off(4240), 0);
-    EXPECT_EQ(steps(), Steps({apply(4230)}));
-    EXPECT_EQ(off(4230), 0);
-    EXPECT_EQ(steps(), Steps({apply(4250)}));
-    EXPECT_EQ(off(4250), 0);
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(state().cur, 4119);
-}
-
-TEST_F(ServerSceneTest, GovernorSceneAboveScene4119TakesOverLikeAnyScene) {
-    start();
-    ASSERT_EQ(on(4119), 0);
-    ASSERT_EQ(on(4230), 0);
-    steps();
-    EXPECT_EQ(on(4260), 0);
-    EXPECT_EQ(steps(), Steps({withdraw(4119), apply(4260)}));
-    EXPECT_EQ(state().cur, 4260);
-    // Under another current scene a governor scene only waits.
-    EXPECT_EQ(on(4240), 0);
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(off(4240), 0);
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(off(4260), 0);
-    EXPECT_EQ(steps(), Steps({withdraw(4260), apply(4119)}));
-    EXPECT_EQ(state().cur, 4119);
-}
-
 TEST_F(ServerSceneTest, ClientRestartWithdrawsTheCurrentSceneAndForgetsTheRest) {
     start();
     // Without a current scene a restart has nothing to withdraw.
@@ -126,10 +109,14 @@ TEST_F(ServerSceneTest, ClientRestartWithdrawsTheCurrentSceneAndForgetsTheRest) 
     steps();
     const auto prioBefore = state().prio;
 
-    EXPECT_EQ(restart(), 0);
+    // The withdrawal's result is passed through.
+    executor().setResult(Op::DoAction, 9);
+    EXPECT_EQ(restart(), 9);
+    executor().setResult(Op::DoAction, 0);
     EXPECT_EQ(steps(), Steps({withdraw(4118)}));
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO,
                                 "client may rebooted, clean special scene set, cmdId is 20224"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4118"));
     EXPECT_EQ(state().cur, 0);
     EXPECT_TRUE(state().on.empty());
     EXPECT_EQ(state().prio, prioBefore);
@@ -141,30 +128,15 @@ TEST_F(ServerSceneTest, ClientRestartWithdrawsTheCurrentSceneAndForgetsTheRest) 
     EXPECT_EQ(steps(), Steps({apply(4121)}));
 }
 
-TEST_F(ServerSceneTest, ClientRestartPassesTheWithdrawResultThrough) {
-    start();
-    ASSERT_EQ(on(4119), 0);
-    executor().setResult(Op::DoAction, 9);
-    EXPECT_EQ(restart(), 9);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4119"));
-    EXPECT_EQ(state().cur, 0);
-}
-
 TEST_F(ServerSceneTest, UnconfiguredPriorityIsRefusedWithoutTouchingTheState) {
     start();
     ASSERT_EQ(on(4118), 0);
     steps();
     EXPECT_EQ(on(4130), -1);
-    EXPECT_TRUE(
-        LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene priority, cmdId is 4130"));
     EXPECT_EQ(off(4130), -1);
     EXPECT_EQ(steps(), Steps());
-    const SceneState s = state();
-    EXPECT_EQ(s.cur, 4118);
-    EXPECT_EQ(s.on, std::set<int32_t>({4118}));
-    // The lookup remembered the scene as invalid.
-    ASSERT_EQ(s.prio.count(4130), 1u);
-    EXPECT_EQ(s.prio.at(4130), 0);
+    EXPECT_EQ(state().cur, 4118);
+    EXPECT_EQ(state().on, std::set<int32_t>({4118}));
 }
 
 TEST_F(ServerSceneTest, UnparsableOrDisabledSceneIsNotDispatched) {
@@ -176,6 +148,102 @@ TEST_F(ServerSceneTest, UnparsableOrDisabledSceneIsNotDispatched) {
     EXPECT_EQ(steps(), Steps());
     EXPECT_EQ(state().on, std::set<int32_t>());
     EXPECT_EQ(state().cur, 0);
+}
+
+// Invalid payloads are refused before the scene state is looked at.
+struct PayloadRow {
+    const char* what;
+    unsigned int payloadNum;
+    std::vector<int> payload;  // empty: null pointer
+};
+
+class ServerSceneInvalidPayloadTest : public ServerSceneTest,
+                                      public ::testing::WithParamInterface<PayloadRow> {};
+
+TEST_P(ServerSceneInvalidPayloadTest, IsRefusedAndChangesNothing) {
+    start();
+    ASSERT_EQ(on(4118), 0);
+    steps();
+    LogCapture::clear();
+    const PayloadRow& row = GetParam();
+    const int* payload = row.payload.empty() ? nullptr : row.payload.data();
+    EXPECT_EQ(mServer->velmoraEvent(4119, "", row.payloadNum, payload), -1);
+    EXPECT_TRUE(
+        LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene parameters, cmdId is 4119"));
+    EXPECT_EQ(steps(), Steps());
+    EXPECT_EQ(state().cur, 4118);
+    EXPECT_EQ(state().on, std::set<int32_t>({4118}));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Rows, ServerSceneInvalidPayloadTest,
+    ::testing::Values(PayloadRow{"payload_one", 1, {1}},  // neither on nor off
+                      PayloadRow{"payload_minus_two", 1, {-2}}, PayloadRow{"null_payload", 1, {}},
+                      PayloadRow{"no_payload", 0, {}},
+                      PayloadRow{"two_ints", 2, {0, 0}}),  // only exactly one int counts
+    [](const ::testing::TestParamInfo<PayloadRow>& info) { return std::string(info.param.what); });
+
+TEST_F(ServerSceneTest, TwoResultsAreJoinedByBitwiseOr) {
+    start();
+    ASSERT_EQ(on(4118), 0);
+    steps();
+    // Withdrawing 4118 answers 1, applying 4119 answers 4.
+    executor().setActionHook(
+        [this](const Action* a) { executor().setResult(Op::DoAction, a->mCmdId == 4118 ? 1 : 4); });
+    EXPECT_EQ(on(4119), 5);
+    EXPECT_EQ(steps(), Steps({withdraw(4118), apply(4119)}));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4118"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4119"));
+
+    // Handing back joins the same way: withdraw 4119 (4) | apply 4118 (1).
+    EXPECT_EQ(off(4119), 5);
+    EXPECT_EQ(steps(), Steps({withdraw(4119), apply(4118)}));
+    executor().setActionHook(nullptr);
+}
+
+TEST_F(ServerSceneTest, StateIsNotRolledBackWhenThePlatformFails) {
+    start();
+    executor().setResult(Op::DoAction, 6);
+    EXPECT_EQ(on(4118), 6);
+    EXPECT_EQ(on(4119), 6);
+    EXPECT_EQ(state().cur, 4119);
+    EXPECT_EQ(state().on, std::set<int32_t>({4118, 4119}));
+    executor().setResult(Op::DoAction, 0);
+    steps();
+    EXPECT_EQ(off(4119), 0);
+    EXPECT_EQ(steps(), Steps({withdraw(4119), apply(4118)}));
+
+    // Without an executor the action fails, and the state still moves on.
+    env().lastPlat->mExecutorPtr = nullptr;
+    EXPECT_EQ(on(4119), -1);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4119"));
+    EXPECT_EQ(state().cur, 4119);
+}
+
+TEST_F(ServerSceneTest, SceneDroppedByAReloadCannotBeWithdrawn) {
+    start();
+    ASSERT_EQ(on(4118), 0);
+    steps();
+    ASSERT_EQ(reload(scene(4119)), 0);
+    // Withdrawing 4118 fails to parse (2); applying 4119 succeeds (0).
+    EXPECT_EQ(on(4119), 2);
+    EXPECT_TRUE(
+        LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doParse failed! cmdId=4118, errno=1"));
+    EXPECT_EQ(steps(), Steps({apply(4119)}));
+    EXPECT_EQ(state().cur, 4119);
+}
+
+TEST_F(ServerSceneTest, DebugLogTracesEverySceneAction) {
+    start();
+    dump("--logon");
+    ASSERT_EQ(on(4118), 0);
+    ASSERT_EQ(on(4119), 0);
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO, "doSpecialAction cmdId is 4118, payload is -1"));
+    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_INFO, "doSpecialAction cmdId is 4119, payload is 0"));
+    dump("--logoff");
+    LogCapture::clear();
+    ASSERT_EQ(off(4119), 0);
+    EXPECT_EQ(LogCapture::countContaining("doSpecialAction"), 0);
 }
 
 }  // namespace

@@ -57,19 +57,8 @@ TEST_F(ServerSchedTest, EasDefaultsAreInstalledAtStartUpWithoutPlatformCall) {
     mServer = std::make_unique<VelmoraServer>();
     ASSERT_EQ(mServer->init(), 0);
     EXPECT_TRUE(sent().empty());
-    const std::string text = easDumpText();
-    EXPECT_EQ(text.substr(0, text.find("current eas group value is:\n")),
-              "default eas group value is:\n"
-              "group=boost,             value=0\n"
-              "group=vip,               value=0\n"
-              "group=top-app,           value=0\n"
-              "group=root,              value=0\n"
-              "group=foreground,        value=0\n"
-              "group=key-background,    value=7\n"
-              "group=system-background, value=6\n"
-              "group=background,        value=0\n");
     const auto defaults = easLevels(0, {{56, 6}, {57, 7}});
-    EXPECT_EQ(text, easDump(defaults, defaults, defaults, defaults, defaults) + "\n");
+    EXPECT_EQ(easDumpText(), easDump(defaults, defaults, defaults, defaults, defaults) + "\n");
 }
 
 TEST_F(ServerSchedTest, HmpDefaultDrivesTheSingleGroup) {
@@ -103,8 +92,6 @@ TEST_F(ServerSchedTest, HmpDefaultDrivesTheSingleGroup) {
               "group=hmp,               value=30\n"
               "\n");
 }
-
-// ---- Start-up fails on a malformed default command ----
 
 struct BadDefaultsRow {
     const char* name;
@@ -146,16 +133,9 @@ INSTANTIATE_TEST_SUITE_P(
         BadDefaultsRow{"ThreePairs", "<t51>0</t51><t52>0</t52><t53>0</t53>", ANDROID_LOG_ERROR,
                        "init default group failed! tagLen must be (eas:8, hmp:1)"},
         BadDefaultsRow{"HmpAmongEasPairs", easXml("t50"), ANDROID_LOG_ERROR,
-                       "invalid eas group, group tag is 0"},
-        BadDefaultsRow{"NinePairs", easXml() + "<t51>0</t51>", ANDROID_LOG_DEBUG,
-                       "cmdId(5376) (duration=0): group num is invalid, max group num is 8!"},
-        BadDefaultsRow{"FrequencyTag", easXml("t42"), ANDROID_LOG_DEBUG,
-                       "cmdId(5376) (duration=0) does not support other tags except sched "
-                       "level!"}),
+                       "invalid eas group, group tag is 0"}),
     [](const ::testing::TestParamInfo<BadDefaultsRow>& info) { return info.param.name; });
 // clang-format on
-
-// ---- Duration-0 events ----
 
 TEST_F(ServerSchedTest, EventReachesThePlatformOnlyWhenItChangesALevel) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
@@ -182,7 +162,7 @@ TEST_F(ServerSchedTest, FollowerMovesOnlyGroupsStillAtTheReference) {
     EXPECT_EQ(sent()[0].values, std::vector<int>({-100, -100, 30, 0, 10, -100, -100, -100}));
 }
 
-TEST_F(ServerSchedTest, RejectedOrFailedEventIsReportedAsActionFailure) {
+TEST_F(ServerSchedTest, RejectedOrFailedActionLeavesTheTables) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
     EXPECT_EQ(mServer->velmoraEvent(4501, "", 0, nullptr), 3);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_DEBUG,
@@ -190,15 +170,16 @@ TEST_F(ServerSchedTest, RejectedOrFailedEventIsReportedAsActionFailure) {
                                 "level!"));
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4501"));
 
+    // A refused event is an action failure too; a refused client request hands the platform's
+    // own result back. Neither leaves a trace in the tables.
     const std::string before = easDumpText();
     executor().setResult(Op::SchedLevel, 9);
     EXPECT_EQ(mServer->velmoraEvent(4500, "", 0, nullptr), 3);
-    EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, "doSchedLevelAction failed!"), 2);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4500"));
+    EXPECT_EQ(set(2, {42}, {packLevel(3, -10)}), 9);
+    EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, "doSchedLevelAction failed!"), 4);
     EXPECT_EQ(easDumpText(), before);
 }
-
-// ---- Client requests ----
 
 TEST_F(ServerSchedTest, ClientRequestsMergeAcrossClients) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
@@ -242,30 +223,8 @@ TEST_F(ServerSchedTest, RejectedRequestIsPassedOnWithItsOwnLog) {
                                 "clientId is 1"));
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
                                 "velmoraSetConfig doPerfSetSchedLevel failed! clientId=1"));
-
-    EXPECT_EQ(set(0, {42}, {packLevel(3, -10)}), -1);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "invalid clientId is 0"));
     EXPECT_TRUE(sent().empty());
     EXPECT_TRUE(executor().calls(Op::SetConfig).empty());
-}
-
-TEST_F(ServerSchedTest, PlatformResultOfAFailedRequestIsPassedThrough) {
-    ASSERT_EQ(startServer(kSchedCommands), 0);
-    const std::string before = easDumpText();
-    executor().setResult(Op::SchedLevel, 9);
-    EXPECT_EQ(set(2, {42}, {packLevel(3, -10)}), 9);
-    EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, "doSchedLevelAction failed!"), 2);
-    EXPECT_EQ(easDumpText(), before);
-}
-
-TEST_F(ServerSchedTest, ZolaClientLevelLastsUntilTheNextEvent) {
-    ASSERT_EQ(startServer(kSchedCommands), 0);
-    ASSERT_EQ(mServer->velmoraEvent(4500, "", 0, nullptr), 0);
-    ASSERT_EQ(set(3, {42}, {packLevel(2, 10)}), 0);
-    EXPECT_EQ(sent().back().values[1], 10);  // vip
-
-    ASSERT_EQ(mServer->velmoraEvent(4114, "", 0, nullptr), 0);
-    EXPECT_EQ(sent().back().values, std::vector<int>({-100, -100, 20, 10, -100, -100, -100, -100}));
 }
 
 }  // namespace
