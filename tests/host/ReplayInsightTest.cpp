@@ -52,13 +52,7 @@ Replayed replay(const std::string& name, const std::string& trace,
     Replayed run;
     run.dir = configDir(name, config);
     hosttest::writeFile(run.dir + "/t.trace", trace);
-    ReplayOptions options;
-    options.tracePath = run.dir + "/t.trace";
-    options.fast = true;
-    options.quiet = true;
-    options.deviceRoot = run.dir + "/device";
-    options.timelinePath = run.dir + "/timeline.json";
-    options.eventLogPath = run.dir + "/events.log";
+    ReplayOptions options = hosttest::replayOptions(run.dir, run.dir + "/t.trace");
     options.summaryJsonPath = run.dir + "/summary.json";
     FILE* out = fopen((run.dir + "/stdout.txt").c_str(), "w");
     ReplaySession session(options, out, stderr);
@@ -95,17 +89,16 @@ const char* kSceneOverAction = "@0 event 4099 0\n@500 event 4119 0\n@3000\n";
 
 INSTANTIATE_TEST_SUITE_P(
     Rows, HolderTest,
-    testing::Values(
-        HolderRow{"one client's cap", kClientCaps, "cpu.big.max", 50, "KX"},
-        HolderRow{"a lower cap of another client wins", kClientCaps, "cpu.big.max", 150, "ZOLA"},
-        HolderRow{"released: the first cap again", kClientCaps, "cpu.big.max", 250, "KX"},
-        HolderRow{"a timed action's floor", kSceneOverAction, "cpu.big.min", 100,
-                  "action 4099 cold_launch"},
-        HolderRow{"a scene's higher floor replaces it", kSceneOverAction, "cpu.big.min", 1000,
-                  "scene 4119 game"},
-        HolderRow{"an on/off command", "@0 event 12300 0\n@10\n", "cpu.little.min", 5,
-                  "onoff 12300 touch_floor"},
-        HolderRow{"nothing asked", kClientCaps, "gpu.max", 150, "initial"}));
+    testing::Values(HolderRow{"one client's cap", kClientCaps, "cpu.big.max", 50, "KX"},
+                    HolderRow{"a lower cap of another client wins", kClientCaps, "cpu.big.max", 150,
+                              "ZOLA"},
+                    HolderRow{"a timed action's floor", kSceneOverAction, "cpu.big.min", 100,
+                              "action 4099 cold_launch"},
+                    HolderRow{"a scene's higher floor replaces it", kSceneOverAction, "cpu.big.min",
+                              1000, "scene 4119 game"},
+                    HolderRow{"an on/off command", "@0 event 12300 0\n@10\n", "cpu.little.min", 5,
+                              "onoff 12300 touch_floor"},
+                    HolderRow{"nothing asked", kClientCaps, "gpu.max", 150, "initial"}));
 
 TEST(ReplayInsightTest, ResidencySumsToTheTraceLengthAndFollowsTheLimits) {
     const Replayed run = replay("residency", kSceneOverAction);
@@ -213,12 +206,7 @@ TEST(ReplayInsightTest, ComparesTwoConfigurationsDifferingInOneValue) {
     std::string configB = kConfig;
     configB.replace(configB.find("1804800"), 7, "1497600");
     const std::string dirB = configDir("compare-b", configB);
-    ReplayOptions options;
-    options.tracePath = a.dir + "/t.trace";
-    options.quiet = true;
-    options.deviceRoot = a.dir + "/device";
-    options.timelinePath = a.dir + "/timeline.json";
-    options.eventLogPath = a.dir + "/events.log";
+    ReplayOptions options = hosttest::replayOptions(a.dir, a.dir + "/t.trace");
     options.summaryJsonPath = a.dir + "/comparison.json";
     FILE* out = fopen((a.dir + "/compare.txt").c_str(), "w");
     EXPECT_EQ(ReplaySession::kOk, ComparisonRun(options, dirB, out, stderr).run());
@@ -230,43 +218,6 @@ TEST(ReplayInsightTest, ComparesTwoConfigurationsDifferingInOneValue) {
     ASSERT_EQ(1u, json["nodes"].size());
     EXPECT_EQ("cpu.big.min", json["nodes"][0]["key"]);
     EXPECT_EQ(1500.0, std::abs(json["nodes"][0]["residency"][0]["delta_ms"].get<double>()));
-
-    // A configuration B that does not load, as XML or for the server: one message, exit 2,
-    // nothing written.
-    for (const char* config : {"<policy><cmd>", "<policy></policy>"}) {
-        const std::string broken = configDir("compare-broken", config);
-        options.summaryJsonPath = broken + "/comparison.json";
-        options.timelinePath = broken + "/timeline.json";
-        FILE* err = tmpfile();
-        EXPECT_EQ(ReplaySession::kSetupFailed, ComparisonRun(options, broken, stdout, err).run());
-        rewind(err);
-        char message[512] = {0};
-        ASSERT_NE(nullptr, fgets(message, sizeof(message), err));
-        EXPECT_EQ(0u, std::string(message).find("velmora-replay: configuration " + broken +
-                                                " does not load: "))
-            << message;
-        EXPECT_EQ(nullptr, fgets(message, sizeof(message), err)) << "a second message: " << message;
-        fclose(err);
-        EXPECT_EQ("<missing>", hosttest::readFile(broken + "/comparison.json"));
-        EXPECT_EQ("<missing>", hosttest::readFile(broken + "/timeline.json"));
-    }
-}
-
-TEST(ReplayInsightTest, UnwritableOutputStopsBeforeAnyCall) {
-    const std::string dir = configDir("unwritable", kConfig);
-    hosttest::writeFile(dir + "/t.trace", "event 4099 0\n");
-    for (const char* which : {"json", "report"}) {
-        ReplayOptions options;
-        options.tracePath = dir + "/t.trace";
-        options.fast = true;
-        (std::string(which) == "json" ? options.summaryJsonPath : options.reportPath) =
-            dir + "/no/such/dir/out";
-        FILE* err = tmpfile();
-        ReplaySession session(options, stdout, err);
-        EXPECT_EQ(ReplaySession::kSetupFailed, session.run()) << which;
-        EXPECT_EQ(0, session.calls()) << which;
-        fclose(err);
-    }
 }
 
 }  // namespace

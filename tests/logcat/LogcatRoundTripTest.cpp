@@ -46,14 +46,8 @@ void quietLogger(const struct __android_logger_data*, const char*) {}
 // Replays `trace` on a fresh device; the node summary, one line per node key.
 std::map<std::string, std::string> replay(const std::string& trace, const std::string& name) {
     const std::string dir = hosttest::makeScratchDir(name);
-    ReplayOptions options;
-    options.tracePath = trace;
-    options.configDirs = {std::string(VELMORA_SOURCE_DIR) + "/examples"};
-    options.fast = true;
-    options.quiet = true;
-    options.deviceRoot = dir + "/device";
-    options.timelinePath = dir + "/timeline.json";
-    options.eventLogPath = dir + "/events.log";
+    ReplayOptions options = hosttest::replayOptions(dir, trace);
+    options.configDirs = {hosttest::examplesDir()};
     FILE* out = fopen((dir + "/stdout.txt").c_str(), "w");
     ReplaySession session(options, out, stderr);
     EXPECT_EQ(ReplaySession::kOk, session.run()) << trace;
@@ -67,9 +61,9 @@ std::map<std::string, std::string> replay(const std::string& trace, const std::s
 
 TEST(LogcatRoundTripTest, ImportedMinuteReplaysLikeTheOriginal) {
     const std::string dir = hosttest::makeScratchDir("roundtrip");
-    const std::string minute = std::string(VELMORA_SOURCE_DIR) + "/examples/minute.trace";
-    hosttest::writeFile(dir + "/original.trace",
-                        "@0 dump --logon\n" + hosttest::readFile(minute) + "\n");
+    hosttest::writeFile(
+        dir + "/original.trace",
+        "@0 dump --logon\n" + hosttest::readFile(hosttest::examplesDir() + "/minute.trace") + "\n");
 
     __android_log_set_minimum_priority(ANDROID_LOG_VERBOSE);
     __android_log_set_logger(threadtimeLogger);
