@@ -55,7 +55,7 @@ TEST_F(DeviceTreeTest, WritesOnlyWhenTheValueChanges) {
     EXPECT_EQ("900000000", base);
 }
 
-TEST(NodeMapTest, OverridesChangePathAndSeed) {
+TEST(NodeMapTest, OverridesChangePathAndSeedAndBadLinesNameTheLine) {
     NodeMap nodes;
     std::string error;
     ASSERT_EQ(0, nodes.parse("# six big cores on policy6\n"
@@ -69,18 +69,11 @@ TEST(NodeMapTest, OverridesChangePathAndSeed) {
     EXPECT_EQ("3000000", nodes.find("cpu.big.max")->seed);
     EXPECT_EQ("257000000", nodes.find("gpu.min")->seed);
     EXPECT_EQ("cpu.big.max", nodes.keyForTag(5));
-}
-
-TEST(NodeMapTest, BadLinesNameFileAndLine) {
-    NodeMap nodes;
-    std::string error;
     // Only the nodes of the map can be moved, and only inside the device root.
     EXPECT_EQ(-1, nodes.parse("cpu.mid.max sys/x\n", "nodes.txt", &error));
     EXPECT_EQ("nodes.txt:1: unknown node 'cpu.mid.max'", error);
     EXPECT_EQ(-1, nodes.parse("\ngpu.max ../../etc/passwd\n", "nodes.txt", &error));
     EXPECT_EQ("nodes.txt:2: bad path for node 'gpu.max'", error);
-    EXPECT_EQ(-1, nodes.load("/nonexistent/nodes.txt", &error));
-    EXPECT_EQ("/nonexistent/nodes.txt: cannot open node map", error);
 }
 
 }  // namespace

@@ -115,11 +115,7 @@ TEST_F(HostExecutorTest, RequestsOfDifferentSourcesCombinePerNode) {
 }
 
 TEST_F(HostExecutorTest, ScenesAndMemoryLatencyStayUntilWithdrawnAndAreMarked) {
-    Action gov;
-    gov.mCmdId = 4224;
-    gov.mName = "gov";
-    gov.mParamNum = 2;
-    gov.mParams = {"priority", "50", "big_governor", "performance"};
+    Action gov(4224, "gov", 0, 2, {"priority", "50", "big_governor", "performance"});
     Action memlat(20480, "", 0, 2, {"mem_latency_ratio_b", "0.5", "mem_latency_ratio_l", "0.7"});
     ASSERT_EQ(0, apply(gov, 0));
     ASSERT_EQ(0, apply(memlat, 0));

@@ -20,8 +20,12 @@ using linttest::withBase;
 
 const std::string kExample = VELMORA_SOURCE_DIR "/examples/xml/velmora_config_cust.xml";
 
-TEST(LintCommandTest, ExplainListsEveryCommandsDispatch) {
-    const std::string config = withBase(
+// The dispatch of every command, then the findings, each with the server rule behind it.
+TEST(LintCommandTest, ExplainListsEveryCommandsDispatchAndTheRulesBehindFindings) {
+    const std::string config =
+        "<policy>\n<cmd id=\"5376\" name=\"defaults\"><a><duration>0</duration>"
+        "<group_hmp>10</group_hmp></a></cmd>\n<cmd id=\"4116\" name=\"probe\"><a>"
+        "<duration>200</duration><big_min>1497600</big_min></a></cmd>\n"
         "<cmd id=\"4099\" name=\"cold\"><a><duration>1500</duration><big_min>2419200</big_min>"
         "</a><a><duration>10</duration></a></cmd>\n"
         "<cmd id=\"4118\" name=\"video\"><a><big_max>1804800</big_max></a></cmd>\n"
@@ -29,15 +33,15 @@ TEST(LintCommandTest, ExplainListsEveryCommandsDispatch) {
         "<big_governor>performance</big_governor></a></cmd>\n"
         "<cmd id=\"12300\" name=\"floor\"><a><duration>0</duration><big_min>1209600</big_min>"
         "<ddr_min>800000000</ddr_min></a></cmd>\n"
-        "<cmd id=\"4100\" name=\"off\"><a><duration>-1</duration></a></cmd>\n");
+        "<cmd id=\"4100\" name=\"off\"><a><duration>-1</duration></a></cmd>\n</policy>\n";
     const auto result = runLint({"--explain"}, configFile(config));
     const std::vector<std::string> expected = {
         "5376 defaults (line 2): start-up levels, duration 0, 1 pair",
         "    group_hmp(50)=10",
         "    -> sent at start-up: records the default group levels",
-        "4116 probe (line 3): probe boost, duration 50, 1 pair",
+        "4116 probe (line 3): probe boost, duration 200, 1 pair",
         "    big_min(4)=1497600",
-        "    -> probed threads get the pairs for 50 ms; a message that does not begin "
+        "    -> probed threads get the pairs for 200 ms; a message that does not begin "
         "\"pid=<n>\" is answered with 0, as if it had worked, and boosts nothing",
         "4099 cold (line 4): timed action, duration 1500, 1 pair",
         "    big_min(4)=2419200",
@@ -56,27 +60,15 @@ TEST(LintCommandTest, ExplainListsEveryCommandsDispatch) {
         "platform's own action",
         "4100 off (line 8): disabled, duration -1, 0 pairs",
         "    -> events do nothing and return 0",
+        "F:3: warning: probe duration 200 ms is capped to 100 at start-up but used as "
+        "configured after a reload",
+        "    the probe worker clamps the duration of the probe action it is built with to 100 ms; "
+        "a reload hands it the newly parsed action unchanged, so the same configuration boosts "
+        "probed threads longer after a reload than after start-up.",
         "F:8: note: command 4100 is disabled (duration -1): its events do nothing",
     };
     EXPECT_EQ(result.outLines(), expected) << result.out;
     EXPECT_EQ(result.status, 0);
-}
-
-TEST(LintCommandTest, ExplainPrintsTheServerRuleBehindAFinding) {
-    const auto result =
-        runLint({"--explain"},
-                configFile("<policy>\n<cmd id=\"5376\"><a><duration>0</duration><group_hmp>0"
-                           "</group_hmp></a></cmd>\n<cmd id=\"4116\"><a>\n<duration>200</duration>"
-                           "</a></cmd>\n</policy>\n"));
-    const auto lines = result.outLines();
-    ASSERT_GE(lines.size(), 2u) << result.out;
-    EXPECT_EQ(lines[lines.size() - 2],
-              "F:4: warning: probe duration 200 ms is capped to 100 at start-up but used as "
-              "configured after a reload");
-    EXPECT_EQ(lines.back(),
-              "    the probe worker clamps the duration of the probe action it is built with to "
-              "100 ms; a reload hands it the newly parsed action unchanged, so the same "
-              "configuration boosts probed threads longer after a reload than after start-up.");
 }
 
 // Exit status by the worst finding, and --werror turning warnings (not notes) into status 1.

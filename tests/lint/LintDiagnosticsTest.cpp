@@ -29,19 +29,10 @@ const Row kRows[] = {
      {"F:2: error: not well-formed XML: element <cmd> is not closed (expected </cmd> before the "
       "enclosing element ends); the server loads nothing from this file"},
      2},
-    {"EmptyPolicy",
-     "<policy>\n  <!-- nothing yet -->\n</policy>\n",
-     {"F:1: error: <policy> has no command element: the server loads nothing from this file"},
-     2},
     {"NoUsableIdAtAll",
      "<policy>\n<cmd name=\"a\"/>\n</policy>\n",
      {"F:1: error: no command has a usable id: the server loads nothing from this file",
       "F:2: error: command <cmd name=\"a\"> has no \"id\": the loader skips it"},
-     2},
-    {"HexadecimalId",  // tinyxml2 would read it; the loader takes decimal text only
-     withBase("<scene id=\"0x1016\" name=\"game\"><a><duration>10</duration></a></scene>\n"),
-     {"F:4: error: command <scene name=\"game\"> has id \"0x1016\", which is not a decimal "
-      "integer: the loader skips it"},
      2},
     {"DuplicateIdFirstWins",
      withBase("<cmd id=\"4099\" name=\"a\"><a><duration>10</duration></a></cmd>\n"
@@ -91,11 +82,6 @@ const Row kRows[] = {
      {"F:5: error: on/off command 13568: floor <gpu_min> 700000000 is above the cap <gpu_max> "
       "600000000; switching it on fails (-1)"},
      2},
-    {"GovernorSceneWithoutPriority",  // an integer tag 101 does not count for governor scenes
-     withBase("<cmd id=\"4300\">\n<a><tag_101>30</tag_101><big_governor>performance"
-              "</big_governor></a></cmd>\n"),
-     {"F:5: error: governor scene 4300 has no <priority>: every switch is refused (-1)"},
-     2},
 
     // --- Values the example device takes otherwise or refuses.
     {"KhzFigureInAnHzNode",
@@ -115,12 +101,6 @@ const Row kRows[] = {
       "powersave"},
      2},
 
-    // --- Commands that do nothing.
-    {"IdNeverRead",
-     withBase("<cmd id=\"20300\"><a><duration>10</duration></a></cmd>\n"),
-     {"F:4: warning: command 20300 is never read: events with this id never read the "
-      "configuration"},
-     0},
 };
 
 class LintDiagnosticsTest : public testing::TestWithParam<Row> {};

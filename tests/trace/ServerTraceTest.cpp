@@ -75,9 +75,6 @@ INSTANTIATE_TEST_SUITE_P(
         SliceCase{"event",
                   [](VelmoraServer& s) { event(s, 4097, kOn); },
                   {"velmoraEvent cmdId=4097", "<end>"}},
-        SliceCase{"client",
-                  [](VelmoraServer& s) { setConfig(s, 2, {2}, {1200000}); },
-                  {"velmoraSetConfig clientId=2", "<end>"}},
         SliceCase{"dump",
                   [](VelmoraServer& s) {
                       s.dumpVelmoraServerInfo(-1, {"--help"});  // refused, still traced
