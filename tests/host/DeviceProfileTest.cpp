@@ -41,8 +41,6 @@ const BadProfile kBadProfiles[] = {
      "P:2: element <node> is not closed (expected </node> before the enclosing element ends)"},
     {"UnknownKind", "<device>\n<node key=\"a\" kind=\"max\" path=\"x\"/>\n</device>\n",
      "P:2: node 'a' has kind \"max\" (expected floor, cap, value or text)"},
-    {"BadFrequency", "<device>\n<frequencies id=\"gpu\">100 2OO</frequencies>\n</device>\n",
-     "P:2: frequency '2OO' of table 'gpu' is not a positive whole number"},
     {"AbsolutePath", "<device>\n<node key=\"a\" kind=\"value\" path=\"/sys/x\"/>\n</device>\n",
      "P:2: node 'a' needs a path relative to the device root"},
 };
@@ -76,7 +74,6 @@ const Write kWrites[] = {
     {"cpu.little.max", "1500000", V::kRounded, "1497600"},  // a cap rounds down
     {"cpu.big.governor", "performace", V::kRefused, "the device has no governor 'performace'"},
     {"memlat.ratio_b", "6O", V::kRefused, "'6O' is not a number"},
-    {"probe.tid", "anything", V::kAccepted, "anything"},
 };
 
 class KernelRulesTest : public testing::TestWithParam<Write> {};

@@ -52,14 +52,6 @@ std::string* ReplayEndToEndTest::sDir = nullptr;
 int ReplayEndToEndTest::sResult = -1;
 int ReplayEndToEndTest::sFailedCalls = -1;
 
-TEST_F(ReplayEndToEndTest, EveryHostCallSucceeds) {
-    EXPECT_EQ(ReplaySession::kOk, sResult);
-    EXPECT_EQ(0, sFailedCalls);
-    const std::string out = hosttest::readFile(*sDir + "/stdout.txt");
-    EXPECT_NE(std::string::npos, out.find("init -> 0"));
-    EXPECT_NE(std::string::npos, out.find("cpu.big.max"));
-}
-
 // Client caps and event limits reach the cpufreq and devfreq nodes through the frequency
 // manager's merge; at the end only ZOLA's big-cluster cap remains.
 TEST_F(ReplayEndToEndTest, FrequencyLimitsReachedTheNodesAndWereReleased) {
@@ -84,20 +76,16 @@ TEST_F(ReplayEndToEndTest, GroupLevelsFollowDefaultsEventsAndClients) {
     EXPECT_EQ(30, summaryOf("sched.group.top_app").max);  // first ZOLA level event
 }
 
-TEST_F(ReplayEndToEndTest, ScenesAndTimedBoostsWereAppliedAndUndone) {
+TEST_F(ReplayEndToEndTest, EveryCallSucceededAndScenesAndTimedBoostsWereUndone) {
+    EXPECT_EQ(ReplaySession::kOk, sResult);
+    EXPECT_EQ(0, sFailedCalls);
+    const std::string out = hosttest::readFile(*sDir + "/stdout.txt");
+    EXPECT_NE(std::string::npos, out.find("init -> 0"));
+    EXPECT_NE(std::string::npos, out.find("cpu.big.max"));
     EXPECT_EQ("schedutil", node("cpu.big.governor"));
     EXPECT_EQ("simple_ondemand", node("gpu.governor"));
     EXPECT_EQ("0", node("sched.fork_on_big"));
     EXPECT_EQ("1", node("memlat.ratio_b"));
-    const auto scenes = HostEnvironment::get().timeline().instants("scene");
-    std::vector<std::string> names;
-    for (const auto& s : scenes)
-        names.push_back(s.name);
-    for (const char* expected :
-         {"4118 video_playback on", "4118 video_playback off", "4119 game on", "4119 game off",
-          "4224 game_big_performance on", "4230 game_gpu_performance off"}) {
-        EXPECT_NE(names.end(), std::find(names.begin(), names.end(), expected)) << expected;
-    }
     const auto actions = HostEnvironment::get().timeline().instants("action");
     ASSERT_FALSE(actions.empty());
     // The launch policy answered 1200 for the cold launch.

@@ -63,10 +63,6 @@ Replayed replay(const std::string& name, const std::string& trace,
     return run;
 }
 
-std::string holderAt(const Replayed& run, const std::string& key, int64_t ms) {
-    return ReplayInsight::holderAt(run.insight, key, ms * 1000);
-}
-
 struct HolderRow {
     const char* what;
     const char* trace;
@@ -81,7 +77,8 @@ TEST_P(HolderTest, NamesTheWinningRequest) {
     const HolderRow& row = GetParam();
     const Replayed run = replay("holder", row.trace);
     ASSERT_EQ(ReplaySession::kOk, run.status);
-    EXPECT_EQ(row.holder, holderAt(run, row.key, row.atMs)) << row.what;
+    EXPECT_EQ(row.holder, ReplayInsight::holderAt(run.insight, row.key, row.atMs * 1000))
+        << row.what;
 }
 
 const char* kClientCaps =
@@ -98,8 +95,7 @@ INSTANTIATE_TEST_SUITE_P(
                     HolderRow{"a scene's higher floor replaces it", kSceneOverAction, "cpu.big.min",
                               1000, "scene 4119 game"},
                     HolderRow{"an on/off command", "@0 event 12300 0\n@10\n", "cpu.little.min", 5,
-                              "onoff 12300 touch_floor"},
-                    HolderRow{"nothing asked", kClientCaps, "gpu.max", 150, "initial"}));
+                              "onoff 12300 touch_floor"}));
 
 TEST(ReplayInsightTest, ResidencySumsToTheTraceLengthAndFollowsTheLimits) {
     const Replayed run = replay("residency", kSceneOverAction);

@@ -103,6 +103,10 @@ const Row kRows[] = {
 
 };
 
+void PrintTo(const Row& row, std::ostream* os) {
+    *os << row.name;
+}
+
 class LintDiagnosticsTest : public testing::TestWithParam<Row> {};
 
 TEST_P(LintDiagnosticsTest, PrintsExactlyTheFinding) {

@@ -8,6 +8,18 @@
 namespace velmora {
 namespace linttest {
 
+namespace {
+
+std::string replaceAll(std::string text, const std::string& from, const std::string& to) {
+    for (size_t at = text.find(from); at != std::string::npos;
+         at = text.find(from, at + to.size())) {
+        text.replace(at, from.size(), to);
+    }
+    return text;
+}
+
+}  // namespace
+
 std::vector<std::string> LintResult::outLines() const {
     std::vector<std::string> lines;
     std::istringstream in(out);
@@ -42,14 +54,6 @@ LintResult runLint(const std::vector<std::string>& options, const std::string& c
     result.out = replaceAll(out.str(), configPath, "F");
     result.err = replaceAll(err.str(), configPath, "F");
     return result;
-}
-
-std::string replaceAll(std::string text, const std::string& from, const std::string& to) {
-    for (size_t at = text.find(from); at != std::string::npos;
-         at = text.find(from, at + to.size())) {
-        text.replace(at, from.size(), to);
-    }
-    return text;
 }
 
 }  // namespace linttest

@@ -27,8 +27,5 @@ std::string withBase(const std::string& body);
 // Runs velmora-lint with `options` followed by `configPath`.
 LintResult runLint(const std::vector<std::string>& options, const std::string& configPath);
 
-// `text` with every `from` replaced by `to`.
-std::string replaceAll(std::string text, const std::string& from, const std::string& to);
-
 }  // namespace linttest
 }  // namespace velmora

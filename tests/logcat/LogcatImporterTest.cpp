@@ -92,6 +92,10 @@ std::string threadtimeLog(const std::vector<std::pair<int, std::string>>& lines)
     return log;
 }
 
+void PrintTo(const LineRow& row, std::ostream* os) {
+    *os << row.name;
+}
+
 class ServerLinesTest : public testing::TestWithParam<LineRow> {};
 
 TEST_P(ServerLinesTest, BecomeCalls) {
@@ -162,36 +166,27 @@ INSTANTIATE_TEST_SUITE_P(
 
 // ---- The program on bad input: one line, exit 1 and no trace.
 
-struct BadInputRow {
-    const char* name;
-    std::string log;
-    const char* error;  // part of the one line
-};
-
-class ImportCommandTest : public testing::TestWithParam<BadInputRow> {};
-
-TEST_P(ImportCommandTest, RejectsBadInput) {
-    const std::string dir = hosttest::makeScratchDir("logcat");
-    hosttest::writeFile(dir + "/device.log", GetParam().log);
-    std::ostringstream out, err;
-    EXPECT_EQ(LogcatImportCommand::kBadInput,
-              LogcatImportCommand::run({dir + "/device.log", "-o", dir + "/out.trace"}, out, err));
-    EXPECT_NE(std::string::npos, err.str().find(GetParam().error)) << err.str();
-    EXPECT_EQ(err.str().find('\n'), err.str().size() - 1) << err.str();
-    EXPECT_EQ("<missing>", hosttest::readFile(dir + "/out.trace"));
+TEST(ImportCommandTest, RejectsBadInput) {
+    const std::pair<const char*, const char*> rows[] = {
+        {"velmora server I 11-23 18:14:04 17979 17979 velmoraEvent\n",
+         "not logcat text in a known format"},
+        {"11-23 18:09:30.100  1234  1250 I ActivityManager: x\n",
+         "no \"velmora server\" lines among 1 line of logcat -v threadtime"},
+        {"11-23 18:09:30.100  1234  1250 E velmora server: init mPlatPtr failed!\n",
+         "no host calls among 1 velmora server line"},
+    };
+    for (const auto& row : rows) {
+        const std::string dir = hosttest::makeScratchDir("logcat");
+        hosttest::writeFile(dir + "/device.log", row.first);
+        std::ostringstream out, err;
+        EXPECT_EQ(
+            LogcatImportCommand::kBadInput,
+            LogcatImportCommand::run({dir + "/device.log", "-o", dir + "/out.trace"}, out, err));
+        EXPECT_NE(std::string::npos, err.str().find(row.second)) << err.str();
+        EXPECT_EQ(err.str().find('\n'), err.str().size() - 1) << err.str();
+        EXPECT_EQ("<missing>", hosttest::readFile(dir + "/out.trace"));
+    }
 }
-
-INSTANTIATE_TEST_SUITE_P(
-    BadInput, ImportCommandTest,
-    testing::Values(
-        BadInputRow{"UnknownFormat", "velmora server I 11-23 18:14:04 17979 17979 velmoraEvent\n",
-                    "not logcat text in a known format"},
-        BadInputRow{"NoServerLines", "11-23 18:09:30.100  1234  1250 I ActivityManager: x\n",
-                    "no \"velmora server\" lines among 1 line of logcat -v threadtime"},
-        BadInputRow{"NoHostCalls",
-                    "11-23 18:09:30.100  1234  1250 E velmora server: init mPlatPtr failed!\n",
-                    "no host calls among 1 velmora server line"}),
-    [](const testing::TestParamInfo<BadInputRow>& info) { return std::string(info.param.name); });
 
 }  // namespace
 }  // namespace velmora

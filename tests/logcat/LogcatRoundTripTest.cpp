@@ -25,8 +25,8 @@ std::string gLogcat;
 // liblog's lines as `adb logcat -v threadtime` prints them, stamped with the replay's clock
 // from 18:00 on.
 void threadtimeLogger(const struct __android_logger_data* data, const char* message) {
-    const int64_t ms = HostEnvironment::get().clock().nowUs() / 1000;
-    const int64_t s = ms / 1000;
+    const long long ms = HostEnvironment::get().clock().nowUs() / 1000;
+    const long long s = ms / 1000;
     std::string text = message != nullptr ? message : "";
     while (!text.empty() && text.back() == '\n')
         text.pop_back();
@@ -34,9 +34,8 @@ void threadtimeLogger(const struct __android_logger_data* data, const char* mess
         data->priority >= 2 && data->priority <= 8 ? "VDIWEFS"[data->priority - 2] : '?';
     char line[1024];
     snprintf(line, sizeof(line), "11-23 %02lld:%02lld:%02lld.%03lld %5d %5d %c %s: %s\n",
-             static_cast<long long>(18 + s / 3600), static_cast<long long>(s / 60 % 60),
-             static_cast<long long>(s % 60), static_cast<long long>(ms % 1000), getpid(), gettid(),
-             priority, data->tag != nullptr ? data->tag : "", text.c_str());
+             18 + s / 3600, s / 60 % 60, s % 60, ms % 1000, getpid(), gettid(), priority,
+             data->tag != nullptr ? data->tag : "", text.c_str());
     std::lock_guard<std::mutex> lock(gLogLock);
     gLogcat += line;
 }

@@ -75,10 +75,9 @@ INSTANTIATE_TEST_SUITE_P(
         SliceCase{"event",
                   [](VelmoraServer& s) { event(s, 4097, kOn); },
                   {"velmoraEvent cmdId=4097", "<end>"}},
+        // A dump to a bad descriptor is refused, and still traced.
         SliceCase{"dump",
-                  [](VelmoraServer& s) {
-                      s.dumpVelmoraServerInfo(-1, {"--help"});  // refused, still traced
-                  },
+                  [](VelmoraServer& s) { s.dumpVelmoraServerInfo(-1, {"--help"}); },
                   {"dumpVelmoraServerInfo", "<end>"}},
         SliceCase{"reload",
                   [](VelmoraServer& s) { s.velmoraEvent(20230, "", 0, nullptr); },
