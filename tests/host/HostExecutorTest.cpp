@@ -21,12 +21,13 @@ namespace {
 class HostExecutorTest : public testing::Test {
 protected:
     void SetUp() override {
-        mClock.setVirtual();
+        setClock();
         mTree.setRoot(hosttest::makeScratchDir("executor"));
         ASSERT_EQ(0, mTree.seed());
         mExecutor.reset(new HostExecutor(mNodes, mTree, mClock, mTimeline));
     }
 
+    virtual void setClock() { mClock.setVirtual(); }
     std::string node(const std::string& key) { return hosttest::readFile(mTree.pathOf(key)); }
 
     static Action action(int cmdId, int duration, std::vector<int32_t> pairs) {
@@ -114,11 +115,7 @@ TEST_F(HostExecutorTest, RequestsOfDifferentSourcesCombinePerNode) {
 }
 
 TEST_F(HostExecutorTest, ScenesAndMemoryLatencyStayUntilWithdrawnAndAreMarked) {
-    Action gov;
-    gov.mCmdId = 4224;
-    gov.mName = "gov";
-    gov.mParamNum = 2;
-    gov.mParams = {"priority", "50", "big_governor", "performance"};
+    Action gov(4224, "gov", 0, 2, {"priority", "50", "big_governor", "performance"});
     Action memlat(20480, "", 0, 2, {"mem_latency_ratio_b", "0.5", "mem_latency_ratio_l", "0.7"});
     ASSERT_EQ(0, apply(gov, 0));
     ASSERT_EQ(0, apply(memlat, 0));
@@ -190,32 +187,33 @@ TEST_F(HostExecutorTest, ProbeBoostLastsWhileAnyThreadIsBoosted) {
     EXPECT_EQ(0u, mExecutor->boostedThreads());
 }
 
-TEST(HostExecutorRealTime, TimerThreadRevertsWithoutAnyCaller) {
-    HostClock clock;
-    clock.setRealTime(50.0);  // 1000 trace ms in 20 real ms
-    Timeline timeline(clock);
-    NodeMap nodes;
-    DeviceTree tree(nodes, timeline);
-    tree.setRoot(hosttest::makeScratchDir("realtime"));
-    ASSERT_EQ(0, tree.seed());
-    HostExecutor executor(nodes, tree, clock, timeline);
-    Action boost;
-    boost.mCmdId = 4099;
-    boost.mDuration = 1000;
-    boost.mParamNum = 1;
-    boost.mTagValues = {7, 500000000};
-    const int on = 0;
-    ASSERT_EQ(0, executor.doAction(&boost, 1, &on));
+// What the device profile makes of a refused or rounded request, on the nodes and the timeline.
+TEST_F(HostExecutorTest, ReportsARefusedWriteAndKeepsTheRoundedOne) {
+    const int tags[] = {2, 8};
+    const int values[] = {1500000, 600000};  // a cap between steps; kHz in an Hz node
+    EXPECT_EQ(-1, mExecutor->doPerfSetConfig(1, 2, tags, values));
+    EXPECT_EQ("1497600", node("cpu.little.max"));
+    EXPECT_EQ("900000000", node("gpu.max"));
+    const auto notes = mTimeline.instants("device");
+    ASSERT_EQ(2u, notes.size());
+    EXPECT_EQ("cpu.little.max requested 1500000, effective 1497600", notes[0].name);
+    EXPECT_EQ("gpu.max refused 600000: 600000 is below the lowest frequency 257000000 Hz",
+              notes[1].name);
+}
+
+class HostExecutorRealTime : public HostExecutorTest {
+protected:
+    void setClock() override { mClock.setRealTime(50.0); }  // 1000 trace ms in 20 real ms
+};
+
+TEST_F(HostExecutorRealTime, TimerThreadRevertsWithoutAnyCaller) {
+    ASSERT_EQ(0, apply(action(4099, 1000, {7, 500000000}), 0));
     // Generous bound: the revert is due after 20 ms real.
-    std::string gpuMin;
-    for (int i = 0; i < 200; ++i) {
-        ASSERT_TRUE(tree.read("gpu.min", &gpuMin));
-        if (gpuMin == "257000000")
-            break;
+    for (int i = 0; i < 200 && node("gpu.min") != "257000000"; ++i) {
         usleep(10000);
     }
-    EXPECT_EQ("257000000", gpuMin);
-    EXPECT_FALSE(executor.timedActionPending(4099));
+    EXPECT_EQ("257000000", node("gpu.min"));
+    EXPECT_FALSE(mExecutor->timedActionPending(4099));
 }
 
 }  // namespace

@@ -65,22 +65,6 @@ TEST_F(HostLoadXmlTest, NamedParametersBecomeTagPairs) {
     EXPECT_EQ(-1, mMap->at(4099)->mDuration);
 }
 
-TEST_F(HostLoadXmlTest, GovernorScenesAndMemoryLatencyKeepStringPairs) {
-    ASSERT_NE(nullptr, load(R"(
-        <cmd id="4230" name="gov"><act><priority>40</priority><duration>0</duration>
-            <gpu_governor>performance</gpu_governor><big_max>1804800</big_max></act></cmd>
-        <cmd id="20481" name="memlat"><act><mem_latency_ratio_b>0.6</mem_latency_ratio_b>
-            </act></cmd>)"));
-    const Action* gov = first(4230);
-    ASSERT_NE(nullptr, gov);
-    EXPECT_EQ(3, gov->mParamNum);
-    EXPECT_EQ((std::vector<std::string>{"priority", "40", "gpu_governor", "performance", "big_max",
-                                        "1804800"}),
-              gov->mParams);
-    EXPECT_TRUE(gov->mTagValues.empty());
-    EXPECT_EQ((std::vector<std::string>{"mem_latency_ratio_b", "0.6"}), first(20481)->mParams);
-}
-
 // Parameters the vocabulary does not know are left out, each with a log line naming the
 // command and the element; the rest of the action survives.
 TEST_F(HostLoadXmlTest, NotUnderstoodParametersAreLoggedAndLeftOut) {
@@ -93,19 +77,14 @@ TEST_F(HostLoadXmlTest, NotUnderstoodParametersAreLoggedAndLeftOut) {
     EXPECT_EQ((std::vector<int32_t>{53, 20}), action->mTagValues);
     EXPECT_EQ(0, action->mDuration);
     EXPECT_TRUE(first(4300)->mParams.empty());
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
-                                "config: cmdId=4101 (scroll): duration 'soon' is not an "
-                                "integer, ignored"));
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
-                                "config: cmdId=4101 (scroll): unknown parameter <turbo>, ignored"));
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
-                                "config: cmdId=4101 (scroll): <little_min> value '1.5GHz' is not "
-                                "an integer, ignored"));
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
-                                "config: cmdId=4101 (scroll): unknown parameter <tag_x>, ignored"));
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
-                                "config: cmdId=4300 (gov): unknown parameter <warp_drive>, "
-                                "ignored"));
+    for (const char* line :
+         {"config: cmdId=4101 (scroll): duration 'soon' is not an integer, ignored",
+          "config: cmdId=4101 (scroll): unknown parameter <turbo>, ignored",
+          "config: cmdId=4101 (scroll): <little_min> value '1.5GHz' is not an integer, ignored",
+          "config: cmdId=4101 (scroll): unknown parameter <tag_x>, ignored",
+          "config: cmdId=4300 (gov): unknown parameter <warp_drive>, ignored"}) {
+        EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, line)) << line;
+    }
 }
 
 }  // namespace

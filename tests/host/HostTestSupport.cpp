@@ -36,5 +36,31 @@ void writeFile(const std::string& path, const std::string& text) {
     file << text;
 }
 
+std::string readAndClose(FILE* file) {
+    rewind(file);
+    std::string text;
+    char buffer[512];
+    while (fgets(buffer, sizeof(buffer), file) != nullptr) {
+        text += buffer;
+    }
+    fclose(file);
+    return text;
+}
+
+ReplayOptions replayOptions(const std::string& dir, const std::string& trace) {
+    ReplayOptions options;
+    options.tracePath = trace;
+    options.fast = true;
+    options.quiet = true;
+    options.deviceRoot = dir + "/device";
+    options.timelinePath = dir + "/timeline.json";
+    options.eventLogPath = dir + "/events.log";
+    return options;
+}
+
+std::string examplesDir() {
+    return std::string(VELMORA_SOURCE_DIR) + "/examples";
+}
+
 }  // namespace hosttest
 }  // namespace velmora

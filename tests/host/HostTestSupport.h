@@ -1,7 +1,10 @@
-// Helpers shared by the host-layer tests: scratch directories and reading node files.
+// Helpers shared by the host-layer tests: scratch directories, node files and replay options.
 #pragma once
 
+#include <cstdio>
 #include <string>
+
+#include "tools/replay/ReplaySession.h"
 
 namespace velmora {
 namespace hosttest {
@@ -11,6 +14,13 @@ std::string makeScratchDir(const std::string& name);
 // Whole contents of `path` without a trailing newline; "<missing>" when unreadable.
 std::string readFile(const std::string& path);
 void writeFile(const std::string& path, const std::string& text);
+// Everything written to `file` (a tmpfile()); closes it.
+std::string readAndClose(FILE* file);
+
+// A quiet replay of `trace` in virtual time with the device, timeline and event log in `dir`.
+ReplayOptions replayOptions(const std::string& dir, const std::string& trace);
+// The example configuration's directory.
+std::string examplesDir();
 
 }  // namespace hosttest
 }  // namespace velmora

@@ -22,15 +22,9 @@ class ReplayEndToEndTest : public testing::Test {
 protected:
     static void SetUpTestSuite() {
         sDir = new std::string(hosttest::makeScratchDir("replay"));
-        ReplayOptions options;
-        options.tracePath = std::string(VELMORA_SOURCE_DIR) + "/examples/minute.trace";
-        options.fast = true;
-        options.quiet = true;
-        options.deviceRoot = *sDir + "/device";
-        options.timelinePath = *sDir + "/timeline.json";
-        options.eventLogPath = *sDir + "/events.log";
         FILE* out = fopen((*sDir + "/stdout.txt").c_str(), "w");
-        ReplaySession session(options, out, stderr);
+        ReplaySession session(
+            hosttest::replayOptions(*sDir, hosttest::examplesDir() + "/minute.trace"), out, stderr);
         sResult = session.run();
         sFailedCalls = session.failedCalls();
         fclose(out);
@@ -40,14 +34,13 @@ protected:
     static std::string node(const std::string& key) {
         return hosttest::readFile(HostEnvironment::get().device().pathOf(key));
     }
-    static const Timeline::NodeSummary* summaryOf(const std::string& key) {
-        static std::vector<Timeline::NodeSummary> summary;
-        summary = HostEnvironment::get().timeline().summary();
-        for (const auto& s : summary) {
+    static Timeline::NodeSummary summaryOf(const std::string& key) {
+        for (const auto& s : HostEnvironment::get().timeline().summary()) {
             if (s.key == key)
-                return &s;
+                return s;
         }
-        return nullptr;
+        ADD_FAILURE() << "no summary for " << key;
+        return {};
     }
 
     static std::string* sDir;
@@ -59,14 +52,6 @@ std::string* ReplayEndToEndTest::sDir = nullptr;
 int ReplayEndToEndTest::sResult = -1;
 int ReplayEndToEndTest::sFailedCalls = -1;
 
-TEST_F(ReplayEndToEndTest, EveryHostCallSucceeds) {
-    EXPECT_EQ(ReplaySession::kOk, sResult);
-    EXPECT_EQ(0, sFailedCalls);
-    const std::string out = hosttest::readFile(*sDir + "/stdout.txt");
-    EXPECT_NE(std::string::npos, out.find("init -> 0"));
-    EXPECT_NE(std::string::npos, out.find("cpu.big.max"));
-}
-
 // Client caps and event limits reach the cpufreq and devfreq nodes through the frequency
 // manager's merge; at the end only ZOLA's big-cluster cap remains.
 TEST_F(ReplayEndToEndTest, FrequencyLimitsReachedTheNodesAndWereReleased) {
@@ -75,18 +60,11 @@ TEST_F(ReplayEndToEndTest, FrequencyLimitsReachedTheNodesAndWereReleased) {
     EXPECT_EQ("900000000", node("gpu.max"));
     EXPECT_EQ("300000", node("cpu.little.min"));
     EXPECT_EQ("65000", node("ipa.switch_temp"));
-    const auto* bigMax = summaryOf("cpu.big.max");
-    ASSERT_NE(nullptr, bigMax);
-    EXPECT_EQ(1804800, bigMax->min);  // thermal cap and battery saver
-    const auto* littleMax = summaryOf("cpu.little.max");
-    ASSERT_NE(nullptr, littleMax);
-    EXPECT_EQ(1401600, littleMax->min);
-    const auto* switchTemp = summaryOf("ipa.switch_temp");
-    ASSERT_NE(nullptr, switchTemp);
-    EXPECT_EQ(60000, switchTemp->min);
-    const auto* ddr = summaryOf("ddr.min");
-    ASSERT_NE(nullptr, ddr);
-    EXPECT_EQ(800000000, ddr->max);  // tag 10 of the touch floor, left to the platform
+    EXPECT_EQ(1804800, summaryOf("cpu.big.max").min);  // thermal cap and battery saver
+    EXPECT_EQ(1401600, summaryOf("cpu.little.max").min);
+    EXPECT_EQ(60000, summaryOf("ipa.switch_temp").min);
+    EXPECT_EQ(800000000,
+              summaryOf("ddr.min").max);  // tag 10 of the touch floor, left to the platform
 }
 
 // The 5376 defaults, the scroll and ZOLA events and KX's step all end up in the group nodes.
@@ -95,25 +73,19 @@ TEST_F(ReplayEndToEndTest, GroupLevelsFollowDefaultsEventsAndClients) {
     EXPECT_EQ("10", node("sched.group.vip"));       // 4113 restored the ZOLA level
     EXPECT_EQ("-20", node("sched.group.background"));
     EXPECT_EQ("-20", node("sched.group.system_background"));
-    const auto* topApp = summaryOf("sched.group.top_app");
-    ASSERT_NE(nullptr, topApp);
-    EXPECT_EQ(30, topApp->max);  // first ZOLA level event
+    EXPECT_EQ(30, summaryOf("sched.group.top_app").max);  // first ZOLA level event
 }
 
-TEST_F(ReplayEndToEndTest, ScenesAndTimedBoostsWereAppliedAndUndone) {
+TEST_F(ReplayEndToEndTest, EveryCallSucceededAndScenesAndTimedBoostsWereUndone) {
+    EXPECT_EQ(ReplaySession::kOk, sResult);
+    EXPECT_EQ(0, sFailedCalls);
+    const std::string out = hosttest::readFile(*sDir + "/stdout.txt");
+    EXPECT_NE(std::string::npos, out.find("init -> 0"));
+    EXPECT_NE(std::string::npos, out.find("cpu.big.max"));
     EXPECT_EQ("schedutil", node("cpu.big.governor"));
     EXPECT_EQ("simple_ondemand", node("gpu.governor"));
     EXPECT_EQ("0", node("sched.fork_on_big"));
     EXPECT_EQ("1", node("memlat.ratio_b"));
-    const auto scenes = HostEnvironment::get().timeline().instants("scene");
-    std::vector<std::string> names;
-    for (const auto& s : scenes)
-        names.push_back(s.name);
-    for (const char* expected :
-         {"4118 video_playback on", "4118 video_playback off", "4119 game on", "4119 game off",
-          "4224 game_big_performance on", "4230 game_gpu_performance off"}) {
-        EXPECT_NE(names.end(), std::find(names.begin(), names.end(), expected)) << expected;
-    }
     const auto actions = HostEnvironment::get().timeline().instants("action");
     ASSERT_FALSE(actions.empty());
     // The launch policy answered 1200 for the cold launch.
@@ -136,9 +108,9 @@ TEST_F(ReplayEndToEndTest, ReportLinesWentToTheEventLogAndTimeline) {
     EXPECT_EQ(4u, HostEnvironment::get().timeline().instants("report").size());
 }
 
-// Whether the file parses as JSON is checked by host.replay_timeline_is_json on the program's
-// own output.
-TEST_F(ReplayEndToEndTest, TimelineIsChromeJsonWithTheExpectedTracks) {
+// The timeline in Chrome's JSON (whether it parses is host.replay_timeline_is_json's check): a
+// counter track per node, and the server's own tracks under the names a device capture shows.
+TEST_F(ReplayEndToEndTest, TimelineHoldsTheNodeAndServerTracks) {
     const std::string json = hosttest::readFile(*sDir + "/timeline.json");
     EXPECT_EQ(0u, json.find("{\"displayTimeUnit\":\"ms\",\"traceEvents\":["));
     for (const auto& node : HostEnvironment::get().nodeMap().nodes()) {
@@ -147,13 +119,12 @@ TEST_F(ReplayEndToEndTest, TimelineIsChromeJsonWithTheExpectedTracks) {
         EXPECT_NE(std::string::npos, json.find("{\"name\":\"" + node.key + "\",\"ph\":\"C\""))
             << node.key;
     }
-    EXPECT_NE(std::string::npos, json.find("\"cat\":\"report\",\"ph\":\"i\""));
-    EXPECT_NE(std::string::npos, json.find("{\"name\":\"4119 game on\",\"cat\":\"scene\""));
-    EXPECT_NE(std::string::npos, json.find("\"name\":\"cpu.big.governor=performance\""));
-}
-
-// The server's own tracks, under the names and with the values a device capture shows.
-TEST_F(ReplayEndToEndTest, ServerTracksAreNamedAsOnTheDevice) {
+    for (const char* event :
+         {"\"cat\":\"report\",\"ph\":\"i\"", "{\"name\":\"4119 game on\",\"cat\":\"scene\"",
+          "\"name\":\"cpu.big.governor=performance\"", "{\"name\":\"velmora.scene\",\"ph\":\"C\"",
+          "{\"name\":\"velmoraEvent cmdId=4119\",\"ph\":\"X\""}) {
+        EXPECT_NE(std::string::npos, json.find(event)) << event;
+    }
     const Timeline& timeline = HostEnvironment::get().timeline();
     std::vector<int64_t> scenes;
     for (const auto& sample : timeline.counter("velmora.scene"))
@@ -167,61 +138,24 @@ TEST_F(ReplayEndToEndTest, ServerTracksAreNamedAsOnTheDevice) {
          {"velmoraEvent cmdId=4119", "velmoraSetConfig clientId=1", "dumpVelmoraServerInfo"}) {
         EXPECT_NE(names.end(), std::find(names.begin(), names.end(), name)) << name;
     }
-    const std::string json = hosttest::readFile(*sDir + "/timeline.json");
-    EXPECT_NE(std::string::npos, json.find("{\"name\":\"velmora.scene\",\"ph\":\"C\""));
-    EXPECT_NE(std::string::npos, json.find("{\"name\":\"velmoraEvent cmdId=4119\",\"ph\":\"X\""));
 }
 
-TEST(ReplaySessionTest, BadTraceOrMissingConfigurationStopsBeforeAnyCall) {
-    const std::string dir = hosttest::makeScratchDir("badtrace");
-    hosttest::writeFile(dir + "/t.trace", "event 4099 0\n@100 setconfig 1 2=x\n");
-    ReplayOptions options;
-    options.tracePath = dir + "/t.trace";
-    options.fast = true;
-    options.timelinePath = dir + "/timeline.json";
-    options.eventLogPath = dir + "/events.log";
-    FILE* err = tmpfile();
-    ReplaySession bad(options, stdout, err);
-    EXPECT_EQ(ReplaySession::kBadInput, bad.run());
-    EXPECT_EQ(0, bad.calls());
-    rewind(err);
-    char message[256] = {0};
-    ASSERT_NE(nullptr, fgets(message, sizeof(message), err));
-    EXPECT_EQ("velmora-replay: " + dir + "/t.trace:2: malformed number 'x' for value\n",
-              std::string(message));
-    fclose(err);
-
-    // A good trace whose directory holds no configuration.
+// A trace whose directory holds no configuration.
+TEST(ReplaySessionTest, MissingConfigurationStopsBeforeAnyCall) {
+    const std::string dir = hosttest::makeScratchDir("noconfig");
     hosttest::writeFile(dir + "/t.trace", "event 4099 0\n");
-    ReplaySession noConfig(options, stdout, stderr);
-    EXPECT_EQ(ReplaySession::kBadInput, noConfig.run());
-    EXPECT_EQ(0, noConfig.calls());
-}
-
-std::string readAll(FILE* file) {
-    rewind(file);
-    std::string text;
-    char buffer[512];
-    while (fgets(buffer, sizeof(buffer), file) != nullptr) {
-        text += buffer;
-    }
-    return text;
+    ReplaySession session(hosttest::replayOptions(dir, dir + "/t.trace"), stdout, stderr);
+    EXPECT_EQ(ReplaySession::kBadInput, session.run());
+    EXPECT_EQ(0, session.calls());
 }
 
 TEST(ReplaySessionTest, WarnsAboutCallsTheServerCannotMeanAndPointsAtTheChecker) {
     const std::string dir = hosttest::makeScratchDir("warn");
     hosttest::writeFile(dir + "/t.trace", "policy colde 1200\nevent 4321 0\nevent 20225 0\n");
-    ReplayOptions options;
-    options.tracePath = dir + "/t.trace";
-    options.configDirs = {std::string(VELMORA_SOURCE_DIR) + "/examples"};
-    options.fast = true;
-    options.quiet = true;
-    options.deviceRoot = dir + "/device";
-    options.timelinePath = dir + "/timeline.json";
-    options.eventLogPath = dir + "/events.log";
+    ReplayOptions options = hosttest::replayOptions(dir, dir + "/t.trace");
+    options.configDirs = {hosttest::examplesDir()};
     FILE* err = tmpfile();
-    ReplaySession session(options, stdout, err);
-    EXPECT_EQ(ReplaySession::kOk, session.run());
+    EXPECT_EQ(ReplaySession::kOk, ReplaySession(options, stdout, err).run());
     const std::string where = "velmora-replay: " + dir + "/t.trace:";
     EXPECT_EQ(where +
                   "1: warning: policy 'colde' is never asked for: the server asks for "
@@ -229,8 +163,7 @@ TEST(ReplaySessionTest, WarnsAboutCallsTheServerCannotMeanAndPointsAtTheChecker)
                   where +
                   "2: warning: command 4321 is not in the configuration: the server "
                   "answers 2\n",
-              readAll(err));
-    fclose(err);
+              hosttest::readAndClose(err));
 
     // A configuration the server cannot start with (no start-up command 5376).
     ASSERT_EQ(0, mkdir((dir + "/xml").c_str(), 0755));
@@ -238,13 +171,11 @@ TEST(ReplaySessionTest, WarnsAboutCallsTheServerCannotMeanAndPointsAtTheChecker)
                         "<policy><cmd id=\"4099\"><a><duration>5</duration></a></cmd></policy>\n");
     options.configDirs = {dir};
     err = tmpfile();
-    ReplaySession broken(options, stdout, err);
-    EXPECT_EQ(ReplaySession::kSetupFailed, broken.run());
+    EXPECT_EQ(ReplaySession::kSetupFailed, ReplaySession(options, stdout, err).run());
     EXPECT_NE(std::string::npos,
-              readAll(err).find("server init failed with 2; check the configuration with "
-                                "velmora-lint " +
-                                dir + "/xml/velmora_config_cust.xml"));
-    fclose(err);
+              hosttest::readAndClose(err).find("server init failed with 2; check the "
+                                               "configuration with velmora-lint " +
+                                               dir + "/xml/velmora_config_cust.xml"));
 }
 
 }  // namespace

@@ -24,15 +24,10 @@ struct Replayed {
 
 Replayed replay(const std::string& trace, bool fast, double speed, const std::string& name) {
     const std::string dir = hosttest::makeScratchDir(name);
-    ReplayOptions options;
-    options.tracePath = trace;
-    options.configDirs = {std::string(VELMORA_SOURCE_DIR) + "/examples"};
+    ReplayOptions options = hosttest::replayOptions(dir, trace);
+    options.configDirs = {hosttest::examplesDir()};
     options.fast = fast;
     options.speed = speed;
-    options.quiet = true;
-    options.deviceRoot = dir + "/device";
-    options.timelinePath = dir + "/timeline.json";
-    options.eventLogPath = dir + "/events.log";
     FILE* out = fopen((dir + "/stdout.txt").c_str(), "w");
     ReplaySession session(options, out, stderr);
     EXPECT_EQ(ReplaySession::kOk, session.run());

@@ -12,15 +12,18 @@
 namespace velmora {
 namespace {
 
+using linttest::configFile;
 using linttest::runLint;
-using linttest::ScratchDir;
 using linttest::withBase;
 
 const std::string kExample = VELMORA_SOURCE_DIR "/examples/xml/velmora_config_cust.xml";
 
-TEST(LintCommandTest, ExplainListsEveryCommandsDispatch) {
-    ScratchDir dir;
-    const std::string config = withBase(
+// The dispatch of every command, then the findings, each with the server rule behind it.
+TEST(LintCommandTest, ExplainListsEveryCommandsDispatchAndTheRulesBehindFindings) {
+    const std::string config =
+        "<policy>\n<cmd id=\"5376\" name=\"defaults\"><a><duration>0</duration>"
+        "<group_hmp>10</group_hmp></a></cmd>\n<cmd id=\"4116\" name=\"probe\"><a>"
+        "<duration>200</duration><big_min>1497600</big_min></a></cmd>\n"
         "<cmd id=\"4099\" name=\"cold\"><a><duration>1500</duration><big_min>2419200</big_min>"
         "</a><a><duration>10</duration></a></cmd>\n"
         "<cmd id=\"4118\" name=\"video\"><a><big_max>1804800</big_max></a></cmd>\n"
@@ -28,15 +31,15 @@ TEST(LintCommandTest, ExplainListsEveryCommandsDispatch) {
         "<big_governor>performance</big_governor></a></cmd>\n"
         "<cmd id=\"12300\" name=\"floor\"><a><duration>0</duration><big_min>1209600</big_min>"
         "<ddr_min>800000000</ddr_min></a></cmd>\n"
-        "<cmd id=\"4100\" name=\"off\"><a><duration>-1</duration></a></cmd>\n");
-    const auto result = runLint({"--explain"}, dir.write("config.xml", config));
+        "<cmd id=\"4100\" name=\"off\"><a><duration>-1</duration></a></cmd>\n</policy>\n";
+    const auto result = runLint({"--explain"}, configFile(config));
     const std::vector<std::string> expected = {
         "5376 defaults (line 2): start-up levels, duration 0, 1 pair",
         "    group_hmp(50)=10",
         "    -> sent at start-up: records the default group levels",
-        "4116 probe (line 3): probe boost, duration 50, 1 pair",
+        "4116 probe (line 3): probe boost, duration 200, 1 pair",
         "    big_min(4)=1497600",
-        "    -> probed threads get the pairs for 50 ms; a message that does not begin "
+        "    -> probed threads get the pairs for 200 ms; a message that does not begin "
         "\"pid=<n>\" is answered with 0, as if it had worked, and boosts nothing",
         "4099 cold (line 4): timed action, duration 1500, 1 pair",
         "    big_min(4)=2419200",
@@ -55,67 +58,40 @@ TEST(LintCommandTest, ExplainListsEveryCommandsDispatch) {
         "platform's own action",
         "4100 off (line 8): disabled, duration -1, 0 pairs",
         "    -> events do nothing and return 0",
+        "F:3: warning: probe duration 200 ms is capped to 100 at start-up but used as "
+        "configured after a reload",
+        "    the probe worker clamps the duration of the probe action it is built with to 100 ms; "
+        "a reload hands it the newly parsed action unchanged, so the same configuration boosts "
+        "probed threads longer after a reload than after start-up.",
         "F:8: note: command 4100 is disabled (duration -1): its events do nothing",
     };
     EXPECT_EQ(result.outLines(), expected) << result.out;
     EXPECT_EQ(result.status, 0);
 }
 
-TEST(LintCommandTest, ExplainPrintsTheServerRuleBehindAFinding) {
-    ScratchDir dir;
-    const auto result =
-        runLint({"--explain"},
-                dir.write("c.xml",
-                          "<policy>\n<cmd id=\"5376\"><a><duration>0</duration><group_hmp>0"
-                          "</group_hmp></a></cmd>\n<cmd id=\"4116\"><a>\n<duration>200</duration>"
-                          "</a></cmd>\n</policy>\n"));
-    const auto lines = result.outLines();
-    ASSERT_GE(lines.size(), 2u) << result.out;
-    EXPECT_EQ(lines[lines.size() - 2],
-              "F:4: warning: probe duration 200 ms is capped to 100 at start-up but used as "
-              "configured after a reload");
-    EXPECT_EQ(lines.back(),
-              "    the probe worker clamps the duration of the probe action it is built with to "
-              "100 ms; a reload hands it the newly parsed action unchanged, so the same "
-              "configuration boosts probed threads longer after a reload than after start-up.");
-}
-
 // Exit status by the worst finding, and --werror turning warnings (not notes) into status 1.
-struct StatusRow {
-    const char* name;
-    std::string body;
-    int plain;
-    int werror;
-};
-
-const StatusRow kStatusRows[] = {
-    {"Clean", "", 0, 0},
-    {"NoteOnly", "<cmd id=\"4099\"><a><duration>-5</duration></a></cmd>\n", 0, 0},
-    {"Warning", "<cmd id=\"4099\"><a><duration>5</duration><bogus>1</bogus></a></cmd>\n", 0, 1},
-    {"ErrorBeatsWarning",
-     "<cmd id=\"4099\"><a><duration>5</duration><bogus>1</bogus></a></cmd>\n<cmd/>\n", 2, 2},
-};
-
-void PrintTo(const StatusRow& row, std::ostream* os) {
-    *os << row.name;
+TEST(LintCommandTest, ExitStatusFollowsTheWorstFinding) {
+    struct Row {
+        const char* name;
+        std::string body;
+        int plain;
+        int werror;
+    };
+    const Row rows[] = {
+        {"Clean", "", 0, 0},
+        {"NoteOnly", "<cmd id=\"4099\"><a><duration>-5</duration></a></cmd>\n", 0, 0},
+        {"Warning", "<cmd id=\"4099\"><a><duration>5</duration><bogus>1</bogus></a></cmd>\n", 0, 1},
+        {"ErrorBeatsWarning",
+         "<cmd id=\"4099\"><a><duration>5</duration><bogus>1</bogus></a></cmd>\n<cmd/>\n", 2, 2},
+    };
+    for (const Row& row : rows) {
+        const std::string path = configFile(withBase(row.body));
+        EXPECT_EQ(runLint({}, path).status, row.plain) << row.name;
+        EXPECT_EQ(runLint({"--werror"}, path).status, row.werror) << row.name;
+    }
 }
-
-class LintStatusTest : public testing::TestWithParam<StatusRow> {};
-
-TEST_P(LintStatusTest, ExitStatus) {
-    ScratchDir dir;
-    const std::string path = dir.write("c.xml", withBase(GetParam().body));
-    EXPECT_EQ(runLint({}, path).status, GetParam().plain);
-    EXPECT_EQ(runLint({"--werror"}, path).status, GetParam().werror);
-}
-
-INSTANTIATE_TEST_SUITE_P(Rows, LintStatusTest, testing::ValuesIn(kStatusRows),
-                         [](const testing::TestParamInfo<StatusRow>& info) {
-                             return info.param.name;
-                         });
 
 TEST(LintCommandTest, FindingsComeInLineOrder) {
-    ScratchDir dir;
     // The missing start-up command is found last but concerns line 1; the duplicate's note
     // stays with its warning although it names an earlier line.
     const std::string config =
@@ -124,7 +100,7 @@ TEST(LintCommandTest, FindingsComeInLineOrder) {
         "<cmd id=\"4099\"><a><duration>5</duration><bogus>1</bogus></a></cmd>\n"
         "<cmd id=\"4116\"><a><duration>60</duration></a></cmd>\n"
         "</policy>\n";
-    const auto result = runLint({}, dir.write("c.xml", config));
+    const auto result = runLint({}, configFile(config));
     const std::vector<std::string> expected = {
         "F:1: error: no start-up command 5376: the server's init fails (status 2) and the server "
         "never runs",
@@ -137,56 +113,24 @@ TEST(LintCommandTest, FindingsComeInLineOrder) {
 }
 
 // Usage errors: a message on stderr naming the problem, nothing on stdout, status 2.
-struct UsageRow {
-    const char* name;
-    std::vector<std::string> args;  // "DIR" stands for a scratch directory
-    std::string message;            // first line of stderr
-};
-
-const UsageRow kUsageRows[] = {
-    {"NoFile", {}, "velmora-lint: no configuration file given"},
-    {"UnknownOption", {"--fix", "c.xml"}, "velmora-lint: unknown option --fix"},
-    {"MissingFile", {"DIR/none.xml"}, "velmora-lint: DIR/none.xml: No such file or directory"},
-    {"Directory", {"DIR"}, "velmora-lint: DIR: is a directory"},
-    {"BrokenDeviceProfile",
-     {"--device", "DIR/a.xml", "DIR/b.xml"},
-     "velmora-lint: DIR/a.xml:1: the top-level element must be <device>"},
-    {"TwoFiles",
-     {"DIR/a.xml", "DIR/b.xml"},
-     "velmora-lint: more than one configuration given (DIR/a.xml, DIR/b.xml)"},
-};
-
-void PrintTo(const UsageRow& row, std::ostream* os) {
-    *os << row.name;
-}
-
-class LintUsageTest : public testing::TestWithParam<UsageRow> {};
-
-TEST_P(LintUsageTest, FailsWithAMessage) {
-    ScratchDir dir;
-    auto expand = [&](std::string text) {
-        for (size_t at = text.find("DIR"); at != std::string::npos; at = text.find("DIR")) {
-            text.replace(at, 3, dir.path());
-        }
-        return text;
+TEST(LintCommandTest, UsageErrorsFailWithAMessage) {
+    const std::string config = configFile(withBase(""));
+    const std::string dir = config.substr(0, config.rfind('/'));
+    const std::pair<std::vector<std::string>, std::string> rows[] = {
+        {{}, "velmora-lint: no configuration file given"},
+        {{dir + "/none.xml"}, "velmora-lint: " + dir + "/none.xml: No such file or directory"},
+        // A configuration given as the device profile.
+        {{"--device", config, config},
+         "velmora-lint: " + config + ":1: the top-level element must be <device>"},
     };
-    std::vector<std::string> args;
-    for (const auto& arg : GetParam().args) {
-        args.push_back(expand(arg));
+    for (const auto& row : rows) {
+        std::ostringstream out;
+        std::ostringstream err;
+        EXPECT_EQ(LintCommand::run(row.first, out, err), LintCommand::kUsageError) << row.second;
+        EXPECT_EQ(out.str(), "");
+        EXPECT_EQ(err.str().substr(0, err.str().find('\n')), row.second);
     }
-    dir.write("a.xml", withBase(""));
-    dir.write("b.xml", withBase(""));
-    std::ostringstream out;
-    std::ostringstream err;
-    EXPECT_EQ(LintCommand::run(args, out, err), LintCommand::kUsageError);
-    EXPECT_EQ(out.str(), "");
-    EXPECT_EQ(err.str().substr(0, err.str().find('\n')), expand(GetParam().message));
 }
-
-INSTANTIATE_TEST_SUITE_P(Rows, LintUsageTest, testing::ValuesIn(kUsageRows),
-                         [](const testing::TestParamInfo<UsageRow>& info) {
-                             return info.param.name;
-                         });
 
 TEST(LintCommandTest, HelpGoesToStdoutWithStatusZero) {
     std::ostringstream out;

@@ -1,11 +1,8 @@
 #include "tests/lint/LintTestSupport.h"
 
-#include <stdlib.h>
-
-#include <filesystem>
-#include <fstream>
 #include <sstream>
 
+#include "tests/host/HostTestSupport.h"
 #include "tools/lint/LintCommand.h"
 
 namespace velmora {
@@ -13,14 +10,12 @@ namespace linttest {
 
 namespace {
 
-void replaceAll(std::string* text, const std::string& from, const std::string& to) {
-    if (from.empty()) {
-        return;
+std::string replaceAll(std::string text, const std::string& from, const std::string& to) {
+    for (size_t at = text.find(from); at != std::string::npos;
+         at = text.find(from, at + to.size())) {
+        text.replace(at, from.size(), to);
     }
-    for (size_t at = text->find(from); at != std::string::npos;
-         at = text->find(from, at + to.size())) {
-        text->replace(at, from.size(), to);
-    }
+    return text;
 }
 
 }  // namespace
@@ -34,20 +29,9 @@ std::vector<std::string> LintResult::outLines() const {
     return lines;
 }
 
-ScratchDir::ScratchDir() {
-    char pattern[] = "/tmp/velmora-lint-test-XXXXXX";
-    const char* made = mkdtemp(pattern);
-    mPath = made != nullptr ? made : "/tmp";
-}
-
-ScratchDir::~ScratchDir() {
-    std::error_code ignored;
-    std::filesystem::remove_all(mPath, ignored);
-}
-
-std::string ScratchDir::write(const std::string& name, const std::string& text) const {
-    const std::string path = mPath + "/" + name;
-    std::ofstream(path) << text;
+std::string configFile(const std::string& text) {
+    const std::string path = hosttest::makeScratchDir("lint") + "/config.xml";
+    hosttest::writeFile(path, text);
     return path;
 }
 
@@ -67,10 +51,8 @@ LintResult runLint(const std::vector<std::string>& options, const std::string& c
     std::ostringstream err;
     LintResult result;
     result.status = LintCommand::run(args, out, err);
-    result.out = out.str();
-    result.err = err.str();
-    replaceAll(&result.out, configPath, "F");
-    replaceAll(&result.err, configPath, "F");
+    result.out = replaceAll(out.str(), configPath, "F");
+    result.err = replaceAll(err.str(), configPath, "F");
     return result;
 }
 

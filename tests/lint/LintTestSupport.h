@@ -17,21 +17,8 @@ struct LintResult {
     std::vector<std::string> outLines() const;
 };
 
-// A scratch directory removed with everything in it at the end of the test.
-class ScratchDir {
-public:
-    ScratchDir();
-    ~ScratchDir();
-    ScratchDir(const ScratchDir&) = delete;
-    ScratchDir& operator=(const ScratchDir&) = delete;
-
-    // Writes `text` to `name` in the directory; returns its path.
-    std::string write(const std::string& name, const std::string& text) const;
-    const std::string& path() const { return mPath; }
-
-private:
-    std::string mPath;
-};
+// `text` written as config.xml in a new scratch directory; returns its path.
+std::string configFile(const std::string& text);
 
 // The start of a configuration whose start-up and probe commands are fine (lines 1 to 3); the
 // body given to withBase starts on line 4.

@@ -25,8 +25,8 @@ std::string gLogcat;
 // liblog's lines as `adb logcat -v threadtime` prints them, stamped with the replay's clock
 // from 18:00 on.
 void threadtimeLogger(const struct __android_logger_data* data, const char* message) {
-    const int64_t ms = HostEnvironment::get().clock().nowUs() / 1000;
-    const int64_t s = ms / 1000;
+    const long long ms = HostEnvironment::get().clock().nowUs() / 1000;
+    const long long s = ms / 1000;
     std::string text = message != nullptr ? message : "";
     while (!text.empty() && text.back() == '\n')
         text.pop_back();
@@ -34,9 +34,8 @@ void threadtimeLogger(const struct __android_logger_data* data, const char* mess
         data->priority >= 2 && data->priority <= 8 ? "VDIWEFS"[data->priority - 2] : '?';
     char line[1024];
     snprintf(line, sizeof(line), "11-23 %02lld:%02lld:%02lld.%03lld %5d %5d %c %s: %s\n",
-             static_cast<long long>(18 + s / 3600), static_cast<long long>(s / 60 % 60),
-             static_cast<long long>(s % 60), static_cast<long long>(ms % 1000), getpid(), gettid(),
-             priority, data->tag != nullptr ? data->tag : "", text.c_str());
+             18 + s / 3600, s / 60 % 60, s % 60, ms % 1000, getpid(), gettid(), priority,
+             data->tag != nullptr ? data->tag : "", text.c_str());
     std::lock_guard<std::mutex> lock(gLogLock);
     gLogcat += line;
 }
@@ -46,14 +45,8 @@ void quietLogger(const struct __android_logger_data*, const char*) {}
 // Replays `trace` on a fresh device; the node summary, one line per node key.
 std::map<std::string, std::string> replay(const std::string& trace, const std::string& name) {
     const std::string dir = hosttest::makeScratchDir(name);
-    ReplayOptions options;
-    options.tracePath = trace;
-    options.configDirs = {std::string(VELMORA_SOURCE_DIR) + "/examples"};
-    options.fast = true;
-    options.quiet = true;
-    options.deviceRoot = dir + "/device";
-    options.timelinePath = dir + "/timeline.json";
-    options.eventLogPath = dir + "/events.log";
+    ReplayOptions options = hosttest::replayOptions(dir, trace);
+    options.configDirs = {hosttest::examplesDir()};
     FILE* out = fopen((dir + "/stdout.txt").c_str(), "w");
     ReplaySession session(options, out, stderr);
     EXPECT_EQ(ReplaySession::kOk, session.run()) << trace;
@@ -67,9 +60,9 @@ std::map<std::string, std::string> replay(const std::string& trace, const std::s
 
 TEST(LogcatRoundTripTest, ImportedMinuteReplaysLikeTheOriginal) {
     const std::string dir = hosttest::makeScratchDir("roundtrip");
-    const std::string minute = std::string(VELMORA_SOURCE_DIR) + "/examples/minute.trace";
-    hosttest::writeFile(dir + "/original.trace",
-                        "@0 dump --logon\n" + hosttest::readFile(minute) + "\n");
+    hosttest::writeFile(
+        dir + "/original.trace",
+        "@0 dump --logon\n" + hosttest::readFile(hosttest::examplesDir() + "/minute.trace") + "\n");
 
     __android_log_set_minimum_priority(ANDROID_LOG_VERBOSE);
     __android_log_set_logger(threadtimeLogger);

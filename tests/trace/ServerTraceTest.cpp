@@ -5,6 +5,7 @@
 #include <string>
 #include <vector>
 
+#include "tests/fakes/FakeProbeClock.h"
 #include "tests/fakes/RecordingTraceSink.h"
 #include "tests/fakes/ServerTest.h"
 #include "trace/Trace.h"
@@ -16,14 +17,9 @@ namespace {
 using Ints = std::vector<int>;
 using Values = std::vector<int64_t>;
 using Names = std::vector<std::string>;
-using std::chrono::milliseconds;
 
 constexpr int kOn = 0;
 constexpr int kOff = -1;
-// The probe worker's boost delay and lifetime, and how late it may be on a loaded machine.
-constexpr milliseconds kBoostDelay{8};
-constexpr milliseconds kBoostLifetime{256};
-constexpr milliseconds kTolerance{250};
 
 const char* const kTraceCommands =
     "<cmd id=\"4118\" name=\"scene_4118\"><act><duration>0</duration></act></cmd>"
@@ -36,13 +32,15 @@ class ServerTraceTest : public ServerTest {
 protected:
     void SetUp() override {
         ServerTest::SetUp();
+        FakeProbeClock::install();  // the probe worker in virtual time
         Trace::setSink(&mSink);
         ASSERT_EQ(startServer(kTraceCommands), 0);
         mSink.clear();
     }
     void TearDown() override {
-        ServerTest::TearDown();  // stops the probe worker before the sink goes
+        ServerTest::TearDown();  // stops the probe worker before the sink and its clock go
         Trace::setSink(nullptr);
+        FakeProbeClock::uninstall();
     }
 
     RecordingTraceSink mSink;
@@ -77,13 +75,9 @@ INSTANTIATE_TEST_SUITE_P(
         SliceCase{"event",
                   [](VelmoraServer& s) { event(s, 4097, kOn); },
                   {"velmoraEvent cmdId=4097", "<end>"}},
-        SliceCase{"client",
-                  [](VelmoraServer& s) { setConfig(s, 2, {2}, {1200000}); },
-                  {"velmoraSetConfig clientId=2", "<end>"}},
+        // A dump to a bad descriptor is refused, and still traced.
         SliceCase{"dump",
-                  [](VelmoraServer& s) {
-                      s.dumpVelmoraServerInfo(-1, {"--help"});  // refused, still traced
-                  },
+                  [](VelmoraServer& s) { s.dumpVelmoraServerInfo(-1, {"--help"}); },
                   {"dumpVelmoraServerInfo", "<end>"}},
         SliceCase{"reload",
                   [](VelmoraServer& s) { s.velmoraEvent(20230, "", 0, nullptr); },
@@ -96,8 +90,6 @@ INSTANTIATE_TEST_SUITE_P(
 
 struct CounterCase {
     const char* label;
-    Op refusingOp;  // the platform refuses this operation when `refused`
-    bool refused;
     std::function<void(VelmoraServer&)> calls;
     const char* track;
     Values values;
@@ -107,9 +99,6 @@ class CounterTrackTest : public ServerTraceTest,
                          public ::testing::WithParamInterface<CounterCase> {};
 
 TEST_P(CounterTrackTest, TrackFollowsWhatThePlatformAccepted) {
-    if (GetParam().refused) {
-        executor().setResult(GetParam().refusingOp, 1);
-    }
     GetParam().calls(*mServer);
     EXPECT_EQ(mSink.counter(GetParam().track), GetParam().values);
 }
@@ -119,8 +108,6 @@ INSTANTIATE_TEST_SUITE_P(
     ::testing::Values(
         // 4119 outranks 4118: the track shows the applied scene, not the last one switched.
         CounterCase{"scene_switch",
-                    Op::DoAction,
-                    false,
                     [](VelmoraServer& s) {
                         event(s, 4118, kOn);
                         event(s, 4119, kOn);
@@ -130,8 +117,6 @@ INSTANTIATE_TEST_SUITE_P(
                     "velmora.scene",
                     {4118, 4119, 0}},
         CounterCase{"client_restart",
-                    Op::DoAction,
-                    false,
                     [](VelmoraServer& s) {
                         event(s, 4118, kOn);
                         s.velmoraEvent(20224, "", 0, nullptr);
@@ -140,8 +125,6 @@ INSTANTIATE_TEST_SUITE_P(
                     {4118, 0}},
         // The merged cap, lowest of the clients: JN's 1.2 GHz under KX's 1.5, then KX's again.
         CounterCase{"client_cap",
-                    Op::SetConfig,
-                    false,
                     [](VelmoraServer& s) {
                         setConfig(s, 1, {2}, {1500000});
                         setConfig(s, 2, {2}, {1200000});
@@ -150,47 +133,46 @@ INSTANTIATE_TEST_SUITE_P(
                     "velmora.freq.little_cpu_max",
                     {1500000, 1200000, 1500000}},
         CounterCase{"event_cap",
-                    Op::SetConfig,
-                    false,
                     [](VelmoraServer& s) { event(s, 12288, kOn); },
                     "velmora.freq.little_cpu_max",
                     {1500000}},
-        CounterCase{"refused_cap",
-                    Op::SetConfig,
-                    true,
-                    [](VelmoraServer& s) { setConfig(s, 1, {2}, {1500000}); },
-                    "velmora.freq.little_cpu_max",
-                    {}},
         CounterCase{"level_event",
-                    Op::SchedLevel,
-                    false,
                     [](VelmoraServer& s) { s.velmoraEvent(4500, "", 0, nullptr); },
                     "velmora.sched.top_app",
                     {30}},
         // Packed client level: group 3 (top app) in the high half, level -10 + 20 in the low.
         CounterCase{"client_level",
-                    Op::SchedLevel,
-                    false,
                     [](VelmoraServer& s) { setConfig(s, 1, {42}, {(3 << 16) | 10}); },
                     "velmora.sched.top_app",
-                    {-10}},
-        CounterCase{"refused_level",
-                    Op::SchedLevel,
-                    true,
-                    [](VelmoraServer& s) { s.velmoraEvent(4500, "", 0, nullptr); },
-                    "velmora.sched.top_app",
-                    {}}),
+                    {-10}}),
     [](const ::testing::TestParamInfo<CounterCase>& info) { return info.param.label; });
 
+// What the platform refused does not show on the tracks.
+TEST_F(ServerTraceTest, RefusedLimitsAndLevelsLeaveTheTracksAlone) {
+    executor().setResult(Op::SetConfig, 1);
+    executor().setResult(Op::SchedLevel, 1);
+    setConfig(*mServer, 1, {2}, {1500000});
+    mServer->velmoraEvent(4500, "", 0, nullptr);
+    EXPECT_EQ(mSink.counter("velmora.freq.little_cpu_max"), Values{});
+    EXPECT_EQ(mSink.counter("velmora.sched.top_app"), Values{});
+}
+
+// A probed thread is boosted 8 ms after its probe, until withdrawn or 256 ms later.
 TEST_F(ServerTraceTest, ProbeTrackCountsBoostsUntilWithdrawnOrExpired) {
     const auto probe = [this](const char* msg, int state) {
         mServer->velmoraEvent(4116, msg, 1, &state);
     };
+    const auto advance = [](int ms) { FakeProbeClock::last().advance(ms); };
     probe("pid=12|tid=34", kOn);
     probe("pid=12|tid=35", kOn);
-    ASSERT_TRUE(mSink.waitForCounter("velmora.probe.boosted", 2, kBoostDelay + kTolerance));
+    advance(7);
+    EXPECT_EQ(mSink.counter("velmora.probe.boosted"), Values{});
+    advance(1);
+    EXPECT_EQ(mSink.counter("velmora.probe.boosted"), (Values{1, 2}));
     probe("pid=12|tid=35", kOff);
-    ASSERT_TRUE(mSink.waitForCounter("velmora.probe.boosted", 0, kBoostLifetime + kTolerance));
+    advance(255);
+    EXPECT_EQ(mSink.counter("velmora.probe.boosted"), (Values{1, 2, 1}));
+    advance(1);
     EXPECT_EQ(mSink.counter("velmora.probe.boosted"), (Values{1, 2, 1, 0}));
 }
 
