@@ -1,8 +1,8 @@
-// One broken configuration per finding: the exact lines velmora-lint prints and its exit status.
-// Configurations built with withBase() have sound start-up and probe commands on lines 2 and 3,
-// so each row shows only the finding it is about, at the line it names.
+// One broken configuration per finding, read from tests/lint/findings.txt (its head says how a
+// row is written): the exact lines velmora-lint prints and its exit status.
 #include <gtest/gtest.h>
 
+#include <fstream>
 #include <string>
 #include <vector>
 
@@ -16,92 +16,41 @@ using linttest::runLint;
 using linttest::withBase;
 
 struct Row {
-    const char* name;
+    std::string name;
     std::string config;
     std::vector<std::string> expected;  // every line printed, in order
-    int status;
+    int status = -1;
 };
 
-const Row kRows[] = {
-    // --- The document and the command elements, as the loader reads them.
-    {"XmlSyntaxError",
-     "<policy>\n<cmd id=\"4099\">\n</policy>\n",
-     {"F:2: error: not well-formed XML: element <cmd> is not closed (expected </cmd> before the "
-      "enclosing element ends); the server loads nothing from this file"},
-     2},
-    {"NoUsableIdAtAll",
-     "<policy>\n<cmd name=\"a\"/>\n</policy>\n",
-     {"F:1: error: no command has a usable id: the server loads nothing from this file",
-      "F:2: error: command <cmd name=\"a\"> has no \"id\": the loader skips it"},
-     2},
-    {"DuplicateIdFirstWins",
-     withBase("<cmd id=\"4099\" name=\"a\"><a><duration>10</duration></a></cmd>\n"
-              "<cmd id=\"4099\" name=\"b\"><a><duration>20</duration></a></cmd>\n"),
-     {"F:5: warning: duplicate command id 4099: the first definition wins, this one is ignored",
-      "F:4: note: the first definition of command 4099 is here"},
-     0},
-    {"FourthActionIgnored",
-     withBase("<cmd id=\"4099\" name=\"a\">\n<a><duration>10</duration></a>\n"
-              "<a><duration>20</duration></a>\n<a><duration>30</duration></a>\n"
-              "<a><duration>40</duration></a>\n</cmd>\n"),
-     {"F:8: warning: command 4099 has 4 action elements: only the first three are read, this "
-      "one and later ones are ignored"},
-     0},
-    {"ParameterWithoutTextDropsAction",
-     withBase("<cmd id=\"4099\" name=\"a\">\n<a><duration>10</duration>\n<big_min/></a>\n"
-              "<a><duration>20</duration></a>\n</cmd>\n"),
-     {"F:6: error: parameter <big_min> of command 4099 has no text: the loader drops the whole "
-      "action"},
-     2},
-
-    // --- What the host conversion leaves out.
-    {"UnknownParameter",
-     withBase("<cmd id=\"4099\" name=\"a\"><a><duration>10</duration>\n"
-              "<big_mn>1497600</big_mn></a></cmd>\n"),
-     {"F:5: warning: unknown parameter <big_mn> in command 4099: the host conversion leaves it "
-      "out; did you mean <big_min>?"},
-     0},
-
-    // --- Start-up, probe, scheduling-level, on/off and scene commands.
-    {"NoProbeCommand",
-     "<policy>\n<cmd id=\"5376\"><a><duration>0</duration><group_hmp>0</group_hmp></a></cmd>\n"
-     "</policy>\n",
-     {"F:1: error: no probe command 4116: the server's init stops early (status 4), probe events "
-      "fail and configured scene priorities are never read"},
-     2},
-
-    {"SchedLevelForeignTag",
-     withBase("<cmd id=\"4101\"><a><duration>0</duration>\n<big_min>1497600</big_min>"
-              "</a></cmd>\n"),
-     {"F:5: error: duration-0 command 4101 carries <big_min> (tag 4): scheduling-level events "
-      "take only group tags 50..58; every event fails (status 3)"},
-     2},
-    {"OnOffFloorAboveCap",
-     withBase("<cmd id=\"13568\"><a><duration>0</duration><gpu_max>600000000</gpu_max>\n"
-              "<gpu_min>700000000</gpu_min></a></cmd>\n"),
-     {"F:5: error: on/off command 13568: floor <gpu_min> 700000000 is above the cap <gpu_max> "
-      "600000000; switching it on fails (-1)"},
-     2},
-
-    // --- Values the example device takes otherwise or refuses.
-    {"KhzFigureInAnHzNode",
-     withBase("<cmd id=\"4099\"><a><duration>100</duration>\n<gpu_max>600000</gpu_max>"
-              "</a></cmd>\n"),
-     {"F:5: error: <gpu_max> '600000' of command 4099: 600000 is below the lowest frequency "
-      "257000000 Hz of gpu.max, the device refuses the write",
-      "F:5: note: 600000 is about 1000 times below the node's range: a kHz figure? gpu.max takes "
-      "Hz"},
-     2},
-    {"GovernorTheDeviceLacks",
-     withBase("<cmd id=\"4230\"><a><priority>40</priority>\n"
-              "<big_governor>performace</big_governor></a></cmd>\n"),
-     {"F:5: error: <big_governor> 'performace' of command 4230: the device has no governor "
-      "'performace' of cpu.big.governor, the device refuses the write",
-      "F:5: note: did you mean 'performance'? the device offers schedutil, performance, "
-      "powersave"},
-     2},
-
-};
+std::vector<Row> readRows() {
+    std::vector<Row> rows;
+    std::ifstream in(VELMORA_SOURCE_DIR "/tests/lint/findings.txt");
+    bool inConfig = false;
+    for (std::string line; std::getline(in, line);) {
+        if (line.empty() || line[0] == '#') {
+            continue;
+        }
+        if (line.compare(0, 3, "== ") == 0) {
+            const size_t space = line.rfind(' ');
+            rows.push_back({line.substr(3, space - 3), "", {}, std::stoi(line.substr(space))});
+            inConfig = true;
+        } else if (rows.empty()) {
+            ADD_FAILURE() << "findings.txt: a line before the first row: " << line;
+        } else if (inConfig && line == "--") {
+            inConfig = false;
+        } else if (inConfig) {
+            rows.back().config += line + "\n";
+        } else {
+            rows.back().expected.push_back(line);
+        }
+    }
+    for (Row& row : rows) {
+        if (row.config.compare(0, 6, "@base\n") == 0) {
+            row.config = withBase(row.config.substr(6));
+        }
+    }
+    return rows;
+}
 
 void PrintTo(const Row& row, std::ostream* os) {
     *os << row.name;
@@ -117,7 +66,12 @@ TEST_P(LintDiagnosticsTest, PrintsExactlyTheFinding) {
     EXPECT_EQ(result.err, "");
 }
 
-INSTANTIATE_TEST_SUITE_P(Rows, LintDiagnosticsTest, testing::ValuesIn(kRows),
+// A lost or mangled findings file would otherwise just leave the table empty.
+TEST(LintFindingsFile, HoldsEveryRow) {
+    EXPECT_GE(readRows().size(), 38u);
+}
+
+INSTANTIATE_TEST_SUITE_P(Rows, LintDiagnosticsTest, testing::ValuesIn(readRows()),
                          [](const testing::TestParamInfo<Row>& info) { return info.param.name; });
 
 }  // namespace
