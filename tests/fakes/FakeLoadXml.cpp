@@ -5,8 +5,6 @@
 namespace velmora {
 namespace fake {
 
-std::atomic<int> FakeLoadXml::sConversions{0};
-
 namespace {
 
 Action* convertRecord(const RawXmlData& raw) {
@@ -38,7 +36,6 @@ Action* convertRecord(const RawXmlData& raw) {
 }  // namespace
 
 ActionMap* FakeLoadXml::createActionMap(RawXmlDataMap& rawMap) {
-    ++sConversions;
     auto* map = new ActionMap();
     for (const auto& entry : rawMap) {
         const RawXmlData* raw = entry.second;

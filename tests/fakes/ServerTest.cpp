@@ -1,10 +1,9 @@
 #include "tests/fakes/ServerTest.h"
 
 #include <stdlib.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
-#include <cstdio>
+#include <filesystem>
 #include <fstream>
 
 namespace velmora {
@@ -25,15 +24,6 @@ namespace {
 void writeFile(const std::string& path, const std::string& text) {
     std::ofstream out(path, std::ios::trunc);
     out << text;
-}
-
-void mkdirs(const std::string& dir) {
-    std::string partial;
-    for (size_t pos = 0; pos != std::string::npos;) {
-        pos = dir.find('/', pos + 1);
-        partial = dir.substr(0, pos);
-        mkdir(partial.c_str(), 0755);
-    }
 }
 
 }  // namespace
@@ -63,7 +53,7 @@ void ServerTest::writeCustConfig(const std::string& xml) {
 }
 
 void ServerTest::writeCloudConfig(const std::string& incremental, const std::string& xml) {
-    mkdirs(VELMORA_CLOUD_CONFIG_DIR);
+    std::filesystem::create_directories(VELMORA_CLOUD_CONFIG_DIR);
     mCloudPath = std::string(VELMORA_CLOUD_CONFIG_DIR) + "/cloud_cust_velmora_config_" +
                  incremental + ".xml";
     writeFile(mCloudPath, xml);
