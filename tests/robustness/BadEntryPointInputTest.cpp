@@ -71,8 +71,6 @@ TEST_P(BadCallTest, ResultLogAndNothingLost) {
 const std::string kLong(1 << 20, '7');
 const std::string kLongIds = "pid=" + kLong + "|tid=" + kLong;
 const std::string kLongRatio = "pid=1|tid=2|ratio_b=" + kLong + " ratio_l=2";
-const std::vector<int> kNineSchedTags(9, 42);
-const std::vector<int> kNineSchedConfigs(9, 0x10014);
 const char* const kSceneError = "invalid special scene parameters, cmdId is 4118";
 const char* const kOnOffError = "invalid special scene parameters, cmdId is 12288";
 const char* const kMsgError = "velmora: get msg info failed!";
@@ -136,8 +134,9 @@ INSTANTIATE_TEST_SUITE_P(
         CallRow{"EventIdAsClient", setConfig(4096, 1, {2}, {100}), "3", kSetError},
         CallRow{"SchedRequestOfUnknownClient", setConfig(9, 1, {42}, {0x10014}), "-1",
                 "invalid clientId is 9"},
-        CallRow{"SchedRequestTooManyPairs", setConfig(1, 9, kNineSchedTags, kNineSchedConfigs),
-                "-1", kSchedError},
+        CallRow{"SchedRequestTooManyPairs",
+                setConfig(1, 9, std::vector<int>(9, 42), std::vector<int>(9, 0x10014)), "-1",
+                kSchedError},
         CallRow{"SchedLevelOffTheScale", setConfig(1, 1, {42}, {0x10000 | 200}), "-1", kSchedError},
         CallRow{"SchedGroupOutOfRange", setConfig(1, 1, {42}, {static_cast<int>(0xFFFF0014)}), "-1",
                 kSchedError},

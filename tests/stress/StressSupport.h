@@ -13,18 +13,8 @@
 #include <mutex>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
-
-// ThreadSanitizer (a clang build) slows every operation down several times: the counts shrink
-// under it.
-#if defined(__has_feature)
-#if __has_feature(thread_sanitizer)
-#define VELMORA_STRESS_TSAN 1
-#endif
-#endif
-#ifndef VELMORA_STRESS_TSAN
-#define VELMORA_STRESS_TSAN 0
-#endif
 
 namespace velmora {
 namespace fake {
@@ -42,8 +32,9 @@ inline constexpr int kTimedAction = 4098;
 inline constexpr int kColdStart = 4099;
 
 inline constexpr int kMixedThreads = 4;
-inline constexpr int kOpsPerThread = VELMORA_STRESS_TSAN ? 600 : 2000;
-inline constexpr int kSceneSwitches = VELMORA_STRESS_TSAN ? 400 : 1500;
+// Under a sanitizer the deadline below ends the phase before these counts are reached.
+inline constexpr int kOpsPerThread = 2000;
+inline constexpr int kSceneSwitches = 1500;
 inline constexpr int kMaxReloads = 300;
 // Reloads that must have raced with the host threads before the concurrent phase may end.
 inline constexpr int kMinReloads = 12;
@@ -63,9 +54,13 @@ inline const std::map<int, int> kPriorities = {{4118, 100}, {4119, 200}, {4120, 
 inline const std::vector<int> kEvents = {kTimedAction, kColdStart, 12288, 12289,
                                          12290,        4113,       4114,  4115};
 inline const std::vector<int> kFreqTags = {2, 5, 8};
-// Lines of the two table dumps (headings included, plus the reply's closing blank line).
-inline constexpr int kFreqListLines = 3 + 3 * 7 + 1;
-inline constexpr int kEasGroupLines = 5 + 5 * 8 + 1;
+// Dump options and the lines of their replies (the tables' headings included, plus the reply's
+// closing blank line).
+inline const std::vector<std::pair<const char*, int>> kDumps = {{"--freqlist", 3 + 3 * 7 + 1},
+                                                                {"--easgrouplist", 5 + 5 * 8 + 1},
+                                                                {"--help", 6},
+                                                                {"--logon", 2},
+                                                                {"--logoff", 2}};
 
 inline int lineCount(const std::string& text) {
     return static_cast<int>(std::count(text.begin(), text.end(), '\n'));
