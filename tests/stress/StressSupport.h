@@ -51,8 +51,8 @@ inline const std::vector<int> kGovScenes = {4230, 4240, 4260};
 // Built-ins 4118 (100), 4119 (200), 4120 (20), 4121 (70); configured ones below.
 inline const std::map<int, int> kPriorities = {{4118, 100}, {4119, 200}, {4120, 20}, {4121, 70},
                                                {4122, 150}, {4230, 50},  {4240, 50}, {4260, 300}};
-inline const std::vector<int> kEvents = {kTimedAction, kColdStart, 12288, 12289,
-                                         12290,        4113,       4114,  4115};
+inline const std::vector<int> kEvents = {kTimedAction, kColdStart, 12288, 12289, 12290,
+                                         4113,         4114,       4115,  20480, 20481};
 inline const std::vector<int> kFreqTags = {2, 5, 8};
 // Dump options and the lines of their replies (the tables' headings included, plus the reply's
 // closing blank line).
