@@ -29,8 +29,8 @@ public:
     bool failGetPlat = false;
     bool failLoader = false;
     int initializeResult = 0;
-    std::string incremental;     // value of ro.build.version.incremental; empty: missing
-    std::string custConfigPath;  // answer of get_one_cfg_file; empty: no file
+    std::string incremental;      // value of ro.build.version.incremental; empty: missing
+    std::string custConfigPath;   // answer of get_one_cfg_file; empty: no file
 
     void setPolicy(const std::string& name, int duration);
     int policy(const char* name);

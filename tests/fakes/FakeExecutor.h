@@ -22,13 +22,13 @@ struct ExecutorCall {
     int id = 0;  // doAction: the action's cmdId; doPerfSetConfig: the client or command id
     int duration = 0;
     std::string name;
-    std::vector<int> tagValues;       // doAction: the action's integer pairs, flat
-    std::vector<std::string> params;  // doAction: the action's string pairs, flat
-    std::vector<int> payload;         // doAction
-    std::vector<int> tags;            // set/get config; sched level: groups
-    std::vector<int> values;          // set config values; sched level: levels
-    unsigned int tid = 0;             // setProbeTid
-    int state = 0;                    // setProbeTid
+    std::vector<int> tagValues;        // doAction: the action's integer pairs, flat
+    std::vector<std::string> params;   // doAction: the action's string pairs, flat
+    std::vector<int> payload;          // doAction
+    std::vector<int> tags;             // set/get config; sched level: groups
+    std::vector<int> values;           // set config values; sched level: levels
+    unsigned int tid = 0;              // setProbeTid
+    int state = 0;                     // setProbeTid
     std::chrono::steady_clock::time_point when;
 };
 
