@@ -21,13 +21,11 @@ FakeEnv& FakeEnv::get() {
 void FakeEnv::reset() {
     failGetPlat = false;
     failLoader = false;
-    installExecutor = true;
     initializeResult = 0;
     incremental.clear();
     custConfigPath.clear();
     executor.reset();
     lastPlat = nullptr;
-    platformsCreated = 0;
     platformsDeleted = 0;
     initializeCalls = 0;
     std::lock_guard<std::mutex> lock(mLock);
@@ -99,11 +97,8 @@ VelmoraPlat* getPlat() {
         return nullptr;
     }
     auto* plat = new velmora::fake::FakePlatform();
-    if (env.installExecutor) {
-        plat->mExecutorPtr = &env.executor;
-    }
+    plat->mExecutorPtr = &env.executor;
     env.lastPlat = plat;
-    ++env.platformsCreated;
     return plat;
 }
 

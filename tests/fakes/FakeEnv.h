@@ -28,7 +28,6 @@ public:
     // Script.
     bool failGetPlat = false;
     bool failLoader = false;
-    bool installExecutor = true;  // new platforms get &executor as mExecutorPtr
     int initializeResult = 0;
     std::string incremental;      // value of ro.build.version.incremental; empty: missing
     std::string custConfigPath;   // answer of get_one_cfg_file; empty: no file
@@ -38,9 +37,8 @@ public:
     int policyQueries() const;
 
     // Observations.
-    FakeExecutor executor;  // outlives the platforms that point at it
+    FakeExecutor executor;  // every new platform's mExecutorPtr; outlives the platforms
     FakePlatform* lastPlat = nullptr;
-    int platformsCreated = 0;
     int platformsDeleted = 0;
     int initializeCalls = 0;
 

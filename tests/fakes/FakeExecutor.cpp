@@ -1,5 +1,8 @@
 #include "tests/fakes/FakeExecutor.h"
 
+#include <algorithm>
+#include <iterator>
+
 #include "config/Action.h"
 
 namespace velmora {
@@ -38,9 +41,7 @@ int FakeExecutor::doAction(const Action* action, unsigned int payloadNum, const 
     return record(std::move(call));
 }
 
-int FakeExecutor::doPerfSetConfig(int id, int count, const int* tags, const int* values) {
-    ExecutorCall call(Op::SetConfig);
-    call.id = id;
+int FakeExecutor::recordArrays(ExecutorCall call, int count, const int* tags, const int* values) {
     if (count > 0) {
         call.tags.assign(tags, tags + count);
         call.values.assign(values, values + count);
@@ -48,8 +49,13 @@ int FakeExecutor::doPerfSetConfig(int id, int count, const int* tags, const int*
     return record(std::move(call));
 }
 
+int FakeExecutor::doPerfSetConfig(int id, int count, const int* tags, const int* values) {
+    ExecutorCall call(Op::SetConfig);
+    call.id = id;
+    return recordArrays(std::move(call), count, tags, values);
+}
+
 int FakeExecutor::doPerfGetConfig(int count, const int* tags, int* values) {
-    ExecutorCall call(Op::GetConfig);
     {
         std::lock_guard<std::mutex> lock(mLock);
         for (int i = 0; i < count; ++i) {
@@ -59,20 +65,11 @@ int FakeExecutor::doPerfGetConfig(int count, const int* tags, int* values) {
             }
         }
     }
-    if (count > 0) {
-        call.tags.assign(tags, tags + count);
-        call.values.assign(values, values + count);
-    }
-    return record(std::move(call));
+    return recordArrays(ExecutorCall(Op::GetConfig), count, tags, values);
 }
 
 int FakeExecutor::doSchedLevelAction(int count, const int* groups, const int* levels) {
-    ExecutorCall call(Op::SchedLevel);
-    if (count > 0) {
-        call.tags.assign(groups, groups + count);
-        call.values.assign(levels, levels + count);
-    }
-    return record(std::move(call));
+    return recordArrays(ExecutorCall(Op::SchedLevel), count, groups, levels);
 }
 
 int FakeExecutor::setProbeTid(unsigned int tid, int state) {
@@ -105,11 +102,8 @@ std::vector<ExecutorCall> FakeExecutor::calls() const {
 std::vector<ExecutorCall> FakeExecutor::calls(Op op) const {
     std::lock_guard<std::mutex> lock(mLock);
     std::vector<ExecutorCall> out;
-    for (const auto& call : mCalls) {
-        if (call.op == op) {
-            out.push_back(call);
-        }
-    }
+    std::copy_if(mCalls.begin(), mCalls.end(), std::back_inserter(out),
+                 [op](const ExecutorCall& call) { return call.op == op; });
     return out;
 }
 

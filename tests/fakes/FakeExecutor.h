@@ -56,6 +56,8 @@ public:
 
 private:
     int record(ExecutorCall call);
+    // Records `call` with the first `count` entries of both arrays as its tags and values.
+    int recordArrays(ExecutorCall call, int count, const int* tags, const int* values);
 
     mutable std::mutex mLock;  // guards everything below
     mutable std::condition_variable mCond;

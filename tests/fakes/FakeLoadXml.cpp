@@ -5,8 +5,6 @@
 namespace velmora {
 namespace fake {
 
-std::atomic<int> FakeLoadXml::sConversions{0};
-
 namespace {
 
 Action* convertRecord(const RawXmlData& raw) {
@@ -14,8 +12,6 @@ Action* convertRecord(const RawXmlData& raw) {
     action->mCmdId = raw.cmdId;
     action->mName = raw.name;
     action->mDuration = 0;
-    int intPairs = 0;
-    int stringPairs = 0;
     for (size_t i = 0; i < raw.names.size(); ++i) {
         const std::string& name = raw.names[i];
         const std::string& value = raw.values[i];
@@ -24,21 +20,20 @@ Action* convertRecord(const RawXmlData& raw) {
         } else if (name.size() > 2 && name.compare(0, 2, "s_") == 0) {
             action->mParams.push_back(name.substr(2));
             action->mParams.push_back(value);
-            ++stringPairs;
         } else if (name.size() > 1 && name[0] == 't') {
             action->mTagValues.push_back(atoi(name.c_str() + 1));
             action->mTagValues.push_back(atoi(value.c_str()));
-            ++intPairs;
         }
     }
-    action->mParamNum = stringPairs > 0 ? stringPairs : intPairs;
+    const size_t pairs =
+        action->mParams.empty() ? action->mTagValues.size() : action->mParams.size();
+    action->mParamNum = static_cast<int>(pairs / 2);
     return action;
 }
 
 }  // namespace
 
 ActionMap* FakeLoadXml::createActionMap(RawXmlDataMap& rawMap) {
-    ++sConversions;
     auto* map = new ActionMap();
     for (const auto& entry : rawMap) {
         const RawXmlData* raw = entry.second;

@@ -3,10 +3,7 @@
 //   <tN>V</tN>               integer pair (N, V), e.g. <t51>10</t51>
 //   <s_KEY>V</s_KEY>         string pair (KEY, V), e.g. <s_priority>40</s_priority>
 // A record may use integer or string pairs; mParamNum counts the pairs of the kind it uses.
-// Also counts conversions so tests can see whether a load reached this step.
 #pragma once
-
-#include <atomic>
 
 #include "config/VelmoraLoadXml.h"
 
@@ -16,8 +13,6 @@ namespace fake {
 class FakeLoadXml : public VelmoraLoadXml {
 public:
     ActionMap* createActionMap(RawXmlDataMap& rawMap) override;
-
-    static std::atomic<int> sConversions;
 };
 
 }  // namespace fake

@@ -2,6 +2,7 @@
 
 #include <android/log.h>
 
+#include <algorithm>
 #include <mutex>
 
 namespace velmora {
@@ -14,8 +15,7 @@ std::vector<LogLine> gLines;
 
 void captureLogger(const struct __android_logger_data* data, const char* message) {
     std::lock_guard<std::mutex> lock(gLock);
-    gLines.push_back({data->priority, data->tag != nullptr ? data->tag : "",
-                      message != nullptr ? message : ""});
+    gLines.push_back({data->priority, message != nullptr ? message : ""});
 }
 
 }  // namespace
@@ -38,20 +38,16 @@ std::vector<LogLine> LogCapture::lines() {
 
 int LogCapture::count(int prio, const std::string& msg) {
     std::lock_guard<std::mutex> lock(gLock);
-    int n = 0;
-    for (const auto& line : gLines) {
-        n += line.prio == prio && line.msg == msg ? 1 : 0;
-    }
-    return n;
+    return static_cast<int>(std::count_if(gLines.begin(), gLines.end(), [&](const LogLine& line) {
+        return line.prio == prio && line.msg == msg;
+    }));
 }
 
 int LogCapture::countContaining(const std::string& part) {
     std::lock_guard<std::mutex> lock(gLock);
-    int n = 0;
-    for (const auto& line : gLines) {
-        n += line.msg.find(part) != std::string::npos ? 1 : 0;
-    }
-    return n;
+    return static_cast<int>(std::count_if(gLines.begin(), gLines.end(), [&](const LogLine& line) {
+        return line.msg.find(part) != std::string::npos;
+    }));
 }
 
 }  // namespace fake

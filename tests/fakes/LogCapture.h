@@ -11,7 +11,6 @@ namespace fake {
 
 struct LogLine {
     int prio;
-    std::string tag;
     std::string msg;
 };
 

@@ -1,10 +1,9 @@
 #include "tests/fakes/ServerTest.h"
 
 #include <stdlib.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
-#include <cstdio>
+#include <filesystem>
 #include <fstream>
 
 namespace velmora {
@@ -20,24 +19,6 @@ std::string policyXml(const std::string& commands) {
     return "<?xml version=\"1.0\" encoding=\"utf-8\"?>\n<policy>" + commands + "</policy>\n";
 }
 
-namespace {
-
-void writeFile(const std::string& path, const std::string& text) {
-    std::ofstream out(path, std::ios::trunc);
-    out << text;
-}
-
-void mkdirs(const std::string& dir) {
-    std::string partial;
-    for (size_t pos = 0; pos != std::string::npos;) {
-        pos = dir.find('/', pos + 1);
-        partial = dir.substr(0, pos);
-        mkdir(partial.c_str(), 0755);
-    }
-}
-
-}  // namespace
-
 void ServerTest::SetUp() {
     FakeEnv::get().reset();
     LogCapture::start();
@@ -51,22 +32,22 @@ void ServerTest::TearDown() {
     if (!mCloudPath.empty()) {
         unlink(mCloudPath.c_str());
     }
-    unlink((mTmpDir + "/velmora_config_cust.xml").c_str());
-    rmdir(mTmpDir.c_str());
+    std::error_code ignored;  // a scratch directory SetUp could not make
+    std::filesystem::remove_all(mTmpDir, ignored);
     FakeEnv::get().reset();
 }
 
 void ServerTest::writeCustConfig(const std::string& xml) {
     const std::string path = mTmpDir + "/velmora_config_cust.xml";
-    writeFile(path, xml);
+    std::ofstream(path, std::ios::trunc) << xml;
     env().custConfigPath = path;
 }
 
 void ServerTest::writeCloudConfig(const std::string& incremental, const std::string& xml) {
-    mkdirs(VELMORA_CLOUD_CONFIG_DIR);
+    std::filesystem::create_directories(VELMORA_CLOUD_CONFIG_DIR);
     mCloudPath = std::string(VELMORA_CLOUD_CONFIG_DIR) + "/cloud_cust_velmora_config_" +
                  incremental + ".xml";
-    writeFile(mCloudPath, xml);
+    std::ofstream(mCloudPath, std::ios::trunc) << xml;
     env().incremental = incremental;
 }
 

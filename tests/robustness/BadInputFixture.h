@@ -16,7 +16,6 @@ inline constexpr int kOn = 0;
 inline constexpr int kScene = 4118;
 inline constexpr int kTimed = 4098;
 inline constexpr int kKxCap = 1200000;
-inline constexpr int kNoLog = -1;  // prio of a row that logs nothing
 
 inline const char* const kCommands =
     "<cmd id=\"4098\" name=\"winswitch\"><act><duration>500</duration><t1>1000000</t1></act></cmd>"
@@ -28,6 +27,10 @@ inline const char* const kCommands =
 inline const std::string kKxCapLine = "KX set freq is:\ntag=little cpu max,        value=1200000\n";
 
 class BadInputTest : public ServerTest {
+public:
+    using ServerTest::dumpArgs;
+    VelmoraServer& server() { return *mServer; }
+
 protected:
     void SetUp() override {
         ServerTest::SetUp();
@@ -56,10 +59,10 @@ protected:
         EXPECT_EQ(calls[0].tagValues, (std::vector<int>{1, 1000000}));
     }
 
-    void expectLog(int prio, const std::string& log) {
-        if (prio == kNoLog) {
-            EXPECT_TRUE(LogCapture::lines().empty()) << "first line: "
-                                                     << LogCapture::lines()[0].msg;
+    // Exactly one line `log` at `prio` was logged; an empty `log`: nothing was logged.
+    void expectLog(const std::string& log, int prio) {
+        if (log.empty()) {
+            EXPECT_TRUE(LogCapture::lines().empty()) << LogCapture::lines()[0].msg;
         } else {
             EXPECT_EQ(LogCapture::count(prio, log), 1) << "missing log line: " << log;
         }
