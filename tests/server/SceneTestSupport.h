@@ -1,6 +1,6 @@
-// Fixture of the special-scene tests: the scene commands of the configuration, the platform's
-// view of scene switches as apply/withdraw steps, and the server's scene state read under its
-// mutex.
+// Fixture of the server tests that drive velmoraEvent and velmoraSetConfig: start-up on extra
+// commands, the on/off words, the scene commands of the configuration, the platform's view of
+// scene switches as apply/withdraw steps, and the server's scene state read under its mutex.
 #pragma once
 
 #include <map>
@@ -77,6 +77,11 @@ protected:
     int on(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOn); }
     int off(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOff); }
     int restart() { return mServer->velmoraEvent(kClientRestart, "", 0, nullptr); }
+    int setConfig(int clientId, const std::vector<int>& tags, const std::vector<int>& configs) {
+        return mServer->velmoraSetConfig(clientId, static_cast<int>(tags.size()), tags.data(),
+                                         configs.data());
+    }
+    std::vector<ExecutorCall> actions() { return executor().calls(Op::DoAction); }
     // Replaces the configuration with the start-up commands and `extra`, then reloads it.
     int reload(const std::string& extra) {
         writeCustConfig(policyXml(std::string(kStartupCommands) + extra));

@@ -5,8 +5,8 @@
 #include <string>
 #include <vector>
 
-#include "tests/fakes/ServerTest.h"
 #include "tests/sched/SchedTestHelpers.h"
+#include "tests/server/SceneTestSupport.h"
 
 namespace velmora {
 namespace fake {
@@ -31,16 +31,8 @@ std::string startupWith(const std::string& defaultPairs) {
            "</act></cmd>" + kProbeCommand;
 }
 
-class ServerSchedTest : public ServerTest {
+class ServerSchedTest : public ServerSceneTest {
 protected:
-    int set(int clientId, const std::vector<int>& tags, const std::vector<int>& configs) {
-        return mServer->velmoraSetConfig(clientId, static_cast<int>(tags.size()), tags.data(),
-                                         configs.data());
-    }
-
-    // What the server writes for "--easgrouplist".
-    std::string easDumpText() { return dump("--easgrouplist"); }
-
     std::vector<ExecutorCall> sent() { return executor().calls(Op::SchedLevel); }
 };
 
@@ -58,7 +50,8 @@ TEST_F(ServerSchedTest, EasDefaultsAreInstalledAtStartUpWithoutPlatformCall) {
     ASSERT_EQ(mServer->init(), 0);
     EXPECT_TRUE(sent().empty());
     const auto defaults = easLevels(0, {{56, 6}, {57, 7}});
-    EXPECT_EQ(easDumpText(), easDump(defaults, defaults, defaults, defaults, defaults) + "\n");
+    EXPECT_EQ(dump("--easgrouplist"),
+              easDump(defaults, defaults, defaults, defaults, defaults) + "\n");
 }
 
 TEST_F(ServerSchedTest, HmpDefaultDrivesTheSingleGroup) {
@@ -74,12 +67,12 @@ TEST_F(ServerSchedTest, HmpDefaultDrivesTheSingleGroup) {
     EXPECT_EQ(sent()[0].tags, std::vector<int>({50}));
     EXPECT_EQ(sent()[0].values, std::vector<int>({30}));
 
-    EXPECT_EQ(set(2, {42}, {packLevel(0, -20)}), 0);
+    EXPECT_EQ(setConfig(2, {42}, {packLevel(0, -20)}), 0);
     ASSERT_EQ(sent().size(), 2u);
     EXPECT_EQ(sent()[1].tags, std::vector<int>({50}));
     EXPECT_EQ(sent()[1].values, std::vector<int>({-20}));
 
-    EXPECT_EQ(easDumpText(),
+    EXPECT_EQ(dump("--easgrouplist"),
               "default eas group value is:\n"
               "group=hmp,               value=10\n"
               "current eas group value is:\n"
@@ -147,7 +140,8 @@ TEST_F(ServerSchedTest, EventReachesThePlatformOnlyWhenItChangesALevel) {
     EXPECT_EQ(mServer->velmoraEvent(4500, "", 0, nullptr), 0);
     EXPECT_EQ(sent().size(), 1u);
     const auto zola = easLevels(-100, {{53, 30}});
-    EXPECT_EQ(easDumpText(), easDump(easLevels(0), zola, easLevels(0), easLevels(0), zola) + "\n");
+    EXPECT_EQ(dump("--easgrouplist"),
+              easDump(easLevels(0), zola, easLevels(0), easLevels(0), zola) + "\n");
 }
 
 TEST_F(ServerSchedTest, FollowerMovesOnlyGroupsStillAtTheReference) {
@@ -172,20 +166,20 @@ TEST_F(ServerSchedTest, RejectedOrFailedActionLeavesTheTables) {
 
     // A refused event is an action failure too; a refused client request hands the platform's
     // own result back. Neither leaves a trace in the tables.
-    const std::string before = easDumpText();
+    const std::string before = dump("--easgrouplist");
     executor().setResult(Op::SchedLevel, 9);
     EXPECT_EQ(mServer->velmoraEvent(4500, "", 0, nullptr), 3);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4500"));
-    EXPECT_EQ(set(2, {42}, {packLevel(3, -10)}), 9);
+    EXPECT_EQ(setConfig(2, {42}, {packLevel(3, -10)}), 9);
     EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, "doSchedLevelAction failed!"), 4);
-    EXPECT_EQ(easDumpText(), before);
+    EXPECT_EQ(dump("--easgrouplist"), before);
 }
 
 TEST_F(ServerSchedTest, ClientRequestsMergeAcrossClients) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
-    EXPECT_EQ(set(1, {42, 42}, {packLevel(3, -10), packLevel(5, 20)}), 0);
-    EXPECT_EQ(set(2, {42}, {packLevel(3, -20)}), 0);
-    EXPECT_EQ(set(3, {42}, {packLevel(5, 30)}), 0);
+    EXPECT_EQ(setConfig(1, {42, 42}, {packLevel(3, -10), packLevel(5, 20)}), 0);
+    EXPECT_EQ(setConfig(2, {42}, {packLevel(3, -20)}), 0);
+    EXPECT_EQ(setConfig(3, {42}, {packLevel(5, 30)}), 0);
     ASSERT_EQ(sent().size(), 3u);
     // Top-app: the lowest client wins. Foreground: KX above the default has no say, ZOLA does.
     EXPECT_EQ(sent()[2].values, std::vector<int>({0, 0, -20, 0, 30, 0, 0, 0}));
@@ -193,23 +187,23 @@ TEST_F(ServerSchedTest, ClientRequestsMergeAcrossClients) {
                                 "setConfig clientId=1, tagLen=2, tags[1]=42, configs[1]=" +
                                     std::to_string(packLevel(5, 20))));
 
-    EXPECT_EQ(easDumpText(), easDump(easLevels(0), easLevels(0, {{53, -20}, {55, 30}}),
-                                     easLevels(0, {{53, -10}, {55, 20}}), easLevels(0, {{53, -20}}),
-                                     easLevels(0, {{55, 30}})) +
-                                 "\n");
+    EXPECT_EQ(dump("--easgrouplist"), easDump(easLevels(0), easLevels(0, {{53, -20}, {55, 30}}),
+                                              easLevels(0, {{53, -10}, {55, 20}}),
+                                              easLevels(0, {{53, -20}}), easLevels(0, {{55, 30}})) +
+                                          "\n");
 }
 
 TEST_F(ServerSchedTest, StepAndResetOfAClient) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
-    ASSERT_EQ(set(1, {42}, {packLevel(3, 10)}), 0);
+    ASSERT_EQ(setConfig(1, {42}, {packLevel(3, 10)}), 0);
     // Down: top-app 10 -> 0 (no longer below the default), the others 0 -> -10.
-    EXPECT_EQ(set(1, {40}, {1}), 0);
+    EXPECT_EQ(setConfig(1, {40}, {1}), 0);
     EXPECT_EQ(sent().back().values, std::vector<int>({-10, -10, 0, -10, -10, -10, -10, -10}));
-    EXPECT_EQ(set(1, {40}, {1}), 0);
+    EXPECT_EQ(setConfig(1, {40}, {1}), 0);
     EXPECT_EQ(sent().back().values, std::vector<int>({-20, -20, -10, -20, -20, -20, -20, -20}));
-    EXPECT_EQ(set(1, {40}, {2}), 0);
+    EXPECT_EQ(setConfig(1, {40}, {2}), 0);
     EXPECT_EQ(sent().back().values, std::vector<int>({-10, -10, 0, -10, -10, -10, -10, -10}));
-    EXPECT_EQ(set(1, {40}, {0}), 0);
+    EXPECT_EQ(setConfig(1, {40}, {0}), 0);
     EXPECT_EQ(sent().back().values, std::vector<int>(8, 0));
     EXPECT_EQ(sent().size(), 5u);
 }
@@ -217,7 +211,7 @@ TEST_F(ServerSchedTest, StepAndResetOfAClient) {
 TEST_F(ServerSchedTest, RejectedRequestIsPassedOnWithItsOwnLog) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
     // A frequency tag next to tag 42 sends the whole request to the scheduling manager.
-    EXPECT_EQ(set(1, {22, 42}, {1000, packLevel(3, -10)}), -1);
+    EXPECT_EQ(setConfig(1, {22, 42}, {1000, packLevel(3, -10)}), -1);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_DEBUG,
                                 "do not use VELMORA_TAG_SET_SCHED_LEVEL with other tags(22), "
                                 "clientId is 1"));
