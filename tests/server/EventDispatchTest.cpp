@@ -129,10 +129,10 @@ TEST_P(LaunchPolicyTest, DecidesTheDuration) {
     const int enable = 0x40000;
     const int clear = 0;
     if (row.notify != Notify::None) {
-        mServer->velmoraEvent(20225, "", 1, &enable);
+        mServer->velmoraEvent(kNotification, "", 1, &enable);
     }
     if (row.notify == Notify::EnableThenClear) {
-        mServer->velmoraEvent(20225, "", 1, &clear);  // bit 18 cleared again
+        mServer->velmoraEvent(kNotification, "", 1, &clear);  // bit 18 cleared again
     }
     if (row.policy != kNoPolicy) {
         env().setPolicy(row.policyName, row.policy);
@@ -168,10 +168,10 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST_F(EventDispatchTest, NotificationWithWrongPayloadChangesNothing) {
     const int words[2] = {0x40000, 0};
-    EXPECT_EQ(mServer->velmoraEvent(20225, "", 2, words), 0);
-    EXPECT_EQ(mServer->velmoraEvent(20225, "", 1, nullptr), 0);
+    EXPECT_EQ(mServer->velmoraEvent(kNotification, "", 2, words), 0);
+    EXPECT_EQ(mServer->velmoraEvent(kNotification, "", 1, nullptr), 0);
     EXPECT_FALSE(mServer->mPolicyEnabled);
-    EXPECT_EQ(mServer->velmoraEvent(20225, "", 1, words), 0);
+    EXPECT_EQ(mServer->velmoraEvent(kNotification, "", 1, words), 0);
     EXPECT_TRUE(mServer->mPolicyEnabled);
 }
 

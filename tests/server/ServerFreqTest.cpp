@@ -27,7 +27,7 @@ protected:
         start(kFreqCommands);
     }
 
-    int notify(int word) { return mServer->velmoraEvent(20225, "", 1, &word); }
+    int notify(int word) { return mServer->velmoraEvent(kNotification, "", 1, &word); }
 
     // (id, tags, values) of the last set-config call that reached the platform.
     ExecutorCall lastSet() {
@@ -133,20 +133,9 @@ TEST_F(ServerFreqTest, QueriesGoStraightToThePlatform) {
 TEST_F(ServerFreqTest, FreqListDumpShowsEachClientsRawRequest) {
     ASSERT_EQ(setConfig(2, {2}, {1200000}), 0);
     ASSERT_EQ(setConfig(1, {2, 20}, {1800000, 1}), 0);
-    const std::string rest =
-        "tag=big cpu max,           value=-1\n"
-        "tag=gpu max,               value=-1\n"
-        "tag=ipa switch temp,       value=-1\n"
-        "tag=ipa control temp,      value=-1\n"
-        "tag=ipa sustainable power, value=-1\n";
-    EXPECT_EQ(dump("--freqlist"),
-              "KX set freq is:\ntag=little cpu max,        value=1800000\n" + rest +
-                  "tag=fork on big cluster,   value=1\n"
-                  "JN set freq is:\ntag=little cpu max,        value=1200000\n" +
-                  rest +
-                  "tag=fork on big cluster,   value=-1\n"
-                  "ZOLA set freq is:\ntag=little cpu max,        value=-1\n" +
-                  rest + "tag=fork on big cluster,   value=-1\n\n");
+    EXPECT_EQ(dump("--freqlist"), freqBlock("KX", {{2, 1800000}, {20, 1}}) +
+                                      freqBlock("JN", {{2, 1200000}}) + freqBlock("ZOLA", {}) +
+                                      "\n");
 }
 
 }  // namespace

@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "probe/ProbeHandler.h"
-#include "tests/fakes/ServerTest.h"
+#include "tests/server/SceneTestSupport.h"
 
 namespace velmora {
 namespace fake {
@@ -14,8 +14,6 @@ namespace {
 using Clock = std::chrono::steady_clock;
 using std::chrono::milliseconds;
 
-constexpr int kProbe = 4116;
-constexpr int kReload = 20230;
 constexpr milliseconds kBoostDelay{8};
 // Only bounds how long a broken worker is waited for.
 constexpr milliseconds kTolerance{10000};

@@ -1,6 +1,5 @@
 // Pieces of the stress test: the configuration under load, the operation mix's constants, the
-// watchdog that names a hanging thread, the model of what each client asked for last and the
-// expected "--freqlist" block.
+// watchdog that names a hanging thread and the model of what each client asked for last.
 #pragma once
 
 #include <unistd.h>
@@ -16,18 +15,14 @@
 #include <utility>
 #include <vector>
 
+#include "tests/server/SceneTestSupport.h"
+
 namespace velmora {
 namespace fake {
 
 using Clock = std::chrono::steady_clock;
 using std::chrono::milliseconds;
 
-inline constexpr int kOn = 0;
-inline constexpr int kOff = -1;
-inline constexpr int kProbe = 4116;
-inline constexpr int kReload = 20230;
-inline constexpr int kNotification = 20225;
-inline constexpr int kClientRestart = 20224;
 inline constexpr int kTimedAction = 4098;
 inline constexpr int kColdStart = 4099;
 
@@ -147,21 +142,6 @@ struct ClientModel {
     std::map<int, int> freq;   // tag -> last accepted value (-1 never set)
     std::map<int, int> sched;  // group tag -> last accepted level (absent: the default 0)
 };
-
-// Expected "--freqlist" block of one client that only ever sent tags 2, 5 and 8.
-inline std::string freqBlock(const char* name, const std::map<int, int>& freq) {
-    auto value = [&](int tag) {
-        auto it = freq.find(tag);
-        return std::to_string(it == freq.end() ? -1 : it->second);
-    };
-    return std::string(name) + " set freq is:\n" + "tag=little cpu max,        value=" + value(2) +
-           "\n" + "tag=big cpu max,           value=" + value(5) + "\n" +
-           "tag=gpu max,               value=" + value(8) + "\n" +
-           "tag=ipa switch temp,       value=-1\n"
-           "tag=ipa control temp,      value=-1\n"
-           "tag=ipa sustainable power, value=-1\n"
-           "tag=fork on big cluster,   value=-1\n";
-}
 
 }  // namespace fake
 }  // namespace velmora
