@@ -214,15 +214,12 @@ TEST_F(EventDispatchTest, OnOffUsesTheExecutorInstalledDuringTheFrequencyCall) {
     EXPECT_EQ(actions()[0].id, 12302);
 }
 
-class OnOffLimitTest : public ServerTest {};
-
-TEST_F(OnOffLimitTest, MoreFrequencyPairsThanTheManagerTakesAreRefused) {
+TEST_F(ServerSceneTest, OnOffWithMoreFrequencyPairsThanTheManagerTakesIsRefused) {
     std::string pairs;
     for (int i = 0; i < 44; ++i) {
         pairs += "<t2>" + std::to_string(1000000 + i) + "</t2>";
     }
-    ASSERT_EQ(startServer("<cmd id=\"12400\"><a><duration>0</duration>" + pairs + "</a></cmd>"), 0);
-    executor().clear();
+    start("<cmd id=\"12400\"><a><duration>0</duration>" + pairs + "</a></cmd>");
     EXPECT_EQ(mServer->velmoraEvent(12400, "", 1, &kOn), -1);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
                                 "on/off command 12400 has more than 43 frequency pairs, rejected"));

@@ -78,14 +78,9 @@ inline std::string commands(int variant) {
            cmd(12289, "big_cap_platform", "<duration>0</duration><t10>1</t10><t5>1900000</t5>") +
            cmd(12290, "little_floor", "<duration>0</duration><t1>800000</t1>") +
            cmd(20481, "memlat", "<duration>0</duration><t30>1</t30>") +
-           cmd(4118, "scene_4118", "<duration>0</duration><t1>1500</t1>") +
-           cmd(4119, "scene_4119", "<duration>0</duration><t2>2000</t2>") +
-           cmd(4120, "scene_4120", "<duration>0</duration><t1>1</t1>") +
-           cmd(4121, "scene_4121", "<duration>0</duration><t1>2</t1>") +
-           cmd(4122, "scene_4122", "<duration>0</duration><t101>150</t101>") +
-           cmd(4230, "gov_4230", "<duration>0</duration><s_priority>50</s_priority>") +
-           cmd(4240, "gov_4240", "<duration>0</duration><s_priority>50</s_priority>") +
-           cmd(4260, "gov_4260", "<duration>0</duration><s_priority>300</s_priority>");
+           scene(4118, "<t1>1500</t1>") + scene(4119, "<t2>2000</t2>") + scene(4120, "<t1>1</t1>") +
+           scene(4121, "<t1>2</t1>") + scene(4122, "<t101>150</t101>") + govScene(4230, 50) +
+           govScene(4240, 50) + govScene(4260, 300);
 }
 
 // Per-thread progress for the watchdog: an operation counter and the operation in flight.
