@@ -171,15 +171,6 @@ TEST_F(VelmoraLoadXmlTest, AtMostThreeActionsAndRejectedOnesCount) {
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "xml name or value is NULL!"));
 }
 
-TEST_F(VelmoraLoadXmlTest, IdsThatAreNotDecimalIntegersAreSkippedSilently) {
-    writeCustConfig(policyXml(
-        "<cmd id=\"0x10\"><a/></cmd><cmd id=\"abc\"><a/></cmd><cmd id=\"4400\"><a/></cmd>"));
-    ASSERT_TRUE(load());
-    EXPECT_EQ(mLoader.chains.size(), 1u);
-    EXPECT_EQ(mLoader.chains.count(4400), 1u);
-    EXPECT_EQ(LogCapture::countContaining("cmdId"), 0);
-}
-
 }  // namespace
 }  // namespace fake
 }  // namespace velmora

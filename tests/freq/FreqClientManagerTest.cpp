@@ -115,12 +115,6 @@ INSTANTIATE_TEST_SUITE_P(
         RejectRow{"PlatformFails", true, 7, {{kL, 1000000}}, 7, "doPerfSetConfig failed!", true}),
     [](const ::testing::TestParamInfo<RejectRow>& info) { return info.param.name; });
 
-TEST_F(FreqManagerTest, EventIdWithoutOnOffIsRejectedSilently) {
-    EXPECT_EQ(client(12288, {{kL, 1000000}}), -1);
-    EXPECT_TRUE(mExec.calls().empty());
-    EXPECT_TRUE(LogCapture::lines().empty());
-}
-
 TEST_F(FreqManagerTest, FeatureSwitchOnlyEverTurnsUploadOn) {
     const int tag = VELMORA_TAG_FEATURE_SWITCH;
     const int tags2[] = {tag, tag};

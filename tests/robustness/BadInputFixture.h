@@ -7,12 +7,11 @@
 #include <string>
 #include <vector>
 
-#include "tests/fakes/ServerTest.h"
+#include "tests/server/SceneTestSupport.h"
 
 namespace velmora {
 namespace fake {
 
-inline constexpr int kOn = 0;
 inline constexpr int kScene = 4118;
 inline constexpr int kTimed = 4098;
 inline constexpr int kKxCap = 1200000;

@@ -109,12 +109,6 @@ TEST_F(SchedLevelManagerTest, NullActionIsRejected) {
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "doEventSchedLevel failed, action is NULL!"));
 }
 
-TEST_F(SchedLevelManagerTest, LaterPairForTheSameGroupWins) {
-    easDefaults();
-    EXPECT_EQ(event(4500, {53, 20, 53, 30}), 0);
-    EXPECT_EQ(onlySent()[53], 30);
-}
-
 TEST_F(SchedLevelManagerTest, HmpGroupNamedInEasModeIsKeptButNotSent) {
     easDefaults();
     EXPECT_EQ(event(4500, {50, 20}), 0);
@@ -129,7 +123,8 @@ TEST_F(SchedLevelManagerTest, EventOverwritesLevelsTheZolaClientSet) {
     EXPECT_EQ(snapshot().zola[52], 10);
     mExecutor.clear();
 
-    EXPECT_EQ(event(4501, {53, 30}), 0);
+    // Of two pairs for one group the later wins.
+    EXPECT_EQ(event(4501, {53, 25, 53, 30}), 0);
     EXPECT_EQ(onlySent(), easLevels(ZOLA_SCHED_LEVEL_NONE, {{53, 30}}));
 }
 

@@ -1,6 +1,6 @@
-// Fixture of the special-scene tests: the scene commands of the configuration, the platform's
-// view of scene switches as apply/withdraw steps, and the server's scene state read under its
-// mutex.
+// Fixture of the server tests that drive velmoraEvent and velmoraSetConfig: start-up on extra
+// commands, the on/off words, the scene commands of the configuration, the platform's view of
+// scene switches as apply/withdraw steps, and the server's scene state read under its mutex.
 #pragma once
 
 #include <map>
@@ -16,7 +16,10 @@ namespace fake {
 
 inline constexpr int kOn = 0;
 inline constexpr int kOff = -1;
+inline constexpr int kProbe = 4116;
 inline constexpr int kClientRestart = 20224;
+inline constexpr int kNotification = 20225;
+inline constexpr int kReload = 20230;
 
 // One doAction call as the platform saw it.
 struct Step {
@@ -56,6 +59,21 @@ inline const std::string kSceneCommands =
     scene(4118, "<t1>1500</t1>") + scene(4119) + scene(4120) + scene(4121) + govScene(4230, 50) +
     govScene(4240, 50) + govScene(4250, 30) + govScene(4260, 300) + scene(4130, "<t1>1</t1>");
 
+// Expected "--freqlist" block of one client: `freq` maps tags to values, the others are -1.
+inline std::string freqBlock(const char* name, const std::map<int, int>& freq) {
+    auto line = [&](const char* label, int tag) {
+        const auto it = freq.find(tag);
+        return std::string(label) + std::to_string(it == freq.end() ? -1 : it->second) + "\n";
+    };
+    return std::string(name) + " set freq is:\n" + line("tag=little cpu max,        value=", 2) +
+           line("tag=big cpu max,           value=", 5) +
+           line("tag=gpu max,               value=", 8) +
+           line("tag=ipa switch temp,       value=", 17) +
+           line("tag=ipa control temp,      value=", 18) +
+           line("tag=ipa sustainable power, value=", 19) +
+           line("tag=fork on big cluster,   value=", 20);
+}
+
 struct SceneState {
     int cur;
     std::set<int32_t> on;
@@ -77,10 +95,16 @@ protected:
     int on(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOn); }
     int off(int cmdId) { return mServer->velmoraEvent(cmdId, "", 1, &kOff); }
     int restart() { return mServer->velmoraEvent(kClientRestart, "", 0, nullptr); }
+    int reload() { return mServer->velmoraEvent(kReload, "", 0, nullptr); }
+    int setConfig(int clientId, const std::vector<int>& tags, const std::vector<int>& configs) {
+        return mServer->velmoraSetConfig(clientId, static_cast<int>(tags.size()), tags.data(),
+                                         configs.data());
+    }
+    std::vector<ExecutorCall> actions() { return executor().calls(Op::DoAction); }
     // Replaces the configuration with the start-up commands and `extra`, then reloads it.
     int reload(const std::string& extra) {
         writeCustConfig(policyXml(std::string(kStartupCommands) + extra));
-        return mServer->velmoraEvent(20230, "", 0, nullptr);
+        return reload();
     }
     // The doAction calls recorded since the last call, then forgets them.
     Steps steps() {

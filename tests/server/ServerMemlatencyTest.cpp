@@ -4,14 +4,12 @@
 #include <vector>
 
 #include "platform/VelmoraPlat.h"
-#include "tests/fakes/ServerTest.h"
+#include "tests/server/SceneTestSupport.h"
 
 namespace velmora {
 namespace fake {
 namespace {
 
-constexpr int kOn = 0;
-constexpr int kOff = -1;
 constexpr int kRatioEvent = 20480;
 constexpr int kLatencyEvent = 20481;
 
@@ -23,17 +21,11 @@ std::string ratioText(const std::string& big, const std::string& little) {
     return "pid=12|tid=34|ratio_b=" + big + " ratio_l=" + little;
 }
 
-class ServerMemlatencyTest : public ServerTest {
-  protected:
-    void start(const std::string& extra = "") {
-        ASSERT_EQ(startServer(extra), 0);
-        executor().clear();
-        LogCapture::clear();
-    }
+class ServerMemlatencyTest : public ServerSceneTest {
+protected:
     int ratio(const std::string& msg, int value = kOn) {
         return mServer->velmoraEvent(kRatioEvent, msg.c_str(), 1, &value);
     }
-    std::vector<ExecutorCall> actions() { return executor().calls(Op::DoAction); }
 };
 
 TEST_F(ServerMemlatencyTest, RatiosReachThePlatformAsStringPairs) {

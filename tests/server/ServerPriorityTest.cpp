@@ -77,11 +77,8 @@ TEST_F(ServerSceneTest, ReloadRebuildsTheTableFromScratch) {
     start(scene(4118, "<t101>150</t101>") + scene(4119) + scene(4120) + scene(4121) +
           scene(4130, "<t101>300</t101>") + scene(4131) +
           scene(4300, "<s_priority>40</s_priority>"));
-    ASSERT_EQ(state().prio.at(4118), 150);
-    ASSERT_EQ(state().prio.at(4300), 40);
     ASSERT_EQ(on(4118), 0);
     ASSERT_EQ(on(4131), -1);  // leaves a 0 entry behind
-    ASSERT_EQ(state().prio.count(4131), 1u);
 
     ASSERT_EQ(reload(kBuiltinScenes + scene(4130, "<t101>60</t101>") + scene(4131) +
                      scene(4122, "<t101>90</t101>") + scene(4300)),
@@ -111,24 +108,15 @@ TEST_F(ServerSceneTest, FailedReloadKeepsThePriorities) {
     EXPECT_EQ(steps(), Steps({apply(4130)}));
 }
 
-// The selection functions on hand-made state: the return codes and tie-breaks of branches the
-// host's event sequences do not reach.
-TEST_F(ServerSceneTest, PriorityReadersTakeTheLastMatchingPair) {
+// The integer reader on a hand-made record: only the announced pairs are read.
+TEST_F(ServerSceneTest, PriorityReaderStopsAtTheAnnouncedPairs) {
     VelmoraServer server;
     Action plain;
-    plain.mParamNum = 3;
     plain.mTagValues = {101, 30, 7, 8, 101, 45};
-    EXPECT_EQ(server.getPriority(&plain), 45);
-    plain.mParamNum = 2;  // only the first two pairs count
+    plain.mParamNum = 2;
     EXPECT_EQ(server.getPriority(&plain), 30);
     plain.mParamNum = 0;
     EXPECT_EQ(server.getPriority(&plain), 0);
-
-    Action gov(4300, "", 0, 3, {"priority", "30", "prio", "99", "priority", "44"});
-    EXPECT_EQ(server.getInterPriority(&gov), 44);
-    EXPECT_EQ(server.getPriority(&gov), 0);
-    Action noKey(4300, "", 0, 1, {"priority ", "30"});
-    EXPECT_EQ(server.getInterPriority(&noKey), 0);
 }
 
 }  // namespace

@@ -5,7 +5,7 @@
 #include <vector>
 
 #include "probe/ProbeHandler.h"
-#include "tests/fakes/ServerTest.h"
+#include "tests/server/SceneTestSupport.h"
 
 namespace velmora {
 namespace fake {
@@ -14,8 +14,6 @@ namespace {
 using Clock = std::chrono::steady_clock;
 using std::chrono::milliseconds;
 
-constexpr int kProbe = 4116;
-constexpr int kReload = 20230;
 constexpr milliseconds kBoostDelay{8};
 // Only bounds how long a broken worker is waited for.
 constexpr milliseconds kTolerance{10000};
@@ -33,15 +31,6 @@ std::string commandsWithProbe(int duration, int value) {
 class ServerProbeTest : public ServerTest {
 protected:
     int probe(const char* msg, int state) { return mServer->velmoraEvent(kProbe, msg, 1, &state); }
-
-    std::vector<std::pair<unsigned int, int>> tidCalls() const {
-        std::vector<std::pair<unsigned int, int>> out;
-        for (const auto& call : FakeEnv::get().executor.calls(Op::ProbeTid)) {
-            out.emplace_back(call.tid, call.state);
-        }
-        return out;
-    }
-    using TidCalls = std::vector<std::pair<unsigned int, int>>;
 };
 
 TEST_F(ServerProbeTest, BoostsAfterDelayWithConfiguredActionAndWithdrawsOnRequest) {
@@ -51,11 +40,12 @@ TEST_F(ServerProbeTest, BoostsAfterDelayWithConfiguredActionAndWithdrawsOnReques
     EXPECT_EQ(probe("pid=12|tid=34", 0), 0);
     ASSERT_TRUE(executor().waitFor(Op::DoAction, 1, kBoostDelay + kTolerance));
 
-    EXPECT_EQ(tidCalls(), (TidCalls{{34, 0}}));
     const auto calls = executor().calls();
     ASSERT_EQ(calls.size(), 2u);
-    // The thread is selected before the action runs, not before the delay.
+    // Thread 34 is selected before the action runs, not before the delay.
     EXPECT_EQ(calls[0].op, Op::ProbeTid);
+    EXPECT_EQ(calls[0].tid, 34u);
+    EXPECT_EQ(calls[0].state, 0);
     EXPECT_GE(calls[0].when - queued, kBoostDelay);
     EXPECT_EQ(calls[1].op, Op::DoAction);
     EXPECT_EQ(calls[1].id, kProbe);
@@ -65,9 +55,11 @@ TEST_F(ServerProbeTest, BoostsAfterDelayWithConfiguredActionAndWithdrawsOnReques
     EXPECT_EQ(calls[1].payload, (std::vector<int>{0}));
 
     EXPECT_EQ(probe("pid=12|tid=34", -1), 0);
-    EXPECT_EQ(tidCalls(), (TidCalls{{34, 0}, {34, -1}}));
-    ASSERT_EQ(executor().calls(Op::DoAction).size(), 2u);
-    EXPECT_EQ(executor().calls(Op::DoAction)[1].payload, (std::vector<int>{-1}));
+    const auto withdrawn = executor().calls();
+    ASSERT_EQ(withdrawn.size(), 4u);
+    EXPECT_EQ(withdrawn[2].tid, 34u);
+    EXPECT_EQ(withdrawn[2].state, -1);
+    EXPECT_EQ(withdrawn[3].payload, (std::vector<int>{-1}));
 }
 
 // The action of a reload replaces the probe action as it is: the start-up cap does not apply.

@@ -128,12 +128,21 @@ TEST_F(ServerSceneTest, ClientRestartWithdrawsTheCurrentSceneAndForgetsTheRest) 
     EXPECT_EQ(steps(), Steps({apply(4121)}));
 }
 
-TEST_F(ServerSceneTest, UnconfiguredPriorityIsRefusedWithoutTouchingTheState) {
+// A scene configured without a priority, and payloads other than exactly one int 0 or -1
+// (checked before the scene state is looked at), are refused and change nothing.
+TEST_F(ServerSceneTest, RefusedSwitchesLeaveTheStateAlone) {
     start();
     ASSERT_EQ(on(4118), 0);
     steps();
     EXPECT_EQ(on(4130), -1);
     EXPECT_EQ(off(4130), -1);
+    const int minusTwo = -2;
+    const int twoOn[2] = {kOn, kOn};
+    EXPECT_EQ(mServer->velmoraEvent(4119, "", 1, &minusTwo), -1);
+    EXPECT_EQ(mServer->velmoraEvent(4119, "", 2, twoOn), -1);
+    EXPECT_EQ(mServer->velmoraEvent(4119, "", 0, nullptr), -1);
+    EXPECT_EQ(
+        LogCapture::count(ANDROID_LOG_ERROR, "invalid special scene parameters, cmdId is 4119"), 3);
     EXPECT_EQ(steps(), Steps());
     EXPECT_EQ(state().cur, 4118);
     EXPECT_EQ(state().on, std::set<int32_t>({4118}));
@@ -150,39 +159,6 @@ TEST_F(ServerSceneTest, UnparsableOrDisabledSceneIsNotDispatched) {
     EXPECT_EQ(state().cur, 0);
 }
 
-// Invalid payloads are refused before the scene state is looked at.
-struct PayloadRow {
-    const char* what;
-    unsigned int payloadNum;
-    std::vector<int> payload;  // empty: null pointer
-};
-
-class ServerSceneInvalidPayloadTest : public ServerSceneTest,
-                                      public ::testing::WithParamInterface<PayloadRow> {};
-
-TEST_P(ServerSceneInvalidPayloadTest, IsRefusedAndChangesNothing) {
-    start();
-    ASSERT_EQ(on(4118), 0);
-    steps();
-    LogCapture::clear();
-    const PayloadRow& row = GetParam();
-    const int* payload = row.payload.empty() ? nullptr : row.payload.data();
-    EXPECT_EQ(mServer->velmoraEvent(4119, "", row.payloadNum, payload), -1);
-    EXPECT_TRUE(
-        LogCapture::has(ANDROID_LOG_ERROR, "invalid special scene parameters, cmdId is 4119"));
-    EXPECT_EQ(steps(), Steps());
-    EXPECT_EQ(state().cur, 4118);
-    EXPECT_EQ(state().on, std::set<int32_t>({4118}));
-}
-
-INSTANTIATE_TEST_SUITE_P(
-    Rows, ServerSceneInvalidPayloadTest,
-    ::testing::Values(PayloadRow{"payload_one", 1, {1}},  // neither on nor off
-                      PayloadRow{"payload_minus_two", 1, {-2}}, PayloadRow{"null_payload", 1, {}},
-                      PayloadRow{"no_payload", 0, {}},
-                      PayloadRow{"two_ints", 2, {0, 0}}),  // only exactly one int counts
-    [](const ::testing::TestParamInfo<PayloadRow>& info) { return std::string(info.param.what); });
-
 TEST_F(ServerSceneTest, TwoResultsAreJoinedByBitwiseOr) {
     start();
     ASSERT_EQ(on(4118), 0);
@@ -192,8 +168,6 @@ TEST_F(ServerSceneTest, TwoResultsAreJoinedByBitwiseOr) {
         [this](const Action* a) { executor().setResult(Op::DoAction, a->mCmdId == 4118 ? 1 : 4); });
     EXPECT_EQ(on(4119), 5);
     EXPECT_EQ(steps(), Steps({withdraw(4118), apply(4119)}));
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4118"));
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4119"));
 
     // Handing back joins the same way: withdraw 4119 (4) | apply 4118 (1).
     EXPECT_EQ(off(4119), 5);

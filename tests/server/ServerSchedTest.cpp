@@ -2,11 +2,12 @@
 // requests with tags 40/42 and the "--easgrouplist" dump read back from a descriptor.
 #include <unistd.h>
 
+#include <map>
 #include <string>
 #include <vector>
 
-#include "tests/fakes/ServerTest.h"
 #include "tests/sched/SchedTestHelpers.h"
+#include "tests/server/SceneTestSupport.h"
 
 namespace velmora {
 namespace fake {
@@ -31,34 +32,32 @@ std::string startupWith(const std::string& defaultPairs) {
            "</act></cmd>" + kProbeCommand;
 }
 
-class ServerSchedTest : public ServerTest {
-protected:
-    int set(int clientId, const std::vector<int>& tags, const std::vector<int>& configs) {
-        return mServer->velmoraSetConfig(clientId, static_cast<int>(tags.size()), tags.data(),
-                                         configs.data());
+// Start-up pairs of the eight EAS groups at `levels` (0 when missing); `fourth` renames the
+// fourth one's tag.
+std::string easXml(std::map<int, int> levels = {}, const std::string& fourth = "") {
+    std::string xml;
+    for (int tag = 51; tag <= 58; ++tag) {
+        const std::string name = tag == 54 && !fourth.empty() ? fourth : "t" + std::to_string(tag);
+        xml += "<" + name + ">" + std::to_string(levels[tag]) + "</" + name + ">";
     }
+    return xml;
+}
 
-    // What the server writes for "--easgrouplist".
-    std::string easDumpText() { return dump("--easgrouplist"); }
-
+class ServerSchedTest : public ServerSceneTest {
+protected:
     std::vector<ExecutorCall> sent() { return executor().calls(Op::SchedLevel); }
 };
 
 TEST_F(ServerSchedTest, EasDefaultsAreInstalledAtStartUpWithoutPlatformCall) {
     // Distinct levels for tags 56 and 57: the dump lists key-background before
     // system-background, against the tag order.
-    std::string pairs;
-    for (int tag = 51; tag <= 58; ++tag) {
-        const int level = tag == 56 ? 6 : tag == 57 ? 7 : 0;
-        pairs += "<t" + std::to_string(tag) + ">" + std::to_string(level) + "</t" +
-                 std::to_string(tag) + ">";
-    }
-    writeCustConfig(policyXml(startupWith(pairs)));
+    writeCustConfig(policyXml(startupWith(easXml({{56, 6}, {57, 7}}))));
     mServer = std::make_unique<VelmoraServer>();
     ASSERT_EQ(mServer->init(), 0);
     EXPECT_TRUE(sent().empty());
     const auto defaults = easLevels(0, {{56, 6}, {57, 7}});
-    EXPECT_EQ(easDumpText(), easDump(defaults, defaults, defaults, defaults, defaults) + "\n");
+    EXPECT_EQ(dump("--easgrouplist"),
+              easDump(defaults, defaults, defaults, defaults, defaults) + "\n");
 }
 
 TEST_F(ServerSchedTest, HmpDefaultDrivesTheSingleGroup) {
@@ -74,12 +73,12 @@ TEST_F(ServerSchedTest, HmpDefaultDrivesTheSingleGroup) {
     EXPECT_EQ(sent()[0].tags, std::vector<int>({50}));
     EXPECT_EQ(sent()[0].values, std::vector<int>({30}));
 
-    EXPECT_EQ(set(2, {42}, {packLevel(0, -20)}), 0);
+    EXPECT_EQ(setConfig(2, {42}, {packLevel(0, -20)}), 0);
     ASSERT_EQ(sent().size(), 2u);
     EXPECT_EQ(sent()[1].tags, std::vector<int>({50}));
     EXPECT_EQ(sent()[1].values, std::vector<int>({-20}));
 
-    EXPECT_EQ(easDumpText(),
+    EXPECT_EQ(dump("--easgrouplist"),
               "default eas group value is:\n"
               "group=hmp,               value=10\n"
               "current eas group value is:\n"
@@ -116,23 +115,13 @@ TEST_P(ServerSchedBadDefaultsTest, InitFailsAndReleasesEverything) {
     EXPECT_EQ(mServer->velmoraEvent(4500, "", 0, nullptr), 1);
 }
 
-std::string easXml(const std::string& replaceFourth = "") {
-    std::string xml;
-    for (int tag = 51; tag <= 58; ++tag) {
-        const std::string name =
-            tag == 54 && !replaceFourth.empty() ? replaceFourth : "t" + std::to_string(tag);
-        xml += "<" + name + ">0</" + name + ">";
-    }
-    return xml;
-}
-
 // clang-format off
 INSTANTIATE_TEST_SUITE_P(
     Rows, ServerSchedBadDefaultsTest,
     ::testing::Values(
         BadDefaultsRow{"ThreePairs", "<t51>0</t51><t52>0</t52><t53>0</t53>", ANDROID_LOG_ERROR,
                        "init default group failed! tagLen must be (eas:8, hmp:1)"},
-        BadDefaultsRow{"HmpAmongEasPairs", easXml("t50"), ANDROID_LOG_ERROR,
+        BadDefaultsRow{"HmpAmongEasPairs", easXml({}, "t50"), ANDROID_LOG_ERROR,
                        "invalid eas group, group tag is 0"}),
     [](const ::testing::TestParamInfo<BadDefaultsRow>& info) { return info.param.name; });
 // clang-format on
@@ -147,7 +136,8 @@ TEST_F(ServerSchedTest, EventReachesThePlatformOnlyWhenItChangesALevel) {
     EXPECT_EQ(mServer->velmoraEvent(4500, "", 0, nullptr), 0);
     EXPECT_EQ(sent().size(), 1u);
     const auto zola = easLevels(-100, {{53, 30}});
-    EXPECT_EQ(easDumpText(), easDump(easLevels(0), zola, easLevels(0), easLevels(0), zola) + "\n");
+    EXPECT_EQ(dump("--easgrouplist"),
+              easDump(easLevels(0), zola, easLevels(0), easLevels(0), zola) + "\n");
 }
 
 TEST_F(ServerSchedTest, FollowerMovesOnlyGroupsStillAtTheReference) {
@@ -172,20 +162,20 @@ TEST_F(ServerSchedTest, RejectedOrFailedActionLeavesTheTables) {
 
     // A refused event is an action failure too; a refused client request hands the platform's
     // own result back. Neither leaves a trace in the tables.
-    const std::string before = easDumpText();
+    const std::string before = dump("--easgrouplist");
     executor().setResult(Op::SchedLevel, 9);
     EXPECT_EQ(mServer->velmoraEvent(4500, "", 0, nullptr), 3);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "velmoraEvent doAction failed! cmdId=4500"));
-    EXPECT_EQ(set(2, {42}, {packLevel(3, -10)}), 9);
+    EXPECT_EQ(setConfig(2, {42}, {packLevel(3, -10)}), 9);
     EXPECT_EQ(LogCapture::count(ANDROID_LOG_DEBUG, "doSchedLevelAction failed!"), 4);
-    EXPECT_EQ(easDumpText(), before);
+    EXPECT_EQ(dump("--easgrouplist"), before);
 }
 
 TEST_F(ServerSchedTest, ClientRequestsMergeAcrossClients) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
-    EXPECT_EQ(set(1, {42, 42}, {packLevel(3, -10), packLevel(5, 20)}), 0);
-    EXPECT_EQ(set(2, {42}, {packLevel(3, -20)}), 0);
-    EXPECT_EQ(set(3, {42}, {packLevel(5, 30)}), 0);
+    EXPECT_EQ(setConfig(1, {42, 42}, {packLevel(3, -10), packLevel(5, 20)}), 0);
+    EXPECT_EQ(setConfig(2, {42}, {packLevel(3, -20)}), 0);
+    EXPECT_EQ(setConfig(3, {42}, {packLevel(5, 30)}), 0);
     ASSERT_EQ(sent().size(), 3u);
     // Top-app: the lowest client wins. Foreground: KX above the default has no say, ZOLA does.
     EXPECT_EQ(sent()[2].values, std::vector<int>({0, 0, -20, 0, 30, 0, 0, 0}));
@@ -193,23 +183,23 @@ TEST_F(ServerSchedTest, ClientRequestsMergeAcrossClients) {
                                 "setConfig clientId=1, tagLen=2, tags[1]=42, configs[1]=" +
                                     std::to_string(packLevel(5, 20))));
 
-    EXPECT_EQ(easDumpText(), easDump(easLevels(0), easLevels(0, {{53, -20}, {55, 30}}),
-                                     easLevels(0, {{53, -10}, {55, 20}}), easLevels(0, {{53, -20}}),
-                                     easLevels(0, {{55, 30}})) +
-                                 "\n");
+    EXPECT_EQ(dump("--easgrouplist"), easDump(easLevels(0), easLevels(0, {{53, -20}, {55, 30}}),
+                                              easLevels(0, {{53, -10}, {55, 20}}),
+                                              easLevels(0, {{53, -20}}), easLevels(0, {{55, 30}})) +
+                                          "\n");
 }
 
 TEST_F(ServerSchedTest, StepAndResetOfAClient) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
-    ASSERT_EQ(set(1, {42}, {packLevel(3, 10)}), 0);
+    ASSERT_EQ(setConfig(1, {42}, {packLevel(3, 10)}), 0);
     // Down: top-app 10 -> 0 (no longer below the default), the others 0 -> -10.
-    EXPECT_EQ(set(1, {40}, {1}), 0);
+    EXPECT_EQ(setConfig(1, {40}, {1}), 0);
     EXPECT_EQ(sent().back().values, std::vector<int>({-10, -10, 0, -10, -10, -10, -10, -10}));
-    EXPECT_EQ(set(1, {40}, {1}), 0);
+    EXPECT_EQ(setConfig(1, {40}, {1}), 0);
     EXPECT_EQ(sent().back().values, std::vector<int>({-20, -20, -10, -20, -20, -20, -20, -20}));
-    EXPECT_EQ(set(1, {40}, {2}), 0);
+    EXPECT_EQ(setConfig(1, {40}, {2}), 0);
     EXPECT_EQ(sent().back().values, std::vector<int>({-10, -10, 0, -10, -10, -10, -10, -10}));
-    EXPECT_EQ(set(1, {40}, {0}), 0);
+    EXPECT_EQ(setConfig(1, {40}, {0}), 0);
     EXPECT_EQ(sent().back().values, std::vector<int>(8, 0));
     EXPECT_EQ(sent().size(), 5u);
 }
@@ -217,10 +207,7 @@ TEST_F(ServerSchedTest, StepAndResetOfAClient) {
 TEST_F(ServerSchedTest, RejectedRequestIsPassedOnWithItsOwnLog) {
     ASSERT_EQ(startServer(kSchedCommands), 0);
     // A frequency tag next to tag 42 sends the whole request to the scheduling manager.
-    EXPECT_EQ(set(1, {22, 42}, {1000, packLevel(3, -10)}), -1);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_DEBUG,
-                                "do not use VELMORA_TAG_SET_SCHED_LEVEL with other tags(22), "
-                                "clientId is 1"));
+    EXPECT_EQ(setConfig(1, {22, 42}, {1000, packLevel(3, -10)}), -1);
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR,
                                 "velmoraSetConfig doPerfSetSchedLevel failed! clientId=1"));
     EXPECT_TRUE(sent().empty());

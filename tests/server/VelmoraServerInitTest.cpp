@@ -63,17 +63,6 @@ TEST_F(VelmoraServerInitTest, EmptyConfigurationFailsParserCreation) {
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "createParser failed!"));
 }
 
-TEST_F(VelmoraServerInitTest, MissingStartupCommandLeavesServerUninitialised) {
-    writeCustConfig(
-        policyXml("<cmd id=\"4116\" name=\"probe\"><act><duration>8</duration></act></cmd>"));
-    mServer = std::make_unique<VelmoraServer>();
-    EXPECT_EQ(mServer->init(), 2);
-    EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "init default group sched level failed!"));
-    EXPECT_FALSE(mServer->mInitialized);
-    EXPECT_EQ(mServer->mPlatPtr, nullptr);
-    EXPECT_EQ(mServer->velmoraEvent(4400, "", 0, nullptr), 1);
-}
-
 TEST_F(VelmoraServerInitTest, MissingProbeCommandKeepsServerRunning) {
     writeCustConfig(
         policyXml("<cmd id=\"5376\"><act><duration>0</duration><t50>0</t50></act></cmd>"

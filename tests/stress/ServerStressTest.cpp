@@ -242,13 +242,9 @@ TEST_F(ServerStressTest, EveryEntryPointUnderConcurrentReloads) {
     // Scenes: the current one is the best switched on and the platform last applied it; every
     // other ordinary scene was last withdrawn (or never reached the platform). Governor scenes
     // applied on their own under 4119 are not withdrawn when they switch off.
-    int cur = 0;
-    std::set<int32_t> on;
-    {
-        android::Mutex::Autolock lock(mServer->mMutex);
-        cur = mServer->mCurSpecialCmdId;
-        on = mServer->mOnEventSet;
-    }
+    const SceneState scenes = snapshot(mServer.get());
+    const int cur = scenes.cur;
+    const std::set<int32_t>& on = scenes.on;
     EXPECT_EQ(on, std::set<int32_t>(sceneModel.begin(), sceneModel.end()));
     int best = -1;  // priority of the best scene switched on
     for (int id : on) {

@@ -1,6 +1,5 @@
 // Pieces of the stress test: the configuration under load, the operation mix's constants, the
-// watchdog that names a hanging thread, the model of what each client asked for last and the
-// expected "--freqlist" block.
+// watchdog that names a hanging thread and the model of what each client asked for last.
 #pragma once
 
 #include <unistd.h>
@@ -16,18 +15,14 @@
 #include <utility>
 #include <vector>
 
+#include "tests/server/SceneTestSupport.h"
+
 namespace velmora {
 namespace fake {
 
 using Clock = std::chrono::steady_clock;
 using std::chrono::milliseconds;
 
-inline constexpr int kOn = 0;
-inline constexpr int kOff = -1;
-inline constexpr int kProbe = 4116;
-inline constexpr int kReload = 20230;
-inline constexpr int kNotification = 20225;
-inline constexpr int kClientRestart = 20224;
 inline constexpr int kTimedAction = 4098;
 inline constexpr int kColdStart = 4099;
 
@@ -83,14 +78,9 @@ inline std::string commands(int variant) {
            cmd(12289, "big_cap_platform", "<duration>0</duration><t10>1</t10><t5>1900000</t5>") +
            cmd(12290, "little_floor", "<duration>0</duration><t1>800000</t1>") +
            cmd(20481, "memlat", "<duration>0</duration><t30>1</t30>") +
-           cmd(4118, "scene_4118", "<duration>0</duration><t1>1500</t1>") +
-           cmd(4119, "scene_4119", "<duration>0</duration><t2>2000</t2>") +
-           cmd(4120, "scene_4120", "<duration>0</duration><t1>1</t1>") +
-           cmd(4121, "scene_4121", "<duration>0</duration><t1>2</t1>") +
-           cmd(4122, "scene_4122", "<duration>0</duration><t101>150</t101>") +
-           cmd(4230, "gov_4230", "<duration>0</duration><s_priority>50</s_priority>") +
-           cmd(4240, "gov_4240", "<duration>0</duration><s_priority>50</s_priority>") +
-           cmd(4260, "gov_4260", "<duration>0</duration><s_priority>300</s_priority>");
+           scene(4118, "<t1>1500</t1>") + scene(4119, "<t2>2000</t2>") + scene(4120, "<t1>1</t1>") +
+           scene(4121, "<t1>2</t1>") + scene(4122, "<t101>150</t101>") + govScene(4230, 50) +
+           govScene(4240, 50) + govScene(4260, 300);
 }
 
 // Per-thread progress for the watchdog: an operation counter and the operation in flight.
@@ -147,21 +137,6 @@ struct ClientModel {
     std::map<int, int> freq;   // tag -> last accepted value (-1 never set)
     std::map<int, int> sched;  // group tag -> last accepted level (absent: the default 0)
 };
-
-// Expected "--freqlist" block of one client that only ever sent tags 2, 5 and 8.
-inline std::string freqBlock(const char* name, const std::map<int, int>& freq) {
-    auto value = [&](int tag) {
-        auto it = freq.find(tag);
-        return std::to_string(it == freq.end() ? -1 : it->second);
-    };
-    return std::string(name) + " set freq is:\n" + "tag=little cpu max,        value=" + value(2) +
-           "\n" + "tag=big cpu max,           value=" + value(5) + "\n" +
-           "tag=gpu max,               value=" + value(8) + "\n" +
-           "tag=ipa switch temp,       value=-1\n"
-           "tag=ipa control temp,      value=-1\n"
-           "tag=ipa sustainable power, value=-1\n"
-           "tag=fork on big cluster,   value=-1\n";
-}
 
 }  // namespace fake
 }  // namespace velmora
