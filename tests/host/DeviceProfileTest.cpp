@@ -71,7 +71,6 @@ using V = KernelRules::Verdict;
 const Write kWrites[] = {
     {"cpu.little.min", "1804800", V::kAccepted, "1804800"},
     {"cpu.little.min", "1500000", V::kRounded, "1593600"},  // a floor rounds up
-    {"cpu.little.max", "1500000", V::kRounded, "1497600"},  // a cap rounds down
     {"cpu.big.governor", "performace", V::kRefused, "the device has no governor 'performace'"},
     {"memlat.ratio_b", "6O", V::kRefused, "'6O' is not a number"},
 };

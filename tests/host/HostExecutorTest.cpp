@@ -1,6 +1,6 @@
-// What reaches the device nodes: timed actions (expiry, re-arm, withdraw), scenes and on/off
-// actions, merged frequency configurations, group levels, probe boosts and queries. Runs on a
-// simulated device in virtual time, so expiry happens exactly when the clock is advanced.
+// What reaches the device nodes: timed actions (expiry, re-arm, withdraw), requests of several
+// sources on one node, group levels, probe boosts, queries and what the device refuses. Runs on
+// a simulated device in virtual time, so expiry happens exactly when the clock is advanced.
 #include <gtest/gtest.h>
 
 #include <unistd.h>
@@ -114,34 +114,8 @@ TEST_F(HostExecutorTest, RequestsOfDifferentSourcesCombinePerNode) {
     EXPECT_EQ("300000", node("cpu.little.min"));
 }
 
-TEST_F(HostExecutorTest, ScenesAndMemoryLatencyStayUntilWithdrawnAndAreMarked) {
-    Action gov(4224, "gov", 0, 2, {"priority", "50", "big_governor", "performance"});
-    Action memlat(20480, "", 0, 2, {"mem_latency_ratio_b", "0.5", "mem_latency_ratio_l", "0.7"});
-    ASSERT_EQ(0, apply(gov, 0));
-    ASSERT_EQ(0, apply(memlat, 0));
-    mClock.advanceTo(60000);
-    EXPECT_EQ("performance", node("cpu.big.governor"));
-    EXPECT_EQ("0.5", node("memlat.ratio_b"));
-    EXPECT_EQ("0.7", node("memlat.ratio_l"));
-    ASSERT_EQ(0, apply(gov, -1));
-    ASSERT_EQ(0, apply(memlat, -1));
-    EXPECT_EQ("schedutil", node("cpu.big.governor"));
-    EXPECT_EQ("1", node("memlat.ratio_b"));
-    const auto scenes = mTimeline.instants("scene");
-    ASSERT_EQ(2u, scenes.size());
-    EXPECT_EQ("4224 gov on", scenes[0].name);
-    EXPECT_EQ("4224 gov off", scenes[1].name);
-}
-
-TEST_F(HostExecutorTest, MergedConfigurationAndGroupLevelsReachTheirNodes) {
-    const int tags[] = {5, 8, 17, 20};
-    const int values[] = {1804800, 600000000, 60000, 0};
-    ASSERT_EQ(0, mExecutor->doPerfSetConfig(2, 4, tags, values));
-    EXPECT_EQ("1804800", node("cpu.big.max"));
-    EXPECT_EQ("600000000", node("gpu.max"));
-    EXPECT_EQ("60000", node("ipa.switch_temp"));
-    EXPECT_EQ("0", node("sched.fork_on_big"));
-
+// Levels of -100 stand for "nothing requested"; unknown groups and read-only tags are refused.
+TEST_F(HostExecutorTest, GroupLevelsReachTheirNodesAndBadTagsAreRefused) {
     const int groups[] = {51, 53, 58};
     const int levels[] = {10, -100, -20};
     ASSERT_EQ(0, mExecutor->doSchedLevelAction(3, groups, levels));
@@ -152,7 +126,7 @@ TEST_F(HostExecutorTest, MergedConfigurationAndGroupLevelsReachTheirNodes) {
     const int bad[] = {49};
     EXPECT_EQ(-1, mExecutor->doSchedLevelAction(1, bad, levels));
     const int readOnly[] = {24};
-    EXPECT_EQ(-1, mExecutor->doPerfSetConfig(1, 1, readOnly, values));
+    EXPECT_EQ(-1, mExecutor->doPerfSetConfig(1, 1, readOnly, levels));
 }
 
 TEST_F(HostExecutorTest, QueriesReadTheNodes) {

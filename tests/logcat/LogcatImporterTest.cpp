@@ -92,10 +92,6 @@ std::string threadtimeLog(const std::vector<std::pair<int, std::string>>& lines)
     return log;
 }
 
-void PrintTo(const LineRow& row, std::ostream* os) {
-    *os << row.name;
-}
-
 class ServerLinesTest : public testing::TestWithParam<LineRow> {};
 
 TEST_P(ServerLinesTest, BecomeCalls) {
