@@ -133,12 +133,8 @@ TEST_F(HostExecutorTest, QueriesReadTheNodes) {
     const int tags[] = {22, 24, 26, 5, 53, 999};
     int values[] = {-1, -1, -1, -1, -1, -1};
     EXPECT_EQ(-1, mExecutor->doPerfGetConfig(6, tags, values));  // 999 has no node
-    EXPECT_EQ(1804800, values[0]);
-    EXPECT_EQ(2841600, values[1]);
-    EXPECT_EQ(900000000, values[2]);
-    EXPECT_EQ(2841600, values[3]);
-    EXPECT_EQ(0, values[4]);
-    EXPECT_EQ(-1, values[5]);
+    EXPECT_EQ((std::vector<int>{1804800, 2841600, 900000000, 2841600, 0, -1}),
+              std::vector<int>(values, values + 6));
 }
 
 TEST_F(HostExecutorTest, ProbeBoostLastsWhileAnyThreadIsBoosted) {

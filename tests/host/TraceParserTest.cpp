@@ -29,9 +29,7 @@ TEST(TraceParserTest, CallsTheExampleMinuteLacksParse) {
 
 TEST(TraceParserTest, BadLineNamesFileAndLine) {
     const std::pair<const char*, const char*> rows[] = {
-        // Typo in the call name.
         {"evnt 4098 0", "minute.trace:2: unknown call 'evnt'; did you mean 'event'?"},
-        // Malformed numbers.
         {"event 40x9 0", "minute.trace:2: malformed number '40x9' for command id"},
         {"@-5 reload", "minute.trace:2: malformed time '-5' for time stamp"},
         {"event 99999999999 0", "minute.trace:2: malformed number '99999999999' for command id"},

@@ -96,16 +96,7 @@ TEST_P(CounterTrackTest, TrackFollowsWhatThePlatformAccepted) {
 INSTANTIATE_TEST_SUITE_P(
     Decisions, CounterTrackTest,
     ::testing::Values(
-        // 4119 outranks 4118: the track shows the applied scene, not the last one switched.
-        CounterCase{"scene_switch",
-                    [](VelmoraServer& s) {
-                        event(s, 4118, kOn);
-                        event(s, 4119, kOn);
-                        event(s, 4118, kOff);
-                        event(s, 4119, kOff);
-                    },
-                    "velmora.scene",
-                    {4118, 4119, 0}},
+        // A client restart drops the applied scene (switching: ReplayEndToEndTest's timeline).
         CounterCase{"client_restart",
                     [](VelmoraServer& s) {
                         event(s, 4118, kOn);
