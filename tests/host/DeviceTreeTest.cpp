@@ -1,7 +1,6 @@
-// The device tree and node map: seeding a fresh simulated device, writing only on change,
-// falling back to the first value seen, and node-map overrides with their errors.
+// The device tree and node map: seeding a fresh simulated device, and node-map overrides with
+// their errors. (Writing only on change: HostExecutorTest's re-armed timer.)
 #include <gtest/gtest.h>
-#include <sys/stat.h>
 
 #include "host/DeviceTree.h"
 #include "host/HostClock.h"
@@ -36,25 +35,6 @@ TEST_F(DeviceTreeTest, SeedCreatesEveryNodeAtItsSeedValue) {
     }
 }
 
-// A node is written only when its value changes: an unchanged write leaves the file alone
-// (a value planted behind the tree's back survives it) and records nothing.
-TEST_F(DeviceTreeTest, WritesOnlyWhenTheValueChanges) {
-    ASSERT_EQ(0, mTree.seed());
-    const std::string path = mTree.pathOf("gpu.max");
-    ASSERT_EQ(0, mTree.write("gpu.max", "600000000"));
-    hosttest::writeFile(path, "planted\n");
-    ASSERT_EQ(0, mTree.write("gpu.max", "600000000"));
-    EXPECT_EQ("planted", hosttest::readFile(path));
-    EXPECT_EQ(1, mTimeline.changes("gpu.max"));
-    ASSERT_EQ(0, mTree.write("gpu.max", "900000000"));
-    EXPECT_EQ("900000000", hosttest::readFile(path));
-    EXPECT_EQ(2, mTimeline.changes("gpu.max"));
-
-    std::string base;
-    ASSERT_TRUE(mTree.baseline("gpu.max", &base));
-    EXPECT_EQ("900000000", base);
-}
-
 TEST(NodeMapTest, OverridesChangePathAndSeedAndBadLinesNameTheLine) {
     NodeMap nodes;
     std::string error;
@@ -68,7 +48,6 @@ TEST(NodeMapTest, OverridesChangePathAndSeedAndBadLinesNameTheLine) {
               nodes.find("cpu.big.max")->path);
     EXPECT_EQ("3000000", nodes.find("cpu.big.max")->seed);
     EXPECT_EQ("257000000", nodes.find("gpu.min")->seed);
-    EXPECT_EQ("cpu.big.max", nodes.keyForTag(5));
     // Only the nodes of the map can be moved, and only inside the device root.
     EXPECT_EQ(-1, nodes.parse("cpu.mid.max sys/x\n", "nodes.txt", &error));
     EXPECT_EQ("nodes.txt:1: unknown node 'cpu.mid.max'", error);

@@ -53,9 +53,7 @@ TEST_F(HostLoadXmlTest, NamedParametersBecomeTagPairs) {
         <priority>150</priority><tag_33>7</tag_33></act></cmd>)"));
     const Action* action = first(4099);
     ASSERT_NE(nullptr, action);
-    EXPECT_EQ("cold", action->mName);
     EXPECT_EQ(1500, action->mDuration);
-    EXPECT_EQ(9, action->mParamNum);
     EXPECT_EQ((std::vector<int32_t>{1, 1804800, 5, 2419200, 7, 500, 10, 800, 18, 80000, 20, 1, 57,
                                     -10, 101, 150, 33, 7}),
               action->mTagValues);

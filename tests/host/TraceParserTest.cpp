@@ -1,5 +1,5 @@
-// The trace format of velmora-replay: what each kind of line turns into (getconfig and dump: the
-// example minute's replay), and errors that name the file and line.
+// The trace format of velmora-replay: the kinds of line the example minute's replay leaves out,
+// and errors that name the file and line.
 #include <gtest/gtest.h>
 
 #include "tools/replay/TraceParser.h"
@@ -7,45 +7,27 @@
 namespace velmora {
 namespace {
 
-TEST(TraceParserTest, EveryCallKindParses) {
+// Only what the example minute's replay does not exercise: a hex payload, a negative value, a
+// sleep, and comments after a call.
+TEST(TraceParserTest, CallsTheExampleMinuteLacksParse) {
     std::vector<TraceCall> calls;
     std::string error;
-    ASSERT_EQ(0,
-              TraceParser::parseText("# header\n"
-                                     "@1500 event 4116 0 msg=\"pid=12|tid=34\"   # probe\n"
-                                     "event 20480 0 msg=\"pid=1|tid=2|ratio_b=0.5 ratio_l=0.7\"\n"
-                                     "event 20225 0x50000\n"
-                                     "setconfig 1 2=1497600 5=-1\n"
-                                     "reload\n"
-                                     "policy cold 1200\n"
-                                     "sleep 250\n"
-                                     "@3000\n"
-                                     "\n",
-                                     "t.trace", &calls, &error))
+    ASSERT_EQ(0, TraceParser::parseText("# header\n"
+                                        "@1500 event 20225 0x50000   # feature switch\n"
+                                        "setconfig 1 2=1497600 5=-1\n"
+                                        "sleep 250\n"
+                                        "\n",
+                                        "t.trace", &calls, &error))
         << error;
-    ASSERT_EQ(8u, calls.size());
-    EXPECT_EQ(TraceCall::Kind::Event, calls[0].kind);
-    EXPECT_EQ(1500, calls[0].atMs);
-    EXPECT_EQ(4116, calls[0].id);
-    EXPECT_EQ(std::vector<int>{0}, calls[0].payload);
-    EXPECT_EQ("pid=12|tid=34", calls[0].text);
-    EXPECT_EQ("pid=1|tid=2|ratio_b=0.5 ratio_l=0.7", calls[1].text);
-    EXPECT_EQ(std::vector<int>{0x50000}, calls[2].payload);
-    EXPECT_EQ((std::vector<int>{2, 5}), calls[3].tags);
-    EXPECT_EQ((std::vector<int>{1497600, -1}), calls[3].values);
-    EXPECT_EQ(TraceCall::Kind::Reload, calls[4].kind);
-    EXPECT_EQ("cold", calls[5].text);
-    EXPECT_EQ(1200, calls[5].id);
-    EXPECT_EQ(250, calls[6].sleepMs);
-    EXPECT_EQ(TraceCall::Kind::Stamp, calls[7].kind);
-    EXPECT_EQ(3000, calls[7].atMs);
+    ASSERT_EQ(3u, calls.size());
+    EXPECT_EQ(std::vector<int>{0x50000}, calls[0].payload);
+    EXPECT_EQ((std::vector<int>{1497600, -1}), calls[1].values);
+    EXPECT_EQ(250, calls[2].sleepMs);
 }
 
 TEST(TraceParserTest, BadLineNamesFileAndLine) {
     const std::pair<const char*, const char*> rows[] = {
-        // Typo in the call name.
         {"evnt 4098 0", "minute.trace:2: unknown call 'evnt'; did you mean 'event'?"},
-        // Malformed numbers.
         {"event 40x9 0", "minute.trace:2: malformed number '40x9' for command id"},
         {"@-5 reload", "minute.trace:2: malformed time '-5' for time stamp"},
         {"event 99999999999 0", "minute.trace:2: malformed number '99999999999' for command id"},
@@ -72,9 +54,6 @@ TEST(TraceParserTest, EveryBadLineIsReportedAndAByteOrderMarkIsSkipped) {
         "t.trace:2: 'setconfig' takes 2..64 argument(s), got 1\n"
         "t.trace:4: unknown call 'sleeep'; did you mean 'sleep'?",
         error);
-    ASSERT_EQ(2u, calls.size());
-    EXPECT_EQ(4099, calls[0].id);
-    EXPECT_EQ(TraceCall::Kind::Reload, calls[1].kind);
 }
 
 }  // namespace

@@ -28,12 +28,7 @@ struct FormatRow {
     const char* format;  // as detected
     const char* first;   // everything before the message, for the event
     const char* second;  // for the request
-    const char* what = "";
 };
-
-std::ostream& operator<<(std::ostream& out, const FormatRow& row) {
-    return out << row.format << row.what;
-}
 
 class LogcatFormatTest : public testing::TestWithParam<FormatRow> {};
 
@@ -58,17 +53,19 @@ TEST_P(LogcatFormatTest, ReadsTheServerLinesOfTheFormat) {
 
 INSTANTIATE_TEST_SUITE_P(
     Formats, LogcatFormatTest,
-    testing::Values(
-        FormatRow{"threadtime", "11-23 18:09:30.100  1234  1250 I velmora server: ",
-                  "11-23 18:09:31.600  1234  1251 I velmora server: "},
-        FormatRow{"threadtime", "12-31 23:59:59.100000  1234  1250 I velmora server: ",
-                  "01-01 00:00:00.600000  1234  1251 I velmora server: ", "-new-year-usec"},
-        FormatRow{"threadtime,monotonic,uid", "  5123.100  1000:  1234  1250 I velmora server: ",
-                  "  5124.600  1000:  1234  1251 I velmora server: "},
-        FormatRow{"time,year,uid", "2026-11-23 18:09:30.100 I/velmora server( 1000: 1234): ",
-                  "2026-11-23 18:09:31.600 I/velmora server( 1000: 1234): "},
-        FormatRow{"time,epoch", "1795457370.100000000 I/velmora server( 1234): ",
-                  "1795457371.600000000 I/velmora server( 1234): "}));
+    testing::Values(FormatRow{"threadtime", "11-23 18:09:30.100  1234  1250 I velmora server: ",
+                              "11-23 18:09:31.600  1234  1251 I velmora server: "},
+                    // Across the new year, in microseconds.
+                    FormatRow{"threadtime", "12-31 23:59:59.100000  1234  1250 I velmora server: ",
+                              "01-01 00:00:00.600000  1234  1251 I velmora server: "},
+                    FormatRow{"threadtime,monotonic,uid",
+                              "  5123.100  1000:  1234  1250 I velmora server: ",
+                              "  5124.600  1000:  1234  1251 I velmora server: "},
+                    FormatRow{"time,year,uid",
+                              "2026-11-23 18:09:30.100 I/velmora server( 1000: 1234): ",
+                              "2026-11-23 18:09:31.600 I/velmora server( 1000: 1234): "},
+                    FormatRow{"time,epoch", "1795457370.100000000 I/velmora server( 1234): ",
+                              "1795457371.600000000 I/velmora server( 1234): "}));
 
 // ---- Server lines to calls, in threadtime; line k is logged at k * 100 ms.
 
@@ -90,10 +87,6 @@ std::string threadtimeLog(const std::vector<std::pair<int, std::string>>& lines)
         log += prefix + lines[k].second + "\n";
     }
     return log;
-}
-
-void PrintTo(const LineRow& row, std::ostream* os) {
-    *os << row.name;
 }
 
 class ServerLinesTest : public testing::TestWithParam<LineRow> {};

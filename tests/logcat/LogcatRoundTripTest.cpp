@@ -89,7 +89,6 @@ TEST(LogcatRoundTripTest, ImportedMinuteReplaysLikeTheOriginal) {
         {"memlat.ratio_b", "event 20480: the log lacks the ratios (msg)"},
         {"memlat.ratio_l", "event 20480"},
     };
-    ASSERT_EQ(original.size(), imported.size());
     for (const auto& node : original) {
         const bool same = node.second == imported.at(node.first);
         EXPECT_EQ(differ.count(node.first) == 0, same)
