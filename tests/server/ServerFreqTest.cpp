@@ -49,6 +49,9 @@ TEST_F(ServerFreqTest, ClientCapIsMergedWithTheOtherClients) {
     EXPECT_EQ(setConfig(2, {2}, {0}), 0);
     EXPECT_EQ(lastSet().id, 2);
     EXPECT_EQ(lastSet().values, (Ints{1000000}));
+    // ZOLA raises its cap: KX's still holds, and JN's withdrawn 0 caps nothing.
+    EXPECT_EQ(setConfig(3, {2}, {2000000}), 0);
+    EXPECT_EQ(lastSet().values, (Ints{1800000}));
 }
 
 TEST_F(ServerFreqTest, RejectedClientRequestsAnswerThree) {
