@@ -18,7 +18,7 @@
 #include <string>
 #include <vector>
 
-#include "host/HostEnvironment.h"
+#include "host/platform/HostEnvironment.h"
 #include "server/VelmoraServer.h"
 #include "tools/replay/ReplaySession.h"
 #include "tools/replay/TraceParser.h"

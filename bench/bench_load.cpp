@@ -13,7 +13,7 @@
 
 #include "config/VelmoraLoadXml.h"
 #include "config/VelmoraParser.h"
-#include "host/HostEnvironment.h"
+#include "host/platform/HostEnvironment.h"
 
 namespace {
 

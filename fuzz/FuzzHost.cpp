@@ -6,7 +6,7 @@
 #include <cstdio>
 #include <cstdlib>
 
-#include "host/HostEnvironment.h"
+#include "host/platform/HostEnvironment.h"
 #include "server/VelmoraServer.h"
 
 namespace velmora {

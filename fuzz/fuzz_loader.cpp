@@ -8,7 +8,7 @@
 #include "config/VelmoraLoadXml.h"
 #include "config/VelmoraParser.h"
 #include "fuzz/FuzzHost.h"
-#include "host/HostEnvironment.h"
+#include "host/platform/HostEnvironment.h"
 
 namespace {
 

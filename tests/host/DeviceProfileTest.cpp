@@ -2,9 +2,9 @@
 // simulated device makes of written values: rounding between available frequencies and refusals.
 #include <gtest/gtest.h>
 
-#include "host/NodeMap.h"
-#include "host/profile/DeviceProfile.h"
-#include "host/profile/KernelRules.h"
+#include "host/device/NodeMap.h"
+#include "host/device/profile/DeviceProfile.h"
+#include "host/device/profile/KernelRules.h"
 
 namespace velmora {
 namespace {

@@ -2,10 +2,10 @@
 // their errors. (Writing only on change: HostExecutorTest's re-armed timer.)
 #include <gtest/gtest.h>
 
-#include "host/DeviceTree.h"
-#include "host/HostClock.h"
-#include "host/NodeMap.h"
-#include "host/Timeline.h"
+#include "host/device/DeviceTree.h"
+#include "host/time/HostClock.h"
+#include "host/device/NodeMap.h"
+#include "host/record/Timeline.h"
 #include "tests/host/HostTestSupport.h"
 
 namespace velmora {

@@ -8,11 +8,11 @@
 #include <memory>
 
 #include "config/Action.h"
-#include "host/DeviceTree.h"
-#include "host/HostClock.h"
-#include "host/HostExecutor.h"
-#include "host/NodeMap.h"
-#include "host/Timeline.h"
+#include "host/device/DeviceTree.h"
+#include "host/time/HostClock.h"
+#include "host/platform/HostExecutor.h"
+#include "host/device/NodeMap.h"
+#include "host/record/Timeline.h"
 #include "tests/host/HostTestSupport.h"
 
 namespace velmora {

@@ -7,7 +7,7 @@
 
 #include "config/VelmoraLoadXml.h"
 #include "config/VelmoraParser.h"
-#include "host/HostEnvironment.h"
+#include "host/platform/HostEnvironment.h"
 #include "tests/fakes/LogCapture.h"
 #include "tests/host/HostTestSupport.h"
 

@@ -11,7 +11,7 @@
 #include <string>
 #include <vector>
 
-#include "host/HostEnvironment.h"
+#include "host/platform/HostEnvironment.h"
 #include "tests/host/HostTestSupport.h"
 #include "tools/insight/ReplayInsight.h"
 #include "tools/replay/ComparisonRun.h"

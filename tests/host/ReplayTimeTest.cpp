@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-#include "host/HostEnvironment.h"
+#include "host/platform/HostEnvironment.h"
 #include "tests/host/HostTestSupport.h"
 #include "tools/replay/ReplaySession.h"
 

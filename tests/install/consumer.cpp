@@ -3,7 +3,7 @@
 //   velmora-consumer EXAMPLE_DIR DEVICE_ROOT    exit status: what the server's init returned
 #include <cstdio>
 
-#include "host/HostEnvironment.h"
+#include "host/platform/HostEnvironment.h"
 #include "server/VelmoraServer.h"
 
 int main(int argc, char** argv) {

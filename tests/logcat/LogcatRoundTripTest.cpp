@@ -11,7 +11,7 @@
 #include <sstream>
 #include <string>
 
-#include "host/HostEnvironment.h"
+#include "host/platform/HostEnvironment.h"
 #include "tests/host/HostTestSupport.h"
 #include "tools/logcat/LogcatImportCommand.h"
 #include "tools/replay/ReplaySession.h"

@@ -4,7 +4,7 @@
 #include <cstdio>
 #include <fstream>
 
-#include "host/Timeline.h"
+#include "host/record/Timeline.h"
 #include "tools/insight/InsightSummary.h"
 
 namespace velmora {

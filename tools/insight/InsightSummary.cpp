@@ -3,7 +3,7 @@
 #include <cstdio>
 #include <cstdlib>
 
-#include "host/Timeline.h"
+#include "host/record/Timeline.h"
 
 namespace velmora {
 

@@ -16,9 +16,9 @@
 #include <string>
 #include <vector>
 
-#include "host/ExecutorObserver.h"
-#include "host/HostClock.h"
-#include "host/NodeMap.h"
+#include "host/record/ExecutorObserver.h"
+#include "host/time/HostClock.h"
+#include "host/device/NodeMap.h"
 #include "tools/insight/InsightResult.h"
 #include "tools/insight/SourceLedger.h"
 

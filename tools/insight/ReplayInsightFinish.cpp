@@ -2,7 +2,7 @@
 #include <algorithm>
 #include <map>
 
-#include "host/Timeline.h"
+#include "host/record/Timeline.h"
 #include "tools/insight/ReplayInsight.h"
 
 namespace velmora {

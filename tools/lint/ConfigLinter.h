@@ -11,7 +11,7 @@
 #include <ostream>
 #include <string>
 
-#include "host/profile/DeviceProfile.h"
+#include "host/device/profile/DeviceProfile.h"
 #include "tools/lint/Diagnostics.h"
 
 namespace velmora {

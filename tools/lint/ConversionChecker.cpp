@@ -1,7 +1,7 @@
 #include "tools/lint/ConversionChecker.h"
 
-#include "host/ParamVocabulary.h"
-#include "host/Spelling.h"
+#include "host/vocabulary/ParamVocabulary.h"
+#include "tools/common/Spelling.h"
 
 namespace velmora {
 

@@ -1,6 +1,6 @@
 #include "tools/lint/Explainer.h"
 
-#include "host/ParamVocabulary.h"
+#include "host/vocabulary/ParamVocabulary.h"
 #include "tools/lint/CommandClass.h"
 #include "tools/lint/CommandRules.h"
 

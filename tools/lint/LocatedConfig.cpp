@@ -1,7 +1,7 @@
 #include "tools/lint/LocatedConfig.h"
 
 #include "config/DecimalText.h"
-#include "host/profile/XmlErrorText.h"
+#include "host/device/profile/XmlErrorText.h"
 
 #include <ctype.h>
 #include <tinyxml2.h>

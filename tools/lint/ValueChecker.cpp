@@ -3,9 +3,9 @@
 #include <map>
 
 #include "config/Tags.h"
-#include "host/ParamVocabulary.h"
-#include "host/Spelling.h"
-#include "host/profile/KernelRules.h"
+#include "host/vocabulary/ParamVocabulary.h"
+#include "tools/common/Spelling.h"
+#include "host/device/profile/KernelRules.h"
 #include "tools/lint/CommandClass.h"
 
 namespace velmora {

@@ -17,7 +17,7 @@
 #include <string>
 #include <vector>
 
-#include "host/NodeMap.h"
+#include "host/device/NodeMap.h"
 #include "tools/lint/Diagnostics.h"
 #include "tools/lint/LoadChecker.h"
 

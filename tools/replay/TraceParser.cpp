@@ -6,7 +6,7 @@
 #include <fstream>
 #include <sstream>
 
-#include "host/Spelling.h"
+#include "tools/common/Spelling.h"
 
 namespace velmora {
 

@@ -1,0 +1,109 @@
+#include "host/platform/HostEnvironment.h"
+
+#include <errno.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cstring>
+
+#include "probe/ProbeClock.h"
+#include "platform/VelmoraLog.h"
+#include "trace/Trace.h"
+
+namespace velmora {
+
+namespace {
+
+bool makeDirs(const std::string& dir) {
+    for (size_t pos = dir.find('/', 1);; pos = dir.find('/', pos + 1)) {
+        const std::string part = dir.substr(0, pos);
+        if (mkdir(part.c_str(), 0755) != 0 && errno != EEXIST) {
+            return false;
+        }
+        if (pos == std::string::npos) {
+            return true;
+        }
+    }
+}
+
+}  // namespace
+
+HostEnvironment& HostEnvironment::get() {
+    static HostEnvironment env;
+    return env;
+}
+
+HostEnvironment::HostEnvironment()
+    : mTimeline(mClock),
+      mTraceSink(mClock, mTimeline),
+      mDevice(mNodeMap, mTimeline),
+      mEventLog(mClock, mTimeline) {
+    mDevice.setRoot(defaultSimulatedRoot());
+    // The probe workers of servers built from now on read time and wait through mClock.
+    ProbeClock::setFactory(&HostEnvironment::createProbeClock);
+    Trace::setSink(&mTraceSink);
+}
+
+HostEnvironment::~HostEnvironment() {
+    Trace::setSink(nullptr);
+}
+
+std::string HostEnvironment::defaultSimulatedRoot() {
+    return "/tmp/velmora-sim-" + std::to_string(getpid());
+}
+
+void HostEnvironment::reset() {
+    mClock.setRealTime(1.0);
+    mTimeline.clear();
+    mNodeMap = NodeMap();
+    mProperties.reset();
+    mPolicies.clear();
+    mEventLog.setPath("");
+    mEventLog.clear();
+    mDevice.setRoot(defaultSimulatedRoot());
+    std::lock_guard<std::mutex> lock(mLock);
+    mPrepared = false;
+}
+
+int HostEnvironment::useDeviceRoot(const std::string& root, bool fresh) {
+    if (root.empty()) {
+        VLOGE("host: empty device root");
+        return -1;
+    }
+    mDevice.setRoot(root);
+    std::lock_guard<std::mutex> lock(mLock);
+    mPrepared = false;
+    if (root == "/") {
+        mPrepared = true;
+        return 0;
+    }
+    if (!makeDirs(root)) {
+        VLOGE("host: cannot create device root %s: %s", root.c_str(), strerror(errno));
+        return -1;
+    }
+    const std::string marker = root + "/.velmora-simulated";
+    struct stat st;
+    if (fresh || stat(marker.c_str(), &st) != 0) {
+        if (mDevice.seed() != 0) {
+            return -1;
+        }
+        FILE* file = fopen(marker.c_str(), "w");
+        if (file != nullptr) {
+            fclose(file);
+        }
+    }
+    mPrepared = true;
+    return 0;
+}
+
+int HostEnvironment::prepareDevice() {
+    {
+        std::lock_guard<std::mutex> lock(mLock);
+        if (mPrepared) {
+            return 0;
+        }
+    }
+    return useDeviceRoot(mDevice.root(), false);
+}
+
+}  // namespace velmora

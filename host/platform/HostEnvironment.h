@@ -1,0 +1,75 @@
+// The host program's handle on the host platform layer: the process-wide parts that the seam
+// functions (getPlat, property_get, get_one_cfg_file, the policy server, the device event log)
+// answer from, and that a host program configures before it initialises the server.
+//
+//     auto& env = velmora::HostEnvironment::get();
+//     env.useDeviceRoot("/tmp/sim", /*fresh=*/true);   // or "/" for the real nodes
+//     env.properties().setConfigDirs({"examples"});
+//     env.launchPolicies().set("cold", 1500);
+//     env.eventLog().setPath("events.log");
+//
+// The parts are thread safe on their own. useDeviceRoot and nodeMap changes must happen while
+// no platform object exists. The server's trace tracks go to the timeline from the moment the
+// environment exists (it installs its trace sink on construction).
+#pragma once
+
+#include <string>
+
+#include "host/device/DeviceTree.h"
+#include "host/record/EventLog.h"
+#include "host/time/HostClock.h"
+#include "host/platform/HostProperties.h"
+#include "host/platform/LaunchPolicyTable.h"
+#include "host/device/NodeMap.h"
+#include "host/record/Timeline.h"
+#include "host/record/TimelineTraceSink.h"
+
+namespace velmora {
+
+class ProbeClock;
+
+class HostEnvironment {
+public:
+    static HostEnvironment& get();
+
+    // Everything back to the defaults: real-time clock at speed 1, empty timeline and event
+    // log, default node map and properties, no policies, the default simulated device root.
+    void reset();
+
+    // Device root: "/" writes the real nodes; any other directory is a simulated device, seeded
+    // with every node's seed value when `fresh` (or when it was never seeded). 0 or -1 (logged).
+    int useDeviceRoot(const std::string& root, bool fresh);
+    // Makes sure the current root is usable (seeds the default simulated device on first use).
+    int prepareDevice();
+    // Directory of the default simulated device: /tmp/velmora-sim-<pid>.
+    static std::string defaultSimulatedRoot();
+
+    HostClock& clock() { return mClock; }
+    Timeline& timeline() { return mTimeline; }
+    NodeMap& nodeMap() { return mNodeMap; }
+    DeviceTree& device() { return mDevice; }
+    HostProperties& properties() { return mProperties; }
+    LaunchPolicyTable& launchPolicies() { return mPolicies; }
+    EventLog& eventLog() { return mEventLog; }
+
+    // The factory of the probe workers' clocks: each on this environment's clock.
+    static ProbeClock* createProbeClock();
+
+private:
+    HostEnvironment();
+    ~HostEnvironment();
+
+    // Declaration order is construction order: the later parts refer to the earlier ones.
+    HostClock mClock;
+    Timeline mTimeline;
+    TimelineTraceSink mTraceSink;
+    NodeMap mNodeMap;
+    DeviceTree mDevice;
+    HostProperties mProperties;
+    LaunchPolicyTable mPolicies;
+    EventLog mEventLog;
+    std::mutex mLock;  // guards mPrepared
+    bool mPrepared = false;
+};
+
+}  // namespace velmora
