@@ -62,13 +62,41 @@ TEST_P(ReplayTimeTest, FastAgreesWithRealTimeAndRepeatsExactly) {
 
     ASSERT_FALSE(fast.counters.empty());
     EXPECT_EQ(fast.timeline, again.timeline);
+    // Paced time is the same virtual time: the whole timeline agrees, not only the nodes.
+    EXPECT_EQ(fast.timeline, real.timeline);
     EXPECT_EQ(fast.summary, real.summary);
     EXPECT_EQ(fast.reports, real.reports);
     EXPECT_EQ(fast.counters, real.counters);
 }
 
 INSTANTIATE_TEST_SUITE_P(Traces, ReplayTimeTest,
-                         testing::Values("examples/minute.trace", "tests/host/data/probes.trace"));
+                         testing::Values("examples/minute.trace", "tests/host/data/probes.trace",
+                                         "tests/host/data/sleeps.trace"));
+
+// A paced replay whose trace ends in a sleep finishes; a time that goes backwards is named with
+// its line and the call runs at the time reached.
+TEST(ReplayPacedTest, EndsAfterTrailingSleepAndWarnsAboutTimeGoingBack) {
+    const std::string dir = hosttest::makeScratchDir("paced-sleep");
+    const std::string trace = dir + "/back.trace";
+    hosttest::writeFile(trace, "@100 event 4101 0\n@300 sleep 20\n@200 event 4101 -1\n@400 sleep 10\n");
+    ReplayOptions options = hosttest::replayOptions(dir, trace);
+    options.configDirs = {hosttest::examplesDir()};
+    options.fast = false;
+    options.speed = 20;
+    options.quiet = false;
+    FILE* out = fopen((dir + "/stdout.txt").c_str(), "w");
+    FILE* err = fopen((dir + "/stderr.txt").c_str(), "w");
+    ReplaySession session(options, out, err);
+    EXPECT_EQ(ReplaySession::kOk, session.run());
+    fclose(out);
+    fclose(err);
+    EXPECT_NE(std::string::npos,
+              hosttest::readFile(dir + "/stderr.txt")
+                  .find("back.trace:3: warning: @200 is before the time already reached (320 "
+                        "ms); the call runs at 320 ms"));
+    EXPECT_NE(std::string::npos,
+              hosttest::readFile(dir + "/stdout.txt").find("[      0.320] " + trace + ":3 @200 event 4101 -1 -> 0"));
+}
 
 }  // namespace
 }  // namespace velmora

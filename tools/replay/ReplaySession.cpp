@@ -63,7 +63,7 @@ int ReplaySession::setUp() {
     if (mOptions.fast) {
         env.clock().setVirtual();
     } else {
-        env.clock().setRealTime(mOptions.speed);
+        env.clock().setPaced(mOptions.speed);
     }
     std::string error;
     if (!mOptions.devicePath.empty()) {
@@ -92,6 +92,8 @@ int ReplaySession::setUp() {
     }
     const std::string root =
         mOptions.deviceRoot.empty() ? HostEnvironment::defaultSimulatedRoot() : mOptions.deviceRoot;
+    // A device root of our own making goes again at the end; one the user named stays.
+    mOwnedRoot = mOptions.deviceRoot.empty() ? root : std::string();
     if (env.useDeviceRoot(root, /*fresh=*/true) != 0) {
         fprintf(mErr, "velmora-replay: device root %s is not usable\n", root.c_str());
         return kSetupFailed;
@@ -183,8 +185,16 @@ int ReplaySession::perform(const TraceCall& call) {
 
 int ReplaySession::performCall(const TraceCall& call) {
     HostEnvironment& env = HostEnvironment::get();
-    // In virtual time this also lets the probe worker finish what the last call gave it, so a
-    // line without a time runs after it, as it would a moment later on a device.
+    if (call.atMs >= 0 && call.atMs < env.clock().nowMs()) {
+        fprintf(mErr,
+                "velmora-replay: %s:%d: warning: @%lld is before the time already reached "
+                "(%lld ms); the call runs at %lld ms\n",
+                call.file.c_str(), call.line, static_cast<long long>(call.atMs),
+                static_cast<long long>(env.clock().nowMs()),
+                static_cast<long long>(env.clock().nowMs()));
+    }
+    // This also lets the probe worker finish what the last call gave it, so a line without a
+    // time runs after it, as it would a moment later on a device.
     env.clock().advanceTo(call.atMs >= 0 ? call.atMs : env.clock().nowMs());
     int status = 0;
     std::string result;
@@ -248,20 +258,16 @@ int ReplaySession::replayFile() {
     if (setup != kOk)
         return setup;
     warnAboutCalls(calls);
-    // In real time the clock is held at the next timed call, so that calls are never late.
     HostClock& clock = HostEnvironment::get().clock();
     ProgressLine progress(mErr);
-    for (size_t i = 0; i < calls.size(); ++i) {
-        size_t next = i;
-        while (next < calls.size() && calls[next].atMs < 0) {
-            ++next;
+    for (const auto& call : calls) {
+        if (clock.interrupted()) {
+            break;
         }
-        clock.holdAt(next < calls.size() ? calls[next].atMs : HostClock::kNoDeadline);
-        perform(calls[i]);
+        perform(call);
         progress.update(clock.nowMs(), mCalls);
     }
     progress.clear();
-    clock.holdAt(HostClock::kNoDeadline);
     return kOk;
 }
 
@@ -344,6 +350,16 @@ void ReplaySession::tearDown() {
         plat->executor()->setObserver(nullptr);
     }
     mServer.reset();
+    removeOwnedRoot();
+}
+
+void ReplaySession::removeOwnedRoot() {
+    if (mOwnedRoot.empty())
+        return;
+    std::string error;
+    if (!HostEnvironment::get().removeSimulatedRoot(mOwnedRoot, &error))
+        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+    mOwnedRoot.clear();
 }
 
 void ReplaySession::finishInsight() {
@@ -446,6 +462,9 @@ int ReplaySession::run() {
     finishInsight();
     tearDown();
     HostEnvironment& env = HostEnvironment::get();
+    if (env.clock().interrupted())
+        fprintf(mOut, "\ninterrupted at %lld ms: what ran so far\n",
+                static_cast<long long>(env.clock().nowMs()));
     fprintf(mOut, "\n%d host calls, %d with a nonzero status, %zu report lines\n\n", mCalls,
             mFailed, env.eventLog().lines().size());
     fputs(summaryText().c_str(), mOut);

@@ -76,6 +76,8 @@ private:
     // configuration lacks, launch-policy names the server never asks for.
     void warnAboutCalls(const std::vector<TraceCall>& calls);
     void waitForProbeBoosts();
+    // Removes the simulated device root when this session made it.
+    void removeOwnedRoot();
     void echo(const TraceCall& call, const std::string& result);
     std::string commandName(int cmdId) const;
     int writeOutputs();
@@ -84,6 +86,7 @@ private:
     FILE* mOut;
     FILE* mErr;
     FILE* mInput;
+    std::string mOwnedRoot;  // the simulated device root made by setUp, removed at tear-down
     std::unique_ptr<VelmoraServer> mServer;
     std::unique_ptr<ReplayInsight> mInsight;  // watches the executor while the server runs
     InsightResult mResult;
