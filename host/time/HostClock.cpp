@@ -142,7 +142,17 @@ void HostClock::settle(std::unique_lock<std::mutex>& lock) {
     if (mBusy.load() == 0) {
         return;
     }
+    std::vector<std::shared_ptr<Worker>> toWake;
+    for (auto& entry : mWorkers) {
+        if (entry.second->wakePending) {
+            entry.second->wakePending = false;
+            toWake.push_back(entry.second);
+        }
+    }
     lock.unlock();
+    for (const auto& worker : toWake) {
+        worker->wake.notify_one();
+    }
     for (int i = 0; i < kSettleYields && mBusy.load() != 0; ++i) {
         sched_yield();
     }
@@ -228,7 +238,8 @@ void HostClock::setStateLocked(Worker& worker, WorkerState state) {
     const bool isBusy = countsAsBusy(worker);
     if (isBusy && !wasBusy) {
         ++mBusy;
-        worker.wake.notify_one();
+        worker.freshPass = true;
+        worker.wakePending = true;
     } else if (wasBusy && !isBusy && --mBusy == 0) {
         mSettled.notify_all();
     }
@@ -246,7 +257,7 @@ void HostClock::markExitingLocked(Worker& worker) {
 int HostClock::attachWorker(int64_t lookAheadUs) {
     std::lock_guard<std::mutex> lock(mLock);
     const int id = mNextId++;
-    auto worker = std::make_unique<Worker>();
+    auto worker = std::make_shared<Worker>();
     worker->lookAheadUs = lookAheadUs;
     mWorkers[id] = std::move(worker);
     ++mBusy;  // about to make its first pass
@@ -266,8 +277,14 @@ void HostClock::detachWorker(int id) {
 int64_t HostClock::workerNowUs(int id) {
     std::lock_guard<std::mutex> lock(mLock);
     auto it = mWorkers.find(id);
-    if (it != mWorkers.end() && it->second->lookAheadUs > 0) {
-        mLookAheads.insert(mNowUs + it->second->lookAheadUs);
+    if (it == mWorkers.end()) {
+        return mNowUs;
+    }
+    Worker& worker = *it->second;
+    if (worker.freshPass && worker.thread == std::this_thread::get_id()) {
+        worker.freshPass = false;
+    } else if (worker.lookAheadUs > 0) {
+        mLookAheads.insert(mNowUs + worker.lookAheadUs);
     }
     return mNowUs;
 }
@@ -279,6 +296,13 @@ void HostClock::workerSleep(int id, int64_t ms) {
         return;
     }
     Worker& worker = *it->second;
+    worker.thread = std::this_thread::get_id();
+    if (ms <= 0 && worker.again) {
+        worker.again = false;
+        worker.freshPass = true;
+        return;
+    }
+    worker.again = false;
     worker.wakeUs = mNowUs + std::max<int64_t>(ms, 0) * 1000;
     setStateLocked(worker, ms > 0 ? WorkerState::Sleeping : WorkerState::Polling);
     worker.wake.wait(lock,
@@ -293,6 +317,8 @@ void HostClock::workerWait(int id, const std::function<void()>& release,
         return;
     }
     Worker& worker = *it->second;
+    worker.thread = std::this_thread::get_id();
+    worker.again = false;
     setStateLocked(worker, WorkerState::Waiting);
     // Signals come with the caller's mutex held, so none is lost between here and the wait.
     release();
@@ -305,9 +331,14 @@ void HostClock::workerWait(int id, const std::function<void()>& release,
 void HostClock::workerSignal(int id) {
     std::lock_guard<std::mutex> lock(mLock);
     auto it = mWorkers.find(id);
-    if (it != mWorkers.end() && (it->second->state == WorkerState::Waiting ||
-                                 it->second->state == WorkerState::Polling)) {
-        setStateLocked(*it->second, WorkerState::Busy);
+    if (it == mWorkers.end()) {
+        return;
+    }
+    Worker& worker = *it->second;
+    if (worker.state == WorkerState::Waiting || worker.state == WorkerState::Polling) {
+        setStateLocked(worker, WorkerState::Busy);
+    } else if (worker.state == WorkerState::Busy) {
+        worker.again = true;
     }
 }
 

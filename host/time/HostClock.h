@@ -31,6 +31,7 @@
 #include <memory>
 #include <mutex>
 #include <set>
+#include <thread>
 
 namespace velmora {
 
@@ -74,7 +75,8 @@ public:
     void removeListener(int id);
 
     // Worker side. attachWorker registers a worker that is about to make its first pass (busy);
-    // `lookAheadUs` is how long after any time read through workerNowUs it may have business.
+    // `lookAheadUs` is how long after a time read through workerNowUs it may have business
+    // (every read but the one the worker starts a pass with may stamp an item).
     int attachWorker(int64_t lookAheadUs);
     void detachWorker(int id);
     int64_t workerNowUs(int id);
@@ -102,6 +104,18 @@ private:
         int64_t wakeUs = 0;  // Sleeping: when it wakes
         int64_t lookAheadUs = 0;
         bool exiting = false;
+        // The worker's own thread, known from its first sleep or wait.
+        std::thread::id thread;
+        // Busy since its last wake-up and not read the time yet: that read starts a pass and
+        // stamps nothing, so it needs no look-ahead.
+        bool freshPass = false;
+        // Signalled while busy: the signal found the worker mid-pass, so a worker that polls
+        // makes one more pass at once, as a polling thread would.
+        bool again = false;
+        // Made busy but not woken yet: the advancing thread wakes it when it settles, holding
+        // no lock, so that neither a signaller nor the advance is preempted by a worker that
+        // would only block on their locks.
+        bool wakePending = false;
         std::condition_variable wake;  // state left Sleeping/Polling/Waiting, or exiting
     };
 
@@ -134,7 +148,7 @@ private:
     std::chrono::steady_clock::time_point mStart;
     int64_t mNowUs = 0;
     int mNextId = 1;
-    std::map<int, std::unique_ptr<Worker>> mWorkers;
+    std::map<int, std::shared_ptr<Worker>> mWorkers;
     std::set<int64_t> mLookAheads;  // instants (us) a polling worker must look at
     // Busy workers, also read without mLock by an advance that spins briefly before it blocks.
     std::atomic<int> mBusy{0};

@@ -20,6 +20,7 @@
 #include "tools/insight/InsightSummary.h"
 #include "tools/insight/ReplayInsight.h"
 #include "tools/replay/ProgressLine.h"
+#include "tools/replay/SameCpuScope.h"
 
 namespace velmora {
 
@@ -112,6 +113,8 @@ int ReplaySession::setUp() {
         if (env.device().read(node.key, &text) && mInsight != nullptr)
             mInsight->setInitial(node.key, text);
     }
+    if (mOptions.fast)
+        mSameCpu.reset(new SameCpuScope());
     mServer.reset(new VelmoraServer());
     const int status = mServer->init();
     if (auto* plat = dynamic_cast<HostPlatform*>(mServer->mPlatPtr); plat && mInsight) {
@@ -125,6 +128,7 @@ int ReplaySession::setUp() {
                 "velmora-lint %s\n",
                 status, env.properties().findConfigFile("xml/velmora_config_cust.xml").c_str());
         mServer.reset();
+        mSameCpu.reset();
         return kSetupFailed;
     }
     return kOk;
@@ -350,6 +354,7 @@ void ReplaySession::tearDown() {
         plat->executor()->setObserver(nullptr);
     }
     mServer.reset();
+    mSameCpu.reset();
     removeOwnedRoot();
 }
 

@@ -20,6 +20,7 @@ class VelmoraServer;
 namespace velmora {
 
 class ReplayInsight;
+class SameCpuScope;
 
 struct ReplayOptions {
     std::string tracePath;                // ignored when interactive
@@ -87,6 +88,8 @@ private:
     FILE* mErr;
     FILE* mInput;
     std::string mOwnedRoot;  // the simulated device root made by setUp, removed at tear-down
+    // --fast: the replay thread and the probe worker share one processor (SameCpuScope.h).
+    std::unique_ptr<SameCpuScope> mSameCpu;
     std::unique_ptr<VelmoraServer> mServer;
     std::unique_ptr<ReplayInsight> mInsight;  // watches the executor while the server runs
     InsightResult mResult;
