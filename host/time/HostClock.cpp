@@ -68,9 +68,10 @@ int64_t HostClock::nowMs() const {
 
 int64_t HostClock::wallUs() const {
     std::lock_guard<std::mutex> lock(mLock);
-    if (!mPaced) {
-        return mNowUs;
-    }
+    return mPaced ? wallUsLocked() : mNowUs;
+}
+
+int64_t HostClock::wallUsLocked() const {
     const auto real = std::chrono::duration_cast<std::chrono::microseconds>(
         std::chrono::steady_clock::now() - mStart);
     return static_cast<int64_t>(static_cast<double>(real.count()) * mSpeed);
@@ -122,8 +123,14 @@ void HostClock::advanceUs(int64_t targetUs) {
         if (mNowUs >= targetUs) {
             return;
         }
+        if (mPaced && mInterrupted.load()) {
+            // Stop where the wall clock has got to, and stop pacing for good.
+            targetUs = std::min(targetUs, std::max(mNowUs, wallUsLocked()));
+            mPaced = false;
+            continue;
+        }
         const int64_t next = std::min({targetUs, listenerUs, workerDueUsLocked()});
-        if (mPaced && !mInterrupted.load()) {
+        if (mPaced) {
             const auto wall = wallOf(next);
             const auto now = std::chrono::steady_clock::now();
             if (now < wall) {

@@ -63,8 +63,9 @@ public:
     // settles the current instant: busy workers finish their pass and what is due has run.
     void advanceTo(int64_t ms);
 
-    // Stops pacing at once, also in the middle of a wait: from now on advances do not wait for
-    // the wall clock. Only sets an atomic flag, so a signal handler may call it.
+    // Stops pacing at once, also in the middle of a wait: an advance under way stops at the
+    // time the wall clock has reached, and later ones do not wait for the wall clock. Only sets
+    // an atomic flag, so a signal handler may call it.
     void interrupt();
     bool interrupted() const;
 
@@ -134,6 +135,8 @@ private:
     static bool countsAsBusy(const Worker& worker) {
         return worker.state == WorkerState::Busy && !worker.exiting;
     }
+    // Paced: how far the wall clock has got, in trace microseconds.
+    int64_t wallUsLocked() const;
     // Paced: the wall-clock instant of trace time `us`.
     std::chrono::steady_clock::time_point wallOf(int64_t us) const;
 

@@ -19,6 +19,7 @@
 #include "tools/insight/InsightJson.h"
 #include "tools/insight/InsightSummary.h"
 #include "tools/insight/ReplayInsight.h"
+#include "tools/replay/PacedLineReader.h"
 #include "tools/replay/ProgressLine.h"
 #include "tools/replay/SameCpuScope.h"
 
@@ -35,6 +36,8 @@ constexpr const char* kWinSwitchPolicy = kWinSwitchPolicyName;
 constexpr int64_t kProbeDrainLimitMs = 1000;
 constexpr int64_t kProbeDrainStepMs = 1;
 constexpr int64_t kProbeSettleMs = 20;
+// How often a paced interactive replay brings the device up to the wall clock between lines.
+constexpr int kInteractiveTickMs = 10;
 
 std::string directoryOf(const std::string& path) {
     const size_t slash = path.find_last_of('/');
@@ -200,6 +203,8 @@ int ReplaySession::performCall(const TraceCall& call) {
     // This also lets the probe worker finish what the last call gave it, so a line without a
     // time runs after it, as it would a moment later on a device.
     env.clock().advanceTo(call.atMs >= 0 ? call.atMs : env.clock().nowMs());
+    if (env.clock().interrupted())
+        return 0;  // interrupted on the way: the call never came
     int status = 0;
     std::string result;
     switch (call.kind) {
@@ -280,12 +285,28 @@ int ReplaySession::replayInteractive() {
     if (setup != kOk)
         return setup;
     int result = kOk;
-    char buffer[4096];
     int lineNo = 0;
-    while (fgets(buffer, sizeof(buffer), mInput) != nullptr) {
-        std::string line(buffer);
-        if (!line.empty() && line.back() == '\n')
-            line.pop_back();
+    HostClock& clock = HostEnvironment::get().clock();
+    // Paced, the device follows the wall clock between lines too; unpaced, time moves only
+    // with the "@" stamps of the lines.
+    const bool paced = clock.paced() && fileno(mInput) >= 0;
+    auto catchUp = [&clock] { clock.advanceTo(clock.wallUs() / 1000); };
+    PacedLineReader reader(paced ? fileno(mInput) : -1, catchUp, kInteractiveTickMs);
+    auto stop = [&clock] { return clock.interrupted(); };
+    std::string line;
+    char buffer[4096];
+    for (;;) {
+        if (paced) {
+            if (!reader.next(&line, stop))
+                break;
+            catchUp();
+        } else {
+            if (clock.interrupted() || fgets(buffer, sizeof(buffer), mInput) == nullptr)
+                break;
+            line = buffer;
+            if (!line.empty() && line.back() == '\n')
+                line.pop_back();
+        }
         std::vector<TraceCall> calls;
         std::string error;
         if (TraceParser::parseLine(line, "<stdin>", ++lineNo, &calls, &error) != 0) {

@@ -1,10 +1,13 @@
 // velmora-replay: replays an event trace against the server on the host platform layer.
 // See docs/replay.md for the trace format.
+#include <signal.h>
+
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <string>
 
+#include "host/platform/HostEnvironment.h"
 #include "tools/replay/ComparisonRun.h"
 #include "tools/replay/InstalledExample.h"
 #include "tools/replay/ReplaySession.h"
@@ -36,6 +39,30 @@ void usage(FILE* to) {
         "  --interactive        read calls from stdin\n",
         to);
 }
+
+// Ctrl-C (or a polite kill) during a replay: the clock stops pacing and the replay stops after
+// the call in progress, then reports what ran so far and cleans up. A second one ends the
+// process at once.
+velmora::HostClock* gClock = nullptr;
+
+void onInterrupt(int) {
+    if (gClock != nullptr) {
+        gClock->interrupt();
+    }
+}
+
+void catchInterrupts() {
+    gClock = &velmora::HostEnvironment::get().clock();
+    struct sigaction action = {};
+    action.sa_handler = onInterrupt;
+    action.sa_flags = SA_RESETHAND;  // no SA_RESTART: a read of stdin ends with EINTR
+    sigemptyset(&action.sa_mask);
+    sigaction(SIGINT, &action, nullptr);
+    sigaction(SIGTERM, &action, nullptr);
+}
+
+// Exit status after an interrupt, as a shell reports a process ended by SIGINT.
+constexpr int kInterrupted = 130;
 
 }  // namespace
 
@@ -117,6 +144,8 @@ int main(int argc, char** argv) {
         velmora::ComparisonRun comparison(options, compareDir, stdout, stderr);
         return comparison.run();
     }
+    catchInterrupts();
     velmora::ReplaySession session(options, stdout, stderr);
-    return session.run();
+    const int status = session.run();
+    return gClock->interrupted() ? kInterrupted : status;
 }
