@@ -3,9 +3,13 @@
 // write byte-identical timelines.
 #include <gtest/gtest.h>
 
+#include <unistd.h>
+
+#include <chrono>
 #include <cstdio>
 #include <sstream>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "host/platform/HostEnvironment.h"
@@ -96,6 +100,50 @@ TEST(ReplayPacedTest, EndsAfterTrailingSleepAndWarnsAboutTimeGoingBack) {
                         "ms); the call runs at 320 ms"));
     EXPECT_NE(std::string::npos,
               hosttest::readFile(dir + "/stdout.txt").find("[      0.320] " + trace + ":3 @200 event 4101 -1 -> 0"));
+}
+
+// A paced interactive replay keeps the device up to the wall clock while nobody types: the
+// window switch's 400 ms action ends at its own trace time, before the next line arrives.
+TEST(ReplayPacedTest, InteractiveDeviceFollowsTheWallClockBetweenLines) {
+    const std::string dir = hosttest::makeScratchDir("paced-interactive");
+    ReplayOptions options = hosttest::replayOptions(dir, "");
+    options.interactive = true;
+    options.configDirs = {hosttest::examplesDir()};
+    options.fast = false;
+    options.speed = 10;
+    options.quiet = false;
+    int fds[2];
+    ASSERT_EQ(0, pipe(fds));
+    FILE* input = fdopen(fds[0], "r");
+    const std::string littleMin = HostEnvironment::get().nodeMap().find("cpu.little.min")->path;
+    std::string whileWaiting;
+    std::thread typist([fd = fds[1], &dir, &littleMin, &whileWaiting] {
+        const std::string first = "event 4098 0\n";
+        const std::string second = "getconfig 22\n";
+        EXPECT_EQ(static_cast<ssize_t>(first.size()), write(fd, first.data(), first.size()));
+        std::this_thread::sleep_for(std::chrono::milliseconds(80));  // 800 trace ms
+        whileWaiting = hosttest::readFile(dir + "/device/" + littleMin);
+        EXPECT_EQ(static_cast<ssize_t>(second.size()), write(fd, second.data(), second.size()));
+        close(fd);
+    });
+    FILE* out = fopen((dir + "/stdout.txt").c_str(), "w");
+    ReplaySession session(options, out, stderr, input);
+    EXPECT_EQ(ReplaySession::kOk, session.run());
+    typist.join();
+    fclose(out);
+    fclose(input);
+
+    const SpanInsight* window = nullptr;
+    for (const auto& span : session.insight().spans) {
+        if (span.name.find("4098") != std::string::npos)
+            window = &span;
+    }
+    ASSERT_NE(nullptr, window);
+    EXPECT_EQ(400000, window->endUs - window->beginUs);
+    EXPECT_EQ("300000", whileWaiting);  // reverted before anyone typed again
+    ASSERT_EQ(2u, session.insight().calls.size());
+    EXPECT_GE(session.insight().calls[1].us, 800000);
+    EXPECT_LT(window->endUs, session.insight().calls[1].us);
 }
 
 }  // namespace
