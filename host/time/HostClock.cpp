@@ -57,6 +57,13 @@ void HostClock::restart() {
     mInterrupted = false;
 }
 
+void HostClock::alignWall() {
+    std::lock_guard<std::mutex> lock(mLock);
+    mStart = std::chrono::steady_clock::now() -
+             std::chrono::duration_cast<std::chrono::steady_clock::duration>(
+                 std::chrono::duration<double, std::micro>(static_cast<double>(mNowUs) / mSpeed));
+}
+
 int64_t HostClock::nowUs() const {
     std::lock_guard<std::mutex> lock(mLock);
     return mNowUs;

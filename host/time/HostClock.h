@@ -50,6 +50,9 @@ public:
     double speed() const;
     // Time back to 0 (and the wall clock's start to now), the mode kept, an interrupt cleared.
     void restart();
+    // Paced: from now on the wall clock counts from the current trace time, as if pacing began
+    // here (set-up that took wall time does not make the first instants late).
+    void alignWall();
 
     int64_t nowMs() const;
     int64_t nowUs() const;

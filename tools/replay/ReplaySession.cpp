@@ -124,6 +124,7 @@ int ReplaySession::setUp() {
         plat->executor()->setObserver(mInsight.get());
     }
     fprintf(mOut, "init -> %d (device %s)\n", status, root.c_str());
+    env.clock().alignWall();  // trace time 0 is the end of the initialisation
     // 4 means the probe command is missing; everything else is running.
     if (status != 0 && status != 4) {
         fprintf(mErr,
