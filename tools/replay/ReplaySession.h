@@ -21,6 +21,7 @@ namespace velmora {
 
 class ReplayInsight;
 class SameCpuScope;
+class TraceSurvey;
 
 struct ReplayOptions {
     std::string tracePath;                // ignored when interactive
@@ -74,8 +75,9 @@ private:
     int replayFile();
     int replayInteractive();
     // Warns (on `err`) about calls that are valid but surely not meant: events of commands the
-    // configuration lacks, launch-policy names the server never asks for.
-    void warnAboutCalls(const std::vector<TraceCall>& calls);
+    // configuration lacks, launch-policy names the server never asks for; once per command or
+    // name, where it is first used.
+    void warnAboutCalls(const TraceSurvey& survey);
     void waitForProbeBoosts();
     // Removes the simulated device root when this session made it.
     void removeOwnedRoot();
