@@ -185,7 +185,7 @@ std::string HtmlReport::html(const InsightResult& result) {
         "<!DOCTYPE html>\n<html><head><meta charset=\"utf-8\"><title>velmora replay "
         "report</title>\n<style>" +
         std::string(kStyle) + "</style></head>\n<body>\n<h1>Replay report</h1>\n<p>" +
-        num(result.endUs / 1000.0) + " ms of trace, " + std::to_string(result.calls.size()) +
+        num(result.endUs / 1000.0) + " ms of trace, " + std::to_string(result.callCount) +
         " calls. Shaded: <span style=\"background:" + spanFill("scene") +
         "\">scenes</span> <span style=\"background:" + spanFill("onoff") +
         "\">on/off commands</span> <span style=\"background:" + spanFill("action") +

@@ -60,7 +60,7 @@ nlohmann::json InsightJson::summary(const InsightResult& result) {
                             {"call", callJson(warning.call)}});
     }
     return {{"trace_ms", ms(result.endUs)},
-            {"calls", result.calls.size()},
+            {"calls", result.callCount},
             {"nodes", nodes},
             {"spans", spans},
             {"warnings", warnings}};

@@ -93,7 +93,7 @@ InsightResult ReplayInsight::finish() {
         }
         result.nodes.push_back(std::move(node));
     }
-    result.spans = mSpans;
+    result.spans = std::move(mSpans);
     for (const auto& entry : mApplied) {
         result.spans.push_back(
             {"", entry.second.category, entry.second.name, entry.second.beginUs, end, true});
@@ -110,10 +110,12 @@ InsightResult ReplayInsight::finish() {
     }
     packIntoLanes(&result.spans);
     stuckWarningsLocked(&result);
-    // finish() ends the analysis: the per-call records move out rather than being copied.
+    // finish() ends the analysis: the records move out rather than being copied.
+    result.callCount = mCallCount;
     result.callDigests = std::move(mDigests);
     result.callStatus = std::move(mStatus);
-    result.calls = std::move(mCalls);
+    result.divergentCall = mDivergentCall;
+    result.divergentStatus = mDivergentStatus;
     return result;
 }
 

@@ -82,6 +82,7 @@ int ComparisonRun::run() {
     ReplayOptions a = mOptions;
     a.fast = true;
     a.summaryJsonPath.clear();
+    a.keepCallDigests = true;
     ReplaySession sessionA(a, mOut, mErr);
     const int resultA = sessionA.run();
     if (resultA != ReplaySession::kOk)
@@ -89,6 +90,8 @@ int ComparisonRun::run() {
     const InsightResult insightA = sessionA.insight();
 
     ReplayOptions b = a;
+    b.keepCallDigests = false;
+    b.compareWithDigests = insightA.callDigests;
     b.configDirs = {mCompareDir};
     b.writeFiles = false;
     b.eventLogPath = "/dev/null";

@@ -266,6 +266,10 @@ int ReplaySession::replayFile() {
     const int setup = setUp();
     if (setup != kOk)
         return setup;
+    if (mInsight != nullptr && mOptions.keepCallDigests)
+        mInsight->keepCallDigests();
+    if (mInsight != nullptr && !mOptions.compareWithDigests.empty())
+        mInsight->compareWith(std::move(mOptions.compareWithDigests));
     warnAboutCalls(survey);
     HostClock& clock = HostEnvironment::get().clock();
     ProgressLine progress(mErr);

@@ -5,6 +5,7 @@
 // Used by the velmora-replay program and by the end-to-end tests; single threaded.
 #pragma once
 
+#include <cstdint>
 #include <cstdio>
 #include <map>
 #include <memory>
@@ -40,6 +41,10 @@ struct ReplayOptions {
     std::string reportPath;       // self-contained HTML report; optional
     bool writeFiles = true;       // false: timeline, summary JSON and report are not written
     bool insight = true;          // false: no analysis (the plain summary), for measuring its cost
+    // Comparing two runs (ComparisonRun): the first keeps every call's digest, the second is
+    // compared with them as it goes. A plain replay keeps nothing per call.
+    bool keepCallDigests = false;
+    std::vector<uint64_t> compareWithDigests;
 };
 
 class ReplaySession {
