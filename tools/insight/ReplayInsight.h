@@ -19,6 +19,7 @@
 #include "host/device/NodeMap.h"
 #include "host/record/ExecutorObserver.h"
 #include "host/time/HostClock.h"
+#include "tools/insight/ChangeHolders.h"
 #include "tools/insight/InsightResult.h"
 #include "tools/insight/SourceLedger.h"
 
@@ -63,8 +64,7 @@ public:
     static std::string holderAt(const InsightResult& result, const std::string& key, int64_t us);
     // Per node, the holder of the value it took in each change (index 0: the initial value),
     // matching the timeline's samples one to one.
-    static std::map<std::string, std::vector<std::string>> holdersByChange(
-        const InsightResult& result);
+    static ChangeHolders holdersByChange(const InsightResult& result);
 
     // ExecutorObserver
     void onCommandApplied(int cmdId, const std::string& category, const std::string& name,

@@ -170,17 +170,16 @@ std::string ReplayInsight::holderAt(const InsightResult& result, const std::stri
     return holder;
 }
 
-std::map<std::string, std::vector<std::string>> ReplayInsight::holdersByChange(
-    const InsightResult& result) {
-    std::map<std::string, std::vector<std::string>> out;
+ChangeHolders ReplayInsight::holdersByChange(const InsightResult& result) {
+    ChangeHolders out;
     for (const auto& node : result.nodes) {
-        std::vector<std::string>& holders = out[node.key];
         for (size_t i = 0; i < node.segments.size(); ++i) {
             const HolderSegment& segment = node.segments[i];
             if (i == 0 || segment.value != node.segments[i - 1].value) {
-                holders.push_back(segment.heldBy);
+                out.add(node.key, segment.heldBy);
             } else if (segment.fromUs == node.segments[i - 1].fromUs) {
-                holders.back() = segment.heldBy;  // the holder changed in the same instant
+                out.replaceLast(node.key,
+                                segment.heldBy);  // the holder changed in the same instant
             }
         }
     }

@@ -113,8 +113,7 @@ int ComparisonRun::run() {
     fprintf(mOut, "\n%s", comparison.text().c_str());
     if (!mOptions.summaryJsonPath.empty()) {
         std::string why;
-        if (!InsightJson::write(InsightJson::comparison(comparison), mOptions.summaryJsonPath,
-                                &why)) {
+        if (!InsightJson::writeComparison(comparison, mOptions.summaryJsonPath, &why)) {
             fprintf(mErr, "velmora-replay: %s\n", why.c_str());
             return ReplaySession::kSetupFailed;
         }

@@ -406,13 +406,9 @@ void ReplaySession::finishInsight() {
     for (const auto& span : mResult.spans) {
         timeline.recordSpan(span.track, span.category, span.name, span.beginUs, span.endUs);
     }
-    auto holders = std::make_shared<std::map<std::string, std::vector<std::string>>>(
-        ReplayInsight::holdersByChange(mResult));
-    timeline.setCounterSource([holders](const std::string& key, size_t sample) {
-        auto it = holders->find(key);
-        return it != holders->end() && sample < it->second.size() ? it->second[sample]
-                                                                  : std::string();
-    });
+    auto holders = std::make_shared<const ChangeHolders>(ReplayInsight::holdersByChange(mResult));
+    timeline.setCounterSource(
+        [holders](const std::string& key, size_t sample) { return holders->at(key, sample); });
 }
 
 bool ReplaySession::checkWritable(const std::string& path, std::string* error) {
@@ -435,7 +431,7 @@ int ReplaySession::writeOutputs() {
     std::string error;
     if (!env.timeline().writeChromeJson(mOptions.timelinePath, &error) ||
         (!mOptions.summaryJsonPath.empty() &&
-         !InsightJson::write(InsightJson::summary(mResult), mOptions.summaryJsonPath, &error)) ||
+         !InsightJson::writeSummary(mResult, mOptions.summaryJsonPath, &error)) ||
         (!mOptions.reportPath.empty() &&
          !HtmlReport::write(mResult, mOptions.reportPath, &error))) {
         fprintf(mErr, "velmora-replay: %s\n", error.c_str());
