@@ -3,55 +3,12 @@
 #include <cstdio>
 #include <cstdlib>
 #include <fstream>
+#include <sstream>
+
+#include "host/record/SpoolRecord.h"
+#include "host/record/TimelineJson.h"
 
 namespace velmora {
-
-namespace {
-
-constexpr int kNodePid = 1;
-constexpr int kEventPid = 2;
-constexpr int kServerPid = 3;
-
-std::string jsonEscape(const std::string& in) {
-    std::string out;
-    out.reserve(in.size() + 2);
-    for (char c : in) {
-        switch (c) {
-            case '"':
-                out += "\\\"";
-                break;
-            case '\\':
-                out += "\\\\";
-                break;
-            case '\n':
-                out += "\\n";
-                break;
-            case '\r':
-                out += "\\r";
-                break;
-            case '\t':
-                out += "\\t";
-                break;
-            default:
-                if (static_cast<unsigned char>(c) < 0x20) {
-                    char buf[8];
-                    snprintf(buf, sizeof(buf), "\\u%04x", static_cast<unsigned char>(c));
-                    out += buf;
-                } else {
-                    out += c;
-                }
-        }
-    }
-    return out;
-}
-
-std::string formatNumber(double v) {
-    char buf[64];
-    snprintf(buf, sizeof(buf), "%.17g", v);
-    return buf;
-}
-
-}  // namespace
 
 bool parseNodeNumber(const std::string& text, double* value) {
     size_t begin = text.find_first_not_of(" \t\n");
@@ -74,17 +31,19 @@ Timeline::Timeline(HostClock& clock) : mClock(clock) {}
 void Timeline::clear() {
     std::lock_guard<std::mutex> lock(mLock);
     mTracks.clear();
-    mInstants.clear();
+    mValues.clear();
+    mValueIds.clear();
     mCounters.clear();
-    mSlices.clear();
-    mSpans.clear();
+    mSpool.clear();
     mCounterSource = nullptr;
 }
 
 void Timeline::recordSpan(const std::string& track, const std::string& category,
                           const std::string& name, int64_t beginUs, int64_t endUs) {
+    SpoolRecord record;
+    record.add(track).add(category).add(name).add(beginUs).add(endUs);
     std::lock_guard<std::mutex> lock(mLock);
-    mSpans.push_back({track, category, name, beginUs, endUs});
+    mSpool.append(kSpanGroup, record.bytes());
 }
 
 void Timeline::setCounterSource(CounterSource source) {
@@ -92,7 +51,7 @@ void Timeline::setCounterSource(CounterSource source) {
     mCounterSource = std::move(source);
 }
 
-Timeline::Track* Timeline::findTrack(const std::string& key) {
+Timeline::Track* Timeline::findTrackLocked(const std::string& key) {
     for (auto& track : mTracks) {
         if (track.key == key) {
             return &track;
@@ -101,12 +60,34 @@ Timeline::Track* Timeline::findTrack(const std::string& key) {
     return nullptr;
 }
 
+uint32_t Timeline::valueLocked(const std::string& text) {
+    auto it = mValueIds.find(text);
+    if (it != mValueIds.end())
+        return it->second;
+    Value value;
+    value.text = text;
+    value.numeric = parseNodeNumber(text, &value.number);
+    mValues.push_back(value);
+    const uint32_t id = static_cast<uint32_t>(mValues.size() - 1);
+    mValueIds.emplace(text, id);
+    return id;
+}
+
+size_t Timeline::counterGroupLocked(const std::string& track) {
+    for (size_t i = 0; i < mCounters.size(); ++i) {
+        if (mCounters[i] == track)
+            return kFirstCounterGroup + i;
+    }
+    mCounters.push_back(track);
+    return kFirstCounterGroup + mCounters.size() - 1;
+}
+
 void Timeline::recordInitial(const std::string& key, const std::string& path,
                              const std::string& text) {
     const int64_t now = mClock.nowUs();
     std::lock_guard<std::mutex> lock(mLock);
-    if (findTrack(key) == nullptr) {
-        mTracks.push_back({key, path, {{now, text}}});
+    if (findTrackLocked(key) == nullptr) {
+        mTracks.push_back({key, path, {{now, valueLocked(text)}}});
     }
 }
 
@@ -114,51 +95,64 @@ void Timeline::recordWrite(const std::string& key, const std::string& path,
                            const std::string& text) {
     const int64_t now = mClock.nowUs();
     std::lock_guard<std::mutex> lock(mLock);
-    Track* track = findTrack(key);
+    Track* track = findTrackLocked(key);
     if (track == nullptr) {
         // A write to a node nobody read first: its initial value is unknown, keep the write.
-        mTracks.push_back({key, path, {{now, text}}});
+        mTracks.push_back({key, path, {{now, valueLocked(text)}}});
         return;
     }
-    track->samples.push_back({now, text});
+    track->samples.push_back({now, valueLocked(text)});
 }
 
 void Timeline::recordInstant(const std::string& category, const std::string& name) {
-    const int64_t now = mClock.nowUs();
+    SpoolRecord record;
+    record.add(mClock.nowUs()).add(category).add(name);
     std::lock_guard<std::mutex> lock(mLock);
-    mInstants.push_back({now, category, name});
+    mSpool.append(kInstantGroup, record.bytes());
 }
 
 void Timeline::recordCounter(const std::string& track, int64_t value) {
-    const int64_t now = mClock.nowUs();
+    SpoolRecord record;
+    record.add(mClock.nowUs()).add(value);
     std::lock_guard<std::mutex> lock(mLock);
-    for (auto& counter : mCounters) {
-        if (counter.track == track) {
-            counter.samples.push_back({now, value});
-            return;
-        }
-    }
-    mCounters.push_back({track, {{now, value}}});
+    mSpool.append(counterGroupLocked(track), record.bytes());
 }
 
 void Timeline::recordSlice(const std::string& name, int64_t beginUs, int64_t endUs, int tid) {
+    SpoolRecord record;
+    record.add(beginUs).add(endUs).add(static_cast<int64_t>(tid)).add(name);
     std::lock_guard<std::mutex> lock(mLock);
-    mSlices.push_back({beginUs, endUs, tid, name});
+    mSpool.append(kSliceGroup, record.bytes());
 }
 
 std::vector<Timeline::CounterSample> Timeline::counter(const std::string& track) const {
     std::lock_guard<std::mutex> lock(mLock);
-    for (const auto& counter : mCounters) {
-        if (counter.track == track) {
-            return counter.samples;
-        }
+    std::vector<CounterSample> out;
+    for (size_t i = 0; i < mCounters.size(); ++i) {
+        if (mCounters[i] != track)
+            continue;
+        mSpool.forEach(kFirstCounterGroup + i, [&](const char* data, size_t size) {
+            SpoolRecord::Reader record(data, size);
+            const int64_t us = record.integer();
+            out.push_back({us, record.integer()});
+        });
     }
-    return {};
+    return out;
 }
 
 std::vector<Timeline::Slice> Timeline::slices() const {
     std::lock_guard<std::mutex> lock(mLock);
-    return mSlices;
+    std::vector<Slice> out;
+    mSpool.forEach(kSliceGroup, [&](const char* data, size_t size) {
+        SpoolRecord::Reader record(data, size);
+        Slice slice;
+        slice.beginUs = record.integer();
+        slice.endUs = record.integer();
+        slice.tid = static_cast<int>(record.integer());
+        slice.name = record.text();
+        out.push_back(slice);
+    });
+    return out;
 }
 
 std::vector<Timeline::NodeSummary> Timeline::summary() const {
@@ -168,20 +162,20 @@ std::vector<Timeline::NodeSummary> Timeline::summary() const {
         NodeSummary s;
         s.key = track.key;
         s.path = track.path;
-        s.initial = track.samples.front().text;
-        s.final = track.samples.back().text;
+        s.initial = mValues[track.samples.front().value].text;
+        s.final = mValues[track.samples.back().value].text;
         s.changes = static_cast<int>(track.samples.size()) - 1;
         bool first = true;
         for (const auto& sample : track.samples) {
-            double v = 0;
-            if (!parseNodeNumber(sample.text, &v)) {
+            const Value& value = mValues[sample.value];
+            if (!value.numeric) {
                 s.numeric = false;
                 continue;
             }
-            if (first || v < s.min)
-                s.min = v;
-            if (first || v > s.max)
-                s.max = v;
+            if (first || value.number < s.min)
+                s.min = value.number;
+            if (first || value.number > s.max)
+                s.max = value.number;
             first = false;
         }
         out.push_back(s);
@@ -192,11 +186,16 @@ std::vector<Timeline::NodeSummary> Timeline::summary() const {
 std::vector<Timeline::Instant> Timeline::instants(const std::string& category) const {
     std::lock_guard<std::mutex> lock(mLock);
     std::vector<Instant> out;
-    for (const auto& instant : mInstants) {
-        if (instant.category == category) {
-            out.push_back(instant);
-        }
-    }
+    mSpool.forEach(kInstantGroup, [&](const char* data, size_t size) {
+        SpoolRecord::Reader record(data, size);
+        Instant instant;
+        instant.us = record.integer();
+        instant.category = record.text();
+        if (instant.category != category)
+            return;
+        instant.name = record.text();
+        out.push_back(instant);
+    });
     return out;
 }
 
@@ -210,84 +209,71 @@ int Timeline::changes(const std::string& key) const {
     return 0;
 }
 
-std::string Timeline::chromeJson() const {
-    std::lock_guard<std::mutex> lock(mLock);
-    std::string out = "{\"displayTimeUnit\":\"ms\",\"traceEvents\":[\n";
-    out +=
-        "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":1,\"tid\":0,"
-        "\"args\":{\"name\":\"device nodes\"}},\n";
-    out +=
-        "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":2,\"tid\":0,"
-        "\"args\":{\"name\":\"events\"}},\n";
-    out +=
-        "{\"name\":\"process_name\",\"ph\":\"M\",\"pid\":3,\"tid\":0,"
-        "\"args\":{\"name\":\"velmora server\"}}";
+bool Timeline::writeLocked(std::ostream& out) const {
+    out << TimelineJson::opening();
     for (const auto& track : mTracks) {
         for (size_t i = 0; i < track.samples.size(); ++i) {
             const Sample& sample = track.samples[i];
-            double v = 0;
-            out += ",\n";
-            if (parseNodeNumber(sample.text, &v)) {
-                // The holder rides in the category: counter args must all be numbers.
+            const Value& value = mValues[sample.value];
+            out << ",\n";
+            if (value.numeric) {
                 const std::string source =
                     mCounterSource ? mCounterSource(track.key, i) : std::string();
-                out += "{\"name\":\"" + jsonEscape(track.key) + "\",\"ph\":\"C\"" +
-                       (source.empty() ? "" : ",\"cat\":\"" + jsonEscape(source) + "\"") +
-                       ",\"ts\":" + std::to_string(sample.us) +
-                       ",\"pid\":" + std::to_string(kNodePid) +
-                       ",\"tid\":0,\"args\":{\"value\":" + formatNumber(v) + "}}";
+                out << TimelineJson::nodeCounter(track.key, value.number, sample.us, source);
             } else {
-                // Text nodes (governors) have no counter value: an instant on the node track.
-                out += "{\"name\":\"" + jsonEscape(track.key + "=" + sample.text) +
-                       "\",\"cat\":\"node\",\"ph\":\"i\",\"s\":\"p\",\"ts\":" +
-                       std::to_string(sample.us) + ",\"pid\":" + std::to_string(kNodePid) +
-                       ",\"tid\":0}";
+                out << TimelineJson::nodeText(track.key, value.text, sample.us);
             }
         }
     }
     // The server's tracks, named as on a device: counters and complete slices per thread.
-    for (const auto& counter : mCounters) {
-        for (const auto& sample : counter.samples) {
-            out += ",\n{\"name\":\"" + jsonEscape(counter.track) +
-                   "\",\"ph\":\"C\",\"ts\":" + std::to_string(sample.us) +
-                   ",\"pid\":" + std::to_string(kServerPid) +
-                   ",\"tid\":0,\"args\":{\"value\":" + std::to_string(sample.value) + "}}";
-        }
+    bool complete = true;
+    for (size_t i = 0; i < mCounters.size(); ++i) {
+        complete &= mSpool.forEach(kFirstCounterGroup + i, [&](const char* data, size_t size) {
+            SpoolRecord::Reader record(data, size);
+            const int64_t us = record.integer();
+            out << ",\n" << TimelineJson::serverCounter(mCounters[i], record.integer(), us);
+        });
     }
-    for (const auto& slice : mSlices) {
-        out += ",\n{\"name\":\"" + jsonEscape(slice.name) +
-               "\",\"ph\":\"X\",\"ts\":" + std::to_string(slice.beginUs) +
-               ",\"dur\":" + std::to_string(slice.endUs - slice.beginUs) +
-               ",\"pid\":" + std::to_string(kServerPid) + ",\"tid\":" + std::to_string(slice.tid) +
-               "}";
-    }
-    for (const auto& instant : mInstants) {
-        out += ",\n{\"name\":\"" + jsonEscape(instant.name) + "\",\"cat\":\"" +
-               jsonEscape(instant.category) +
-               "\",\"ph\":\"i\",\"s\":\"g\",\"ts\":" + std::to_string(instant.us) +
-               ",\"pid\":" + std::to_string(kEventPid) + ",\"tid\":0}";
-    }
+    complete &= mSpool.forEach(kSliceGroup, [&](const char* data, size_t size) {
+        SpoolRecord::Reader record(data, size);
+        const int64_t beginUs = record.integer();
+        const int64_t endUs = record.integer();
+        const int tid = static_cast<int>(record.integer());
+        out << ",\n" << TimelineJson::serverSlice(record.text(), beginUs, endUs, tid);
+    });
+    complete &= mSpool.forEach(kInstantGroup, [&](const char* data, size_t size) {
+        SpoolRecord::Reader record(data, size);
+        const int64_t us = record.integer();
+        const std::string category = record.text();
+        out << ",\n" << TimelineJson::instant(category, record.text(), us);
+    });
     // Spans: one named thread of the "events" process per track, tid 0 keeps the instants.
     std::vector<std::string> spanTracks;
-    for (const auto& span : mSpans) {
+    complete &= mSpool.forEach(kSpanGroup, [&](const char* data, size_t size) {
+        SpoolRecord::Reader record(data, size);
+        const std::string track = record.text();
+        const std::string category = record.text();
+        const std::string name = record.text();
+        const int64_t beginUs = record.integer();
+        const int64_t endUs = record.integer();
         size_t tid = 1;
-        while (tid <= spanTracks.size() && spanTracks[tid - 1] != span.track)
+        while (tid <= spanTracks.size() && spanTracks[tid - 1] != track)
             ++tid;
         if (tid > spanTracks.size()) {
-            spanTracks.push_back(span.track);
-            out +=
-                ",\n{\"name\":\"thread_name\",\"ph\":\"M\",\"pid\":" + std::to_string(kEventPid) +
-                ",\"tid\":" + std::to_string(tid) + ",\"args\":{\"name\":\"" +
-                jsonEscape(span.track) + "\"}}";
+            spanTracks.push_back(track);
+            out << ",\n" << TimelineJson::spanTrack(static_cast<int>(tid), track);
         }
-        out += ",\n{\"name\":\"" + jsonEscape(span.name) + "\",\"cat\":\"" +
-               jsonEscape(span.category) +
-               "\",\"ph\":\"X\",\"ts\":" + std::to_string(span.beginUs) +
-               ",\"dur\":" + std::to_string(span.endUs - span.beginUs) +
-               ",\"pid\":" + std::to_string(kEventPid) + ",\"tid\":" + std::to_string(tid) + "}";
-    }
-    out += "\n]}\n";
-    return out;
+        out << ",\n" << TimelineJson::span(category, name, beginUs, endUs, static_cast<int>(tid));
+    });
+    out << TimelineJson::closing();
+    return complete;
+}
+
+std::string Timeline::chromeJson() const {
+    std::lock_guard<std::mutex> lock(mLock);
+    std::ostringstream out;
+    writeLocked(out);
+    return out.str();
 }
 
 bool Timeline::writeChromeJson(const std::string& path, std::string* error) const {
@@ -297,7 +283,13 @@ bool Timeline::writeChromeJson(const std::string& path, std::string* error) cons
             *error = "cannot write " + path;
         return false;
     }
-    file << chromeJson();
+    std::lock_guard<std::mutex> lock(mLock);
+    if (!writeLocked(file)) {
+        if (error != nullptr)
+            *error =
+                "the timeline's scratch file could not be read back: " + path + " is incomplete";
+        return false;
+    }
     file.close();
     if (!file) {
         if (error != nullptr)

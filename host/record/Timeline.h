@@ -5,15 +5,23 @@
 // timeline in Chrome's JSON trace format (counter track per numeric node and per server counter,
 // complete events for server slices, instant events for the rest), which Perfetto's UI opens.
 //
+// Node writes stay in memory (a time and a shared value each: they are what changed). Everything
+// recorded per call (server counters and slices, instants, spans) goes to an EventSpool as it
+// comes, so a long replay holds a few chunks of it, and is read back for the file and the
+// queries below.
+//
 // Written by the device tree, the executor and the event log from any thread: thread safe.
 #pragma once
 
 #include <cstdint>
 #include <functional>
 #include <mutex>
+#include <ostream>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
+#include "host/record/EventSpool.h"
 #include "host/time/HostClock.h"
 
 namespace velmora {
@@ -61,10 +69,11 @@ public:
 
     // One entry per node seen, in order of first appearance.
     std::vector<NodeSummary> summary() const;
+    // Read back from the spool: instants of one category in order, the values server counter
+    // `track` took in order, the server's slices in order of their end.
     std::vector<Instant> instants(const std::string& category) const;
     // Number of changing writes recorded for `key`.
     int changes(const std::string& key) const;
-    // The values server counter `track` took, in order; its slices in order of their end.
     std::vector<CounterSample> counter(const std::string& track) const;
     std::vector<Slice> slices() const;
 
@@ -80,41 +89,44 @@ public:
     void setCounterSource(CounterSource source);
 
     std::string chromeJson() const;
-    // Writes chromeJson() to `path`. False (with `error` set) when the file cannot be written.
+    // Writes chromeJson() to `path` as it goes, without holding the whole text. False (with
+    // `error` set) when the file cannot be written or the spool cannot be read back.
     bool writeChromeJson(const std::string& path, std::string* error) const;
 
 private:
+    // A distinct node value, shared by every sample that has it.
+    struct Value {
+        std::string text;
+        bool numeric = false;
+        double number = 0;
+    };
     struct Sample {
         int64_t us;
-        std::string text;
+        uint32_t value;  // index in mValues
     };
     struct Track {
         std::string key;
         std::string path;
         std::vector<Sample> samples;  // samples[0] is the initial value
     };
+    // Spool groups: one each for instants, slices and spans, then one per server counter track.
+    static constexpr size_t kInstantGroup = 0;
+    static constexpr size_t kSliceGroup = 1;
+    static constexpr size_t kSpanGroup = 2;
+    static constexpr size_t kFirstCounterGroup = 3;
 
-    Track* findTrack(const std::string& key);
-
-    struct Counter {
-        std::string track;
-        std::vector<CounterSample> samples;
-    };
-    struct Span {
-        std::string track;
-        std::string category;
-        std::string name;
-        int64_t beginUs;
-        int64_t endUs;
-    };
+    Track* findTrackLocked(const std::string& key);
+    uint32_t valueLocked(const std::string& text);
+    size_t counterGroupLocked(const std::string& track);
+    bool writeLocked(std::ostream& out) const;
 
     HostClock& mClock;
     mutable std::mutex mLock;  // guards everything below
     std::vector<Track> mTracks;
-    std::vector<Instant> mInstants;
-    std::vector<Counter> mCounters;
-    std::vector<Slice> mSlices;
-    std::vector<Span> mSpans;
+    std::vector<Value> mValues;
+    std::unordered_map<std::string, uint32_t> mValueIds;
+    std::vector<std::string> mCounters;  // server counter tracks, in order of first sample
+    EventSpool mSpool;
     CounterSource mCounterSource;
 };
 

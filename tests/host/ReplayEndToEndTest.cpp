@@ -132,10 +132,12 @@ TEST_F(ReplayEndToEndTest, TimelineHoldsTheNodeAndServerTracks) {
     EXPECT_EQ((std::vector<int64_t>{4118, 0, 4119, 4224, 4230, 0}), scenes);
 }
 
-// No configuration, one that does not know the trace's calls, one the server cannot start with.
+// No configuration, one that does not know the trace's calls (warned about once per command, where
+// first used), one the server cannot start with.
 TEST(ReplaySessionTest, WarnsAboutCallsTheServerCannotMeanAndPointsAtTheChecker) {
     const std::string dir = hosttest::makeScratchDir("warn");
-    hosttest::writeFile(dir + "/t.trace", "policy colde 1200\nevent 4321 0\nevent 20225 0\n");
+    hosttest::writeFile(dir + "/t.trace",
+                        "policy colde 1200\nevent 4321 0\nevent 20225 0\nevent 4321 -1\n");
     ReplayOptions options = hosttest::replayOptions(dir, dir + "/t.trace");
     ReplaySession unconfigured(options, stdout, stderr);  // none beside the trace
     EXPECT_EQ(ReplaySession::kBadInput, unconfigured.run());
@@ -149,7 +151,7 @@ TEST(ReplaySessionTest, WarnsAboutCallsTheServerCannotMeanAndPointsAtTheChecker)
                   "1: warning: policy 'colde' is never asked for: the server asks for "
                   "\"cold\" (4099) and \"winswitch\" (4098); did you mean 'cold'?\n" +
                   where +
-                  "2: warning: command 4321 is not in the configuration: the server "
+                  "2: warning: command 4321 (2 calls) is not in the configuration: the server "
                   "answers 2\n",
               hosttest::readAndClose(err));
 

@@ -173,8 +173,20 @@ TEST(ReplayInsightTest, TimelineSlicesSitOnNamedTracks) {
     EXPECT_EQ(2, launches);
 }
 
+// A plain replay counts its calls and keeps nothing per call: that is for comparisons.
+TEST(ReplayInsightTest, APlainReplayKeepsNothingPerCall) {
+    const Replayed run = replay("per-call", "@0 event 4099 0\n@100 setconfig 1 5=2016000\n@200\n");
+    EXPECT_EQ(3, run.insight.callCount);
+    EXPECT_TRUE(run.insight.callDigests.empty());
+    EXPECT_TRUE(run.insight.callStatus.empty());
+    EXPECT_EQ(-1, run.insight.divergentCall.index);
+    const auto summary = nlohmann::json::parse(hosttest::readFile(run.dir + "/summary.json"));
+    EXPECT_EQ(3, summary["calls"]);
+}
+
+// The runs part at the launch, the second call: B was compared with A's digests as it went.
 TEST(ReplayInsightTest, ComparesTwoConfigurationsDifferingInOneValue) {
-    const std::string trace = "@0 event 4099 0\n@100 setconfig 1 5=2016000\n@2000\n";
+    const std::string trace = "@0 setconfig 1 5=2016000\n@100 event 4099 0\n@2000\n";
     const Replayed a = replay("compare-a", trace);
     std::string configB = kConfig;
     configB.replace(configB.find("1804800"), 7, "1497600");
@@ -185,7 +197,10 @@ TEST(ReplayInsightTest, ComparesTwoConfigurationsDifferingInOneValue) {
     EXPECT_EQ(ReplaySession::kOk, ComparisonRun(options, dirB, out, stderr).run());
     fclose(out);
     const auto json = nlohmann::json::parse(hosttest::readFile(a.dir + "/comparison.json"));
-    EXPECT_EQ(0, json["first_divergence"]["call"]["index"]);
+    EXPECT_EQ(1, json["first_divergence"]["call"]["index"]);
+    EXPECT_EQ(a.dir + "/t.trace:2", json["first_divergence"]["call"]["where"]);
+    EXPECT_EQ("@100 event 4099 0", json["first_divergence"]["call"]["text"]);
+    EXPECT_EQ(100.0, json["first_divergence"]["call"]["ms"]);
     EXPECT_EQ("0 cpu.big.min=1804800", json["first_divergence"]["a"]);
     EXPECT_EQ("0 cpu.big.min=1497600", json["first_divergence"]["b"]);
     ASSERT_EQ(1u, json["nodes"].size());

@@ -144,9 +144,10 @@ TEST(ReplayPacedTest, InteractiveDeviceFollowsTheWallClockBetweenLines) {
     ASSERT_NE(nullptr, window);
     EXPECT_EQ(400000, window->endUs - window->beginUs);
     EXPECT_EQ("300000", whileWaiting);  // reverted before anyone typed again
-    ASSERT_EQ(2u, session.insight().calls.size());
-    EXPECT_GE(session.insight().calls[1].us, 2000000);
-    EXPECT_LT(window->endUs, session.insight().calls[1].us);
+    const auto calls = HostEnvironment::get().timeline().instants("call");
+    ASSERT_EQ(2u, calls.size());
+    EXPECT_GE(calls[1].us, 2000000);
+    EXPECT_LT(window->endUs, calls[1].us);
 }
 
 }  // namespace

@@ -30,6 +30,12 @@ TEST(TraceParserTest, BadLineNamesFileAndLine) {
         {"evnt 4098 0", "minute.trace:2: unknown call 'evnt'; did you mean 'event'?"},
         {"event 40x9 0", "minute.trace:2: malformed number '40x9' for command id"},
         {"@-5 reload", "minute.trace:2: malformed time '-5' for time stamp"},
+        // A sleep goes forward by a whole number of milliseconds, written as a number.
+        {"sleep -5", "minute.trace:2: malformed time '-5' for sleep"},
+        {"sleep -0x10", "minute.trace:2: malformed time '-0x10' for sleep"},
+        {"sleep 2.5", "minute.trace:2: malformed time '2.5' for sleep"},
+        {"sleep soon", "minute.trace:2: malformed time 'soon' for sleep"},
+        {"sleep \" 5\"", "minute.trace:2: malformed time ' 5' for sleep"},
         {"event 99999999999 0", "minute.trace:2: malformed number '99999999999' for command id"},
         // Wrong shapes (a wrong argument count: the byte-order-mark test below).
         {"setconfig 1 2:1497600", "minute.trace:2: expected <tag>=<value>, got '2:1497600'"},

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstdio>
 #include <fstream>
+#include <sstream>
 
 #include "host/record/Timeline.h"
 #include "tools/insight/InsightSummary.h"
@@ -62,7 +63,7 @@ std::string spanFill(const std::string& category) {
 }
 
 // One group's step plot: a path per node, spans shaded behind, the value range on the left.
-std::string plot(const HtmlReport::Group& group, const InsightResult& result) {
+void plot(std::ostream& out, const HtmlReport::Group& group, const InsightResult& result) {
     std::vector<const NodeInsight*> nodes;
     double lo = 0, hi = 0;
     bool first = true;
@@ -80,7 +81,7 @@ std::string plot(const HtmlReport::Group& group, const InsightResult& result) {
         }
     }
     if (nodes.empty())
-        return "";
+        return;
     if (hi == lo) {
         hi += 1;
         lo -= 1;
@@ -88,41 +89,42 @@ std::string plot(const HtmlReport::Group& group, const InsightResult& result) {
     const double end = std::max<double>(1.0, static_cast<double>(result.endUs));
     auto x = [&](int64_t us) { return kLeft + (kPlotWidth - kLeft - 10) * (us / end); };
     auto y = [&](double v) { return kTop + (kPlotHeight - 2 * kTop) * (1 - (v - lo) / (hi - lo)); };
-    std::string svg = "<h3>" + esc(group.title) + "</h3>\n<svg class=\"plot\" width=\"" +
-                      num(kPlotWidth) + "\" height=\"" + num(kPlotHeight) + "\" data-series=\"" +
-                      std::to_string(nodes.size()) + "\">\n";
-    svg += "<rect class=\"frame\" x=\"" + num(kLeft) + "\" y=\"" + num(kTop) + "\" width=\"" +
-           num(kPlotWidth - kLeft - 10) + "\" height=\"" + num(kPlotHeight - 2 * kTop) + "\"/>\n";
+    out << "<h3>" + esc(group.title) + "</h3>\n<svg class=\"plot\" width=\"" + num(kPlotWidth) +
+               "\" height=\"" + num(kPlotHeight) + "\" data-series=\"" +
+               std::to_string(nodes.size()) + "\">\n";
+    out << "<rect class=\"frame\" x=\"" + num(kLeft) + "\" y=\"" + num(kTop) + "\" width=\"" +
+               num(kPlotWidth - kLeft - 10) + "\" height=\"" + num(kPlotHeight - 2 * kTop) +
+               "\"/>\n";
     for (const auto& span : result.spans) {
         if (span.category == "probe" || span.category == "memlat")
             continue;  // too many and too short to shade; the probe plot shows them
-        svg += "<rect x=\"" + num(x(span.beginUs)) + "\" y=\"" + num(kTop) + "\" width=\"" +
-               num(std::max(1.0, x(span.endUs) - x(span.beginUs))) + "\" height=\"" +
-               num(kPlotHeight - 2 * kTop) + "\" fill=\"" + spanFill(span.category) + "\"><title>" +
-               esc(span.name) + "</title></rect>\n";
+        out << "<rect x=\"" + num(x(span.beginUs)) + "\" y=\"" + num(kTop) + "\" width=\"" +
+                   num(std::max(1.0, x(span.endUs) - x(span.beginUs))) + "\" height=\"" +
+                   num(kPlotHeight - 2 * kTop) + "\" fill=\"" + spanFill(span.category) +
+                   "\"><title>" + esc(span.name) + "</title></rect>\n";
     }
-    svg += "<text x=\"4\" y=\"" + num(y(hi) + 4) + "\">" + label(hi) + "</text><text x=\"4\" y=\"" +
-           num(y(lo)) + "\">" + label(lo) + "</text><text x=\"" + num(kPlotWidth - 60) + "\" y=\"" +
-           num(kPlotHeight) + "\">" + label(result.endUs / 1e6) + " s</text>\n";
+    out << "<text x=\"4\" y=\"" + num(y(hi) + 4) + "\">" + label(hi) + "</text><text x=\"4\" y=\"" +
+               num(y(lo)) + "\">" + label(lo) + "</text><text x=\"" + num(kPlotWidth - 60) +
+               "\" y=\"" + num(kPlotHeight) + "\">" + label(result.endUs / 1e6) + " s</text>\n";
     for (size_t i = 0; i < nodes.size(); ++i) {
-        std::string d;
+        // One step per change: written as it goes, a long replay's path is never one string.
+        out << "<path class=\"series\" stroke=\"" << kColours[i % 8] << "\" d=\"";
         const auto& segments = nodes[i]->segments;
         for (size_t s = 0; s < segments.size(); ++s) {
             double v = 0;
             parseNodeNumber(segments[s].value, &v);
             const double from = x(std::min(segments[s].fromUs, result.endUs));
             const double to = x(s + 1 < segments.size() ? segments[s + 1].fromUs : result.endUs);
-            d += (s == 0 ? "M" : "L") + num(from) + " " + num(y(v)) + "H" + num(to);
+            out << (s == 0 ? "M" : "L") << num(from) << " " << num(y(v)) << "H" << num(to);
         }
-        svg += "<path class=\"series\" stroke=\"" + std::string(kColours[i % 8]) + "\" d=\"" + d +
-               "\"><title>" + esc(nodes[i]->key) + "</title></path>\n";
+        out << "\"><title>" + esc(nodes[i]->key) + "</title></path>\n";
     }
-    svg += "</svg>\n<p class=\"legend\">";
+    out << "</svg>\n<p class=\"legend\">";
     for (size_t i = 0; i < nodes.size(); ++i) {
-        svg += "<span style=\"color:" + std::string(kColours[i % 8]) + "\">&#9632; " +
-               esc(nodes[i]->key) + "</span> ";
+        out << "<span style=\"color:" + std::string(kColours[i % 8]) + "\">&#9632; " +
+                   esc(nodes[i]->key) + "</span> ";
     }
-    return svg + "</p>\n";
+    out << "</p>\n";
 }
 
 std::string residencyBars(const InsightResult& result) {
@@ -181,35 +183,38 @@ const std::vector<HtmlReport::Group>& HtmlReport::groups() {
 }
 
 std::string HtmlReport::html(const InsightResult& result) {
-    std::string out =
-        "<!DOCTYPE html>\n<html><head><meta charset=\"utf-8\"><title>velmora replay "
-        "report</title>\n<style>" +
-        std::string(kStyle) + "</style></head>\n<body>\n<h1>Replay report</h1>\n<p>" +
-        num(result.endUs / 1000.0) + " ms of trace, " + std::to_string(result.calls.size()) +
-        " calls. Shaded: <span style=\"background:" + spanFill("scene") +
-        "\">scenes</span> <span style=\"background:" + spanFill("onoff") +
-        "\">on/off commands</span> <span style=\"background:" + spanFill("action") +
-        "\">timed actions</span>.</p>\n<h2>Left applied</h2>\n<ul>\n";
+    std::ostringstream out;
+    write(result, out);
+    return out.str();
+}
+
+void HtmlReport::write(const InsightResult& result, std::ostream& out) {
+    out << "<!DOCTYPE html>\n<html><head><meta charset=\"utf-8\"><title>velmora replay "
+           "report</title>\n<style>" +
+               std::string(kStyle) + "</style></head>\n<body>\n<h1>Replay report</h1>\n<p>" +
+               num(result.endUs / 1000.0) + " ms of trace, " + std::to_string(result.callCount) +
+               " calls. Shaded: <span style=\"background:" + spanFill("scene") +
+               "\">scenes</span> <span style=\"background:" + spanFill("onoff") +
+               "\">on/off commands</span> <span style=\"background:" + spanFill("action") +
+               "\">timed actions</span>.</p>\n<h2>Left applied</h2>\n<ul>\n";
     for (const auto& warning : result.warnings) {
-        out += "<li class=\"warn\">" + esc(warning.message) + "</li>\n";
+        out << "<li class=\"warn\">" + esc(warning.message) + "</li>\n";
     }
     if (result.warnings.empty())
-        out += "<li>nothing</li>\n";
-    out += "</ul>\n<h2>Nodes over time</h2>\n";
+        out << "<li>nothing</li>\n";
+    out << "</ul>\n<h2>Nodes over time</h2>\n";
     for (const auto& group : groups()) {
-        out += plot(group, result);
+        plot(out, group, result);
     }
-    out +=
-        "<h2>Final values and who holds them</h2>\n<table class=\"held\">\n"
-        "<tr><th>node</th><th>final</th><th>held by</th><th>time at value</th></tr>\n";
+    out << "<h2>Final values and who holds them</h2>\n<table class=\"held\">\n"
+           "<tr><th>node</th><th>final</th><th>held by</th><th>time at value</th></tr>\n";
     for (const auto& node : result.nodes) {
-        out += "<tr><td>" + esc(node.key) + "</td><td>" + esc(node.final) + "</td><td>" +
-               esc(node.heldBy) + "</td><td>" +
-               esc(InsightSummary::topResidency(node, result.endUs, 3)) + "</td></tr>\n";
+        out << "<tr><td>" + esc(node.key) + "</td><td>" + esc(node.final) + "</td><td>" +
+                   esc(node.heldBy) + "</td><td>" +
+                   esc(InsightSummary::topResidency(node, result.endUs, 3)) + "</td></tr>\n";
     }
-    out += "</table>\n<h2>Time at each value</h2>\n" + residencyBars(result);
-    out += "<script>" + std::string(kSelfCheck) + "</script>\n</body></html>\n";
-    return out;
+    out << "</table>\n<h2>Time at each value</h2>\n" + residencyBars(result);
+    out << "<script>" + std::string(kSelfCheck) + "</script>\n</body></html>\n";
 }
 
 bool HtmlReport::write(const InsightResult& result, const std::string& path, std::string* error) {
@@ -218,7 +223,7 @@ bool HtmlReport::write(const InsightResult& result, const std::string& path, std
         *error = "cannot write " + path;
         return false;
     }
-    file << html(result);
+    write(result, file);
     file.close();
     if (!file) {
         *error = "write failed: " + path;

@@ -7,6 +7,7 @@
 // the body's data-plots attribute, for the browser check of the test suite.
 #pragma once
 
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -24,7 +25,9 @@ public:
     static const std::vector<Group>& groups();
 
     static std::string html(const InsightResult& result);
-    // Writes html() to `path`. False with `error` set when the file cannot be written.
+    // Writes html() to `out` as it is made, and to `path` (false with `error` set when the file
+    // cannot be written): the plots of a long replay are never one string.
+    static void write(const InsightResult& result, std::ostream& out);
     static bool write(const InsightResult& result, const std::string& path, std::string* error);
 };
 

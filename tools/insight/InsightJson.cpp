@@ -16,57 +16,80 @@ nlohmann::json callJson(const CallRef& call) {
     return {{"index", call.index}, {"where", call.where}, {"text", call.text}, {"ms", ms(call.us)}};
 }
 
+// A node without its holders, which are streamed.
+nlohmann::json nodeJson(const NodeInsight& node, int64_t endUs) {
+    nlohmann::json residency = nlohmann::json::array();
+    for (const auto& entry : node.residencyUs) {
+        residency.push_back(
+            {{"value", entry.first},
+             {"ms", ms(entry.second)},
+             {"share", endUs > 0 ? static_cast<double>(entry.second) / endUs : 0.0}});
+    }
+    return {{"key", node.key},        {"initial", node.initial}, {"final", node.final},
+            {"held_by", node.heldBy}, {"changes", node.changes}, {"numeric", node.numeric},
+            {"residency", residency}};
+}
+
+bool writeFile(const std::string& path, std::string* error,
+               const std::function<void(JsonStreamWriter&)>& write) {
+    std::ofstream file(path, std::ios::trunc);
+    if (!file) {
+        *error = "cannot write " + path;
+        return false;
+    }
+    JsonStreamWriter out(file);
+    write(out);
+    file << "\n";
+    file.close();
+    if (!file) {
+        *error = "write failed: " + path;
+        return false;
+    }
+    return true;
+}
+
 }  // namespace
 
-nlohmann::json InsightJson::summary(const InsightResult& result) {
-    nlohmann::json nodes = nlohmann::json::array();
-    for (const auto& node : result.nodes) {
-        nlohmann::json residency = nlohmann::json::array();
-        for (const auto& entry : node.residencyUs) {
-            residency.push_back(
-                {{"value", entry.first},
-                 {"ms", ms(entry.second)},
-                 {"share",
-                  result.endUs > 0 ? static_cast<double>(entry.second) / result.endUs : 0.0}});
-        }
-        nlohmann::json holders = nlohmann::json::array();
-        for (const auto& segment : node.segments) {
-            holders.push_back({{"from_ms", ms(segment.fromUs)},
-                               {"value", segment.value},
-                               {"held_by", segment.heldBy}});
-        }
-        nodes.push_back({{"key", node.key},
-                         {"initial", node.initial},
-                         {"final", node.final},
-                         {"held_by", node.heldBy},
-                         {"changes", node.changes},
-                         {"numeric", node.numeric},
-                         {"residency", residency},
-                         {"holders", holders}});
-    }
-    nlohmann::json spans = nlohmann::json::array();
-    for (const auto& span : result.spans) {
-        spans.push_back({{"track", span.track},
-                         {"category", span.category},
-                         {"name", span.name},
-                         {"begin_ms", ms(span.beginUs)},
-                         {"end_ms", ms(span.endUs)},
-                         {"open", span.open}});
-    }
+void InsightJson::summary(const InsightResult& result, JsonStreamWriter& out) {
     nlohmann::json warnings = nlohmann::json::array();
     for (const auto& warning : result.warnings) {
         warnings.push_back({{"kind", warning.kind},
                             {"message", warning.message},
                             {"call", callJson(warning.call)}});
     }
-    return {{"trace_ms", ms(result.endUs)},
-            {"calls", result.calls.size()},
-            {"nodes", nodes},
-            {"spans", spans},
-            {"warnings", warnings}};
+    const nlohmann::json members = {
+        {"trace_ms", ms(result.endUs)}, {"calls", result.callCount}, {"warnings", warnings}};
+    auto holders = [&](const NodeInsight& node) {
+        out.beginArray();
+        for (const auto& segment : node.segments) {
+            out.value({{"from_ms", ms(segment.fromUs)},
+                       {"value", segment.value},
+                       {"held_by", segment.heldBy}});
+        }
+        out.endArray();
+    };
+    auto nodes = [&] {
+        out.beginArray();
+        for (const auto& node : result.nodes)
+            out.object(nodeJson(node, result.endUs), {{"holders", [&] { holders(node); }}});
+        out.endArray();
+    };
+    auto spans = [&] {
+        out.beginArray();
+        for (const auto& span : result.spans) {
+            out.value({{"track", span.track},
+                       {"category", span.category},
+                       {"name", span.name},
+                       {"begin_ms", ms(span.beginUs)},
+                       {"end_ms", ms(span.endUs)},
+                       {"open", span.open}});
+        }
+        out.endArray();
+    };
+    out.object(members, {{"nodes", nodes}, {"spans", spans}});
 }
 
-nlohmann::json InsightJson::comparison(const ReplayComparison& comparison) {
+void InsightJson::comparison(const ReplayComparison& comparison, JsonStreamWriter& out) {
     nlohmann::json nodes = nlohmann::json::array();
     for (const auto& diff : comparison.nodes()) {
         nlohmann::json residency = nlohmann::json::array();
@@ -89,24 +112,23 @@ nlohmann::json InsightJson::comparison(const ReplayComparison& comparison) {
                       {"a", comparison.divergenceA()},
                       {"b", comparison.divergenceB()}};
     }
-    return {{"config_a", comparison.labelA()}, {"config_b", comparison.labelB()},
-            {"first_divergence", divergence},  {"nodes", nodes},
-            {"a", summary(comparison.a())},    {"b", summary(comparison.b())}};
+    const nlohmann::json members = {{"config_a", comparison.labelA()},
+                                    {"config_b", comparison.labelB()},
+                                    {"first_divergence", divergence},
+                                    {"nodes", nodes}};
+    out.object(members, {{"a", [&] { summary(comparison.a(), out); }},
+                         {"b", [&] { summary(comparison.b(), out); }}});
 }
 
-bool InsightJson::write(const nlohmann::json& json, const std::string& path, std::string* error) {
-    std::ofstream file(path, std::ios::trunc);
-    if (!file) {
-        *error = "cannot write " + path;
-        return false;
-    }
-    file << json.dump(1) << "\n";
-    file.close();
-    if (!file) {
-        *error = "write failed: " + path;
-        return false;
-    }
-    return true;
+bool InsightJson::writeSummary(const InsightResult& result, const std::string& path,
+                               std::string* error) {
+    return writeFile(path, error, [&](JsonStreamWriter& out) { summary(result, out); });
+}
+
+bool InsightJson::writeComparison(const ReplayComparison& comparison, const std::string& path,
+                                  std::string* error) {
+    return writeFile(path, error,
+                     [&](JsonStreamWriter& out) { InsightJson::comparison(comparison, out); });
 }
 
 }  // namespace velmora

@@ -1,7 +1,8 @@
 // What one replay found out, as plain data: per node who held its value and for how long it sat
-// at each value, the spans of what stayed applied, the end-of-replay warnings and a digest per
-// call (for comparing two runs). Built by ReplayInsight::finish; read by the summary, the JSON
-// writer, the HTML report and the comparison.
+// at each value, the spans of what stayed applied, the end-of-replay warnings and, when two runs
+// are compared, a digest per call or where the second run parts from the first. Built by
+// ReplayInsight::finish; read by the summary, the JSON writer, the HTML report and the
+// comparison.
 #pragma once
 
 #include <cstdint>
@@ -59,11 +60,15 @@ struct InsightResult {
     std::vector<NodeInsight> nodes;
     std::vector<SpanInsight> spans;
     std::vector<StuckWarning> warnings;
-    // Per call: its status, and a digest of its status and of every node change it caused, for
-    // finding where two runs part.
+    int callCount = 0;  // calls replayed
+    // Only when the analysis was asked to keep them (the first run of a comparison): per call its
+    // status, and a digest of its status and of every node change it caused.
     std::vector<int> callStatus;
     std::vector<uint64_t> callDigests;
-    std::vector<CallRef> calls;
+    // Only when the analysis was given an earlier run's digests (the second run of a comparison):
+    // the first call whose digest differs (index -1: none), and its status here.
+    CallRef divergentCall;
+    int divergentStatus = 0;
 
     const NodeInsight* node(const std::string& key) const {
         for (const auto& n : nodes) {

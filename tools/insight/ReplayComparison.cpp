@@ -42,24 +42,27 @@ ReplayComparison::ReplayComparison(std::string labelA, InsightResult a, std::str
         if (diff.finalA != diff.finalB || diff.heldByA != diff.heldByB || !diff.residency.empty())
             mNodes.push_back(std::move(diff));
     }
-    const size_t calls = std::min(mA.callDigests.size(), mB.callDigests.size());
-    for (size_t i = 0; i < calls; ++i) {
-        if (mA.callDigests[i] != mB.callDigests[i]) {
-            mFirst = static_cast<int>(i);
-            break;
-        }
-    }
+    // Both runs replayed the same trace, so the call B parted at is the same call of A.
+    if (mB.divergentCall.index >= 0 &&
+        static_cast<size_t>(mB.divergentCall.index) < mA.callStatus.size())
+        mFirst = mB.divergentCall.index;
 }
 
 const CallRef& ReplayComparison::firstDivergentCall() const {
     static const CallRef kNone;
-    return mFirst >= 0 ? mA.calls[mFirst] : kNone;
+    return mFirst >= 0 ? mB.divergentCall : kNone;
 }
 
-std::string ReplayComparison::whatCallDid(const InsightResult& run) const {
-    if (mFirst < 0 || static_cast<size_t>(mFirst) >= run.callStatus.size())
-        return "";
-    std::string out = std::to_string(run.callStatus[mFirst]);
+std::string ReplayComparison::divergenceA() const {
+    return mFirst >= 0 ? whatCallDid(mA, mA.callStatus[mFirst]) : "";
+}
+
+std::string ReplayComparison::divergenceB() const {
+    return mFirst >= 0 ? whatCallDid(mB, mB.divergentStatus) : "";
+}
+
+std::string ReplayComparison::whatCallDid(const InsightResult& run, int status) const {
+    std::string out = std::to_string(status);
     for (const auto& node : run.nodes) {
         for (size_t i = 1; i < node.segments.size(); ++i) {
             if (node.segments[i].call == mFirst &&

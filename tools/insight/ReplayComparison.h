@@ -1,6 +1,7 @@
 // The differences between two replays of one trace under two configurations: per node the final
 // value, its holder and the time spent at each value, and the first call after which the device
-// went different ways (a different status or different node changes).
+// went different ways (a different status or different node changes). Run A kept its calls'
+// digests and statuses, run B was compared with A's digests as it went (ReplayInsight).
 #pragma once
 
 #include <cstdint>
@@ -32,8 +33,8 @@ public:
     bool diverges() const { return mFirst >= 0; }
     const CallRef& firstDivergentCall() const;
     // What the diverging call did in each run: status and node changes ("0 cpu.big.max=...").
-    std::string divergenceA() const { return whatCallDid(mA); }
-    std::string divergenceB() const { return whatCallDid(mB); }
+    std::string divergenceA() const;
+    std::string divergenceB() const;
 
     const std::string& labelA() const { return mLabelA; }
     const std::string& labelB() const { return mLabelB; }
@@ -44,7 +45,8 @@ public:
     std::string text() const;
 
 private:
-    std::string whatCallDid(const InsightResult& run) const;
+    // The status and the node changes of the diverging call in `run`.
+    std::string whatCallDid(const InsightResult& run, int status) const;
 
     std::string mLabelA, mLabelB;
     InsightResult mA, mB;

@@ -37,6 +37,16 @@ void ReplayInsight::setInitial(const std::string& key, const std::string& value)
     mOrder.push_back(key);
 }
 
+void ReplayInsight::keepCallDigests() {
+    std::lock_guard<std::mutex> lock(mLock);
+    mKeepDigests = true;
+}
+
+void ReplayInsight::compareWith(std::vector<uint64_t> digests) {
+    std::lock_guard<std::mutex> lock(mLock);
+    mEarlier = std::move(digests);
+}
+
 CallRef ReplayInsight::currentCallLocked() const {
     return mInCall ? mCallRef : CallRef();
 }
@@ -49,7 +59,7 @@ void ReplayInsight::beginCall(CallRecord call) {
     std::lock_guard<std::mutex> lock(mLock);
     mInCall = true;
     // Buffers are reused from call to call: this runs for every call of long replays.
-    mCallRef.index = static_cast<int>(mCalls.size());
+    mCallRef.index = mCallCount;
     mCallRef.where = std::move(call.where);
     mCallRef.text = std::move(call.text);
     mCallRef.us = now;
@@ -106,9 +116,17 @@ void ReplayInsight::endCall(int status) {
         else if (off)
             mSwitchedOff.insert(cmdId);
     }
-    mDigests.push_back(digest(mDigest, std::to_string(status)));
-    mStatus.push_back(status);
-    mCalls.push_back(mCallRef);
+    const uint64_t callDigest = digest(mDigest, std::to_string(status));
+    if (mKeepDigests) {
+        mDigests.push_back(callDigest);
+        mStatus.push_back(status);
+    }
+    const size_t index = static_cast<size_t>(mCallCount);
+    if (mDivergentCall.index < 0 && index < mEarlier.size() && mEarlier[index] != callDigest) {
+        mDivergentCall = mCallRef;
+        mDivergentStatus = status;
+    }
+    ++mCallCount;
     mInCall = false;
 }
 

@@ -16,9 +16,10 @@
 #include <string>
 #include <vector>
 
+#include "host/device/NodeMap.h"
 #include "host/record/ExecutorObserver.h"
 #include "host/time/HostClock.h"
-#include "host/device/NodeMap.h"
+#include "tools/insight/ChangeHolders.h"
 #include "tools/insight/InsightResult.h"
 #include "tools/insight/SourceLedger.h"
 
@@ -47,6 +48,12 @@ public:
 
     // The value a node starts with (time 0), before anything is replayed.
     void setInitial(const std::string& key, const std::string& value);
+    // For comparing two runs of one trace; nothing is kept per call otherwise. Before the first
+    // call: keepCallDigests() keeps every call's status and digest in the result (the first
+    // run); compareWith(an earlier run's digests) has the result name the first call whose
+    // digest differs (the second run).
+    void keepCallDigests();
+    void compareWith(std::vector<uint64_t> digests);
     void beginCall(CallRecord call);
     void endCall(int status);
 
@@ -57,8 +64,7 @@ public:
     static std::string holderAt(const InsightResult& result, const std::string& key, int64_t us);
     // Per node, the holder of the value it took in each change (index 0: the initial value),
     // matching the timeline's samples one to one.
-    static std::map<std::string, std::vector<std::string>> holdersByChange(
-        const InsightResult& result);
+    static ChangeHolders holdersByChange(const InsightResult& result);
 
     // ExecutorObserver
     void onCommandApplied(int cmdId, const std::string& category, const std::string& name,
@@ -106,9 +112,13 @@ private:
     std::string mCallLabel;  // "KX", "event 4114 zola_level", ...
     std::map<std::string, SourceLedger::Request> mClientBefore;  // to undo a failed request
     uint64_t mDigest = 0;  // FNV-1a over the current call's node changes
-    std::vector<uint64_t> mDigests;
-    std::vector<int> mStatus;
-    std::vector<CallRef> mCalls;
+    int mCallCount = 0;
+    bool mKeepDigests = false;
+    std::vector<uint64_t> mDigests;  // when kept
+    std::vector<int> mStatus;        // when kept
+    std::vector<uint64_t> mEarlier;  // an earlier run's digests, to find where this one parts
+    CallRef mDivergentCall;
+    int mDivergentStatus = 0;
     std::map<int, Applied> mApplied;              // executor: applied commands by cmdId
     std::map<int, Applied> mOnOff;                // calls: on/off commands switched on
     std::set<int> mSwitchedOff;                   // calls: scenes last switched off by the host

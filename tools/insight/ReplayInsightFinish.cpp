@@ -93,7 +93,7 @@ InsightResult ReplayInsight::finish() {
         }
         result.nodes.push_back(std::move(node));
     }
-    result.spans = mSpans;
+    result.spans = std::move(mSpans);
     for (const auto& entry : mApplied) {
         result.spans.push_back(
             {"", entry.second.category, entry.second.name, entry.second.beginUs, end, true});
@@ -110,10 +110,12 @@ InsightResult ReplayInsight::finish() {
     }
     packIntoLanes(&result.spans);
     stuckWarningsLocked(&result);
-    // finish() ends the analysis: the per-call records move out rather than being copied.
+    // finish() ends the analysis: the records move out rather than being copied.
+    result.callCount = mCallCount;
     result.callDigests = std::move(mDigests);
     result.callStatus = std::move(mStatus);
-    result.calls = std::move(mCalls);
+    result.divergentCall = mDivergentCall;
+    result.divergentStatus = mDivergentStatus;
     return result;
 }
 
@@ -168,17 +170,16 @@ std::string ReplayInsight::holderAt(const InsightResult& result, const std::stri
     return holder;
 }
 
-std::map<std::string, std::vector<std::string>> ReplayInsight::holdersByChange(
-    const InsightResult& result) {
-    std::map<std::string, std::vector<std::string>> out;
+ChangeHolders ReplayInsight::holdersByChange(const InsightResult& result) {
+    ChangeHolders out;
     for (const auto& node : result.nodes) {
-        std::vector<std::string>& holders = out[node.key];
         for (size_t i = 0; i < node.segments.size(); ++i) {
             const HolderSegment& segment = node.segments[i];
             if (i == 0 || segment.value != node.segments[i - 1].value) {
-                holders.push_back(segment.heldBy);
+                out.add(node.key, segment.heldBy);
             } else if (segment.fromUs == node.segments[i - 1].fromUs) {
-                holders.back() = segment.heldBy;  // the holder changed in the same instant
+                out.replaceLast(node.key,
+                                segment.heldBy);  // the holder changed in the same instant
             }
         }
     }

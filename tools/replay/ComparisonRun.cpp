@@ -82,6 +82,7 @@ int ComparisonRun::run() {
     ReplayOptions a = mOptions;
     a.fast = true;
     a.summaryJsonPath.clear();
+    a.keepCallDigests = true;
     ReplaySession sessionA(a, mOut, mErr);
     const int resultA = sessionA.run();
     if (resultA != ReplaySession::kOk)
@@ -89,6 +90,8 @@ int ComparisonRun::run() {
     const InsightResult insightA = sessionA.insight();
 
     ReplayOptions b = a;
+    b.keepCallDigests = false;
+    b.compareWithDigests = insightA.callDigests;
     b.configDirs = {mCompareDir};
     b.writeFiles = false;
     b.eventLogPath = "/dev/null";
@@ -110,8 +113,7 @@ int ComparisonRun::run() {
     fprintf(mOut, "\n%s", comparison.text().c_str());
     if (!mOptions.summaryJsonPath.empty()) {
         std::string why;
-        if (!InsightJson::write(InsightJson::comparison(comparison), mOptions.summaryJsonPath,
-                                &why)) {
+        if (!InsightJson::writeComparison(comparison, mOptions.summaryJsonPath, &why)) {
             fprintf(mErr, "velmora-replay: %s\n", why.c_str());
             return ReplaySession::kSetupFailed;
         }

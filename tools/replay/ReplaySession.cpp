@@ -5,7 +5,6 @@
 
 #include <memory>
 #include <set>
-#include <sstream>
 
 #include "config/CommandIds.h"
 #include "config/VelmoraParser.h"
@@ -22,6 +21,8 @@
 #include "tools/replay/PacedLineReader.h"
 #include "tools/replay/ProgressLine.h"
 #include "tools/replay/SameCpuScope.h"
+#include "tools/replay/TraceReader.h"
+#include "tools/replay/TraceSurvey.h"
 
 namespace velmora {
 
@@ -255,22 +256,27 @@ int ReplaySession::performCall(const TraceCall& call) {
 }
 
 int ReplaySession::replayFile() {
-    std::vector<TraceCall> calls;
-    std::string error;
-    if (TraceParser::parseFile(mOptions.tracePath, &calls, &error) != 0) {
-        std::istringstream lines(error);
-        for (std::string line; std::getline(lines, line);) {
-            fprintf(mErr, "velmora-replay: %s\n", line.c_str());
-        }
+    // Every bad line is reported before anything runs. The first pass keeps what the warnings
+    // need, the second replays the calls as it reads them: the trace is never held in memory.
+    TraceSurvey survey;
+    const int errors = survey.read(mOptions.tracePath, [this](const std::string& message) {
+        fprintf(mErr, "velmora-replay: %s\n", message.c_str());
+    });
+    if (errors != 0)
         return kBadInput;
-    }
     const int setup = setUp();
     if (setup != kOk)
         return setup;
-    warnAboutCalls(calls);
+    if (mInsight != nullptr && mOptions.keepCallDigests)
+        mInsight->keepCallDigests();
+    if (mInsight != nullptr && !mOptions.compareWithDigests.empty())
+        mInsight->compareWith(std::move(mOptions.compareWithDigests));
+    warnAboutCalls(survey);
     HostClock& clock = HostEnvironment::get().clock();
     ProgressLine progress(mErr);
-    for (const auto& call : calls) {
+    TraceReader reader(mOptions.tracePath);
+    TraceCall call;
+    while (reader.next(&call, nullptr) != TraceReader::Step::End) {
         if (clock.interrupted()) {
             break;
         }
@@ -321,7 +327,7 @@ int ReplaySession::replayInteractive() {
     return result;
 }
 
-void ReplaySession::warnAboutCalls(const std::vector<TraceCall>& calls) {
+void ReplaySession::warnAboutCalls(const TraceSurvey& survey) {
     std::set<int> configured;
     VelmoraParser* parser = mServer->mPlatPtr != nullptr ? mServer->mPlatPtr->mParserPtr : nullptr;
     if (parser == nullptr) {
@@ -335,22 +341,23 @@ void ReplaySession::warnAboutCalls(const std::vector<TraceCall>& calls) {
     }
     pthread_rwlock_unlock(&parser->mRwLock);
     const std::vector<std::string> policies = {kColdPolicy, kWinSwitchPolicy};
-    for (const auto& call : calls) {
-        const std::string where = call.file + ":" + std::to_string(call.line);
+    for (const auto& use : survey.uses()) {
+        // Said once, where first used: "(3 calls)" when more calls use it.
+        const std::string calls = use.calls > 1 ? " (" + std::to_string(use.calls) + " calls)" : "";
         // Ids from 20224 up are taken apart before any parse, except memory latency 20481.
-        const bool parsed = call.id < kCmdClientRestart || call.id == kCmdMemLatency;
-        if (call.kind == TraceCall::Kind::Event && parsed && configured.count(call.id) == 0) {
+        const bool parsed = use.cmdId < kCmdClientRestart || use.cmdId == kCmdMemLatency;
+        if (use.kind == TraceCall::Kind::Event && parsed && configured.count(use.cmdId) == 0) {
             fprintf(mErr,
-                    "velmora-replay: %s: warning: command %d is not in the configuration: the "
+                    "velmora-replay: %s: warning: command %d%s is not in the configuration: the "
                     "server answers 2\n",
-                    where.c_str(), call.id);
-        } else if (call.kind == TraceCall::Kind::Policy && call.text != kColdPolicy &&
-                   call.text != kWinSwitchPolicy) {
-            const std::string guess = Spelling::closest(call.text, policies);
+                    use.where.c_str(), use.cmdId, calls.c_str());
+        } else if (use.kind == TraceCall::Kind::Policy && use.policy != kColdPolicy &&
+                   use.policy != kWinSwitchPolicy) {
+            const std::string guess = Spelling::closest(use.policy, policies);
             fprintf(mErr,
-                    "velmora-replay: %s: warning: policy '%s' is never asked for: the server "
+                    "velmora-replay: %s: warning: policy '%s'%s is never asked for: the server "
                     "asks for \"cold\" (4099) and \"winswitch\" (4098)%s\n",
-                    where.c_str(), call.text.c_str(),
+                    use.where.c_str(), use.policy.c_str(), calls.c_str(),
                     guess.empty() ? "" : ("; did you mean '" + guess + "'?").c_str());
         }
     }
@@ -400,13 +407,9 @@ void ReplaySession::finishInsight() {
     for (const auto& span : mResult.spans) {
         timeline.recordSpan(span.track, span.category, span.name, span.beginUs, span.endUs);
     }
-    auto holders = std::make_shared<std::map<std::string, std::vector<std::string>>>(
-        ReplayInsight::holdersByChange(mResult));
-    timeline.setCounterSource([holders](const std::string& key, size_t sample) {
-        auto it = holders->find(key);
-        return it != holders->end() && sample < it->second.size() ? it->second[sample]
-                                                                  : std::string();
-    });
+    auto holders = std::make_shared<const ChangeHolders>(ReplayInsight::holdersByChange(mResult));
+    timeline.setCounterSource(
+        [holders](const std::string& key, size_t sample) { return holders->at(key, sample); });
 }
 
 bool ReplaySession::checkWritable(const std::string& path, std::string* error) {
@@ -429,7 +432,7 @@ int ReplaySession::writeOutputs() {
     std::string error;
     if (!env.timeline().writeChromeJson(mOptions.timelinePath, &error) ||
         (!mOptions.summaryJsonPath.empty() &&
-         !InsightJson::write(InsightJson::summary(mResult), mOptions.summaryJsonPath, &error)) ||
+         !InsightJson::writeSummary(mResult, mOptions.summaryJsonPath, &error)) ||
         (!mOptions.reportPath.empty() &&
          !HtmlReport::write(mResult, mOptions.reportPath, &error))) {
         fprintf(mErr, "velmora-replay: %s\n", error.c_str());

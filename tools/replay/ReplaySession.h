@@ -5,6 +5,7 @@
 // Used by the velmora-replay program and by the end-to-end tests; single threaded.
 #pragma once
 
+#include <cstdint>
 #include <cstdio>
 #include <map>
 #include <memory>
@@ -21,6 +22,7 @@ namespace velmora {
 
 class ReplayInsight;
 class SameCpuScope;
+class TraceSurvey;
 
 struct ReplayOptions {
     std::string tracePath;                // ignored when interactive
@@ -39,6 +41,10 @@ struct ReplayOptions {
     std::string reportPath;       // self-contained HTML report; optional
     bool writeFiles = true;       // false: timeline, summary JSON and report are not written
     bool insight = true;          // false: no analysis (the plain summary), for measuring its cost
+    // Comparing two runs (ComparisonRun): the first keeps every call's digest, the second is
+    // compared with them as it goes. A plain replay keeps nothing per call.
+    bool keepCallDigests = false;
+    std::vector<uint64_t> compareWithDigests;
 };
 
 class ReplaySession {
@@ -74,8 +80,9 @@ private:
     int replayFile();
     int replayInteractive();
     // Warns (on `err`) about calls that are valid but surely not meant: events of commands the
-    // configuration lacks, launch-policy names the server never asks for.
-    void warnAboutCalls(const std::vector<TraceCall>& calls);
+    // configuration lacks, launch-policy names the server never asks for; once per command or
+    // name, where it is first used.
+    void warnAboutCalls(const TraceSurvey& survey);
     void waitForProbeBoosts();
     // Removes the simulated device root when this session made it.
     void removeOwnedRoot();

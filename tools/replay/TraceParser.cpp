@@ -1,12 +1,12 @@
 #include "tools/replay/TraceParser.h"
 
+#include <cctype>
 #include <cerrno>
 #include <climits>
 #include <cstdlib>
-#include <fstream>
-#include <sstream>
 
 #include "tools/common/Spelling.h"
+#include "tools/replay/TraceReader.h"
 
 namespace velmora {
 
@@ -14,8 +14,6 @@ namespace {
 
 const std::vector<std::string> kCalls = {"sleep",     "event", "reload", "setconfig",
                                          "getconfig", "dump",  "policy"};
-// Editors on some systems start a UTF-8 file with a byte-order mark.
-constexpr const char* kUtf8Bom = "\xEF\xBB\xBF";
 
 // Splits a line into words; a word may contain a double-quoted part (msg="a b").
 bool tokenize(const std::string& line, std::vector<std::string>* words, std::string* problem) {
@@ -60,7 +58,8 @@ bool tokenize(const std::string& line, std::vector<std::string>* words, std::str
 }
 
 bool parseNumber(const std::string& text, int64_t min, int64_t max, int64_t* value) {
-    if (text.empty()) {
+    // strtoll would skip the blanks of a quoted " 5".
+    if (text.empty() || isspace(static_cast<unsigned char>(text[0]))) {
         return false;
     }
     errno = 0;
@@ -131,7 +130,7 @@ int TraceParser::parseLine(const std::string& line, const std::string& file, int
         }
         i = 1;
         if (words.size() == 1) {
-            calls->push_back(call);
+            calls->push_back(std::move(call));
             return 0;
         }
     }
@@ -213,21 +212,22 @@ int TraceParser::parseLine(const std::string& line, const std::string& file, int
                (guess.empty() ? std::string() : "; did you mean '" + guess + "'?"));
         return -1;
     }
-    calls->push_back(call);
+    calls->push_back(std::move(call));
     return 0;
 }
 
-int TraceParser::parseText(const std::string& text, const std::string& file,
-                           std::vector<TraceCall>* calls, std::string* error) {
-    const std::string bom = kUtf8Bom;
-    std::istringstream in(text.compare(0, bom.size(), bom) == 0 ? text.substr(bom.size()) : text);
-    std::string line;
-    int lineNo = 0;
+namespace {
+
+int readAll(TraceReader& reader, std::vector<TraceCall>* calls, std::string* error) {
     int result = 0;
     std::string errors;
-    while (std::getline(in, line)) {
-        std::string lineError;
-        if (parseLine(line, file, ++lineNo, calls, &lineError) != 0) {
+    TraceCall call;
+    std::string lineError;
+    for (TraceReader::Step step;
+         (step = reader.next(&call, &lineError)) != TraceReader::Step::End;) {
+        if (step == TraceReader::Step::Call) {
+            calls->push_back(std::move(call));
+        } else {
             errors += (errors.empty() ? "" : "\n") + lineError;
             result = -1;
         }
@@ -238,17 +238,23 @@ int TraceParser::parseText(const std::string& text, const std::string& file,
     return result;
 }
 
+}  // namespace
+
+int TraceParser::parseText(const std::string& text, const std::string& file,
+                           std::vector<TraceCall>* calls, std::string* error) {
+    TraceReader reader(text, file);
+    return readAll(reader, calls, error);
+}
+
 int TraceParser::parseFile(const std::string& path, std::vector<TraceCall>* calls,
                            std::string* error) {
-    std::ifstream file(path);
-    if (!file) {
+    TraceReader reader(path);
+    if (!reader.isOpen()) {
         if (error != nullptr)
             *error = path + ": cannot open trace";
         return -1;
     }
-    std::stringstream content;
-    content << file.rdbuf();
-    return parseText(content.str(), path, calls, error);
+    return readAll(reader, calls, error);
 }
 
 }  // namespace velmora

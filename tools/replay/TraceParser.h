@@ -11,9 +11,10 @@
 //     dump <option>                   --help --logon --logoff --freqlist --easgrouplist
 //     policy <name> <duration>        launch-policy answer (cold, winswitch); -1 clears it
 //
-// Numbers are decimal or 0x hexadecimal, with an optional minus sign. Errors name the file and
-// line: "trace.txt:12: malformed number 'x1' for payload"; an unknown call name gets a
-// did-you-mean ("unknown call 'evnt'; did you mean 'event'?").
+// Numbers are decimal or 0x hexadecimal, with an optional minus sign; times (the "@" stamp and
+// sleep) are not negative. Errors name the file and line: "trace.txt:12: malformed number 'x1'
+// for payload"; an unknown call name gets a did-you-mean ("unknown call 'evnt'; did you mean
+// 'event'?").
 #pragma once
 
 #include <cstdint>
@@ -45,12 +46,13 @@ public:
     // `error` naming file:line.
     static int parseLine(const std::string& line, const std::string& file, int lineNo,
                          std::vector<TraceCall>* calls, std::string* error);
-    // Every line of `text` (a UTF-8 byte-order mark at its start is skipped). Goes on past bad
-    // lines: -1 when there was one, with `error` holding one message per bad line, separated
-    // by newlines; the calls of the good lines are appended either way.
+    // Every line of `text`, read by TraceReader (a UTF-8 byte-order mark at its start is
+    // skipped). Goes on past bad lines: -1 when there was one, with `error` holding one message
+    // per bad line, separated by newlines; the calls of the good lines are appended either way.
     static int parseText(const std::string& text, const std::string& file,
                          std::vector<TraceCall>* calls, std::string* error);
-    // parseText on the contents of `path`; a missing file is an error naming it.
+    // parseText on the contents of `path`; a missing file is an error naming it. A replay
+    // reads its trace with TraceReader instead, without keeping every call.
     static int parseFile(const std::string& path, std::vector<TraceCall>* calls,
                          std::string* error);
 };

@@ -1,0 +1,74 @@
+#include "tools/replay/TraceReader.h"
+
+#include <fstream>
+#include <sstream>
+
+namespace velmora {
+
+namespace {
+
+// Editors on some systems start a UTF-8 file with a byte-order mark.
+constexpr char kUtf8Bom[] = "\xEF\xBB\xBF";
+constexpr size_t kUtf8BomBytes = sizeof(kUtf8Bom) - 1;
+
+}  // namespace
+
+TraceReader::TraceReader(const std::string& path)
+    : mFile(path), mIn(new std::ifstream(path, std::ios::binary)) {}
+
+TraceReader::TraceReader(const std::string& text, const std::string& file)
+    : mFile(file), mIn(new std::istringstream(text)) {}
+
+TraceReader::~TraceReader() = default;
+
+bool TraceReader::isOpen() const {
+    return static_cast<bool>(*mIn);
+}
+
+bool TraceReader::readLine(std::string* line, bool* tooLong) {
+    line->clear();
+    *tooLong = false;
+    std::streambuf* in = mIn->rdbuf();
+    bool any = false;
+    for (int c = in->sbumpc(); c != std::char_traits<char>::eof(); c = in->sbumpc()) {
+        any = true;
+        if (c == '\n')
+            return true;
+        if (line->size() < kMaxLineBytes)
+            line->push_back(static_cast<char>(c));
+        else
+            *tooLong = true;
+    }
+    return any;  // a last line without a newline
+}
+
+TraceReader::Step TraceReader::next(TraceCall* call, std::string* error) {
+    if (!isOpen())
+        return Step::End;
+    bool tooLong = false;
+    while (readLine(&mLine, &tooLong)) {
+        ++mLineNo;
+        if (mLineNo == 1 && mLine.compare(0, kUtf8BomBytes, kUtf8Bom) == 0)
+            mLine.erase(0, kUtf8BomBytes);
+        std::string lineError;
+        if (tooLong) {
+            lineError = mFile + ":" + std::to_string(mLineNo) + ": line longer than " +
+                        std::to_string(kMaxLineBytes) + " bytes";
+        } else {
+            mParsed.clear();
+            if (TraceParser::parseLine(mLine, mFile, mLineNo, &mParsed, &lineError) == 0) {
+                if (mParsed.empty())
+                    continue;  // blank or a comment
+                *call = std::move(mParsed.front());
+                ++mCalls;
+                return Step::Call;
+            }
+        }
+        if (error != nullptr)
+            *error = lineError;
+        return Step::BadLine;
+    }
+    return Step::End;
+}
+
+}  // namespace velmora

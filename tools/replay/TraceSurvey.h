@@ -1,0 +1,41 @@
+// The first pass over a trace before it is replayed: every bad line is reported, and of the good
+// lines only what the warnings about calls that are surely not meant need is kept: the distinct
+// event command ids and launch-policy names, each with where it is first used and how many calls
+// use it. It holds no call, so a long trace costs what it has distinct, not what it has lines.
+#pragma once
+
+#include <functional>
+#include <map>
+#include <string>
+#include <vector>
+
+#include "tools/replay/TraceParser.h"
+
+namespace velmora {
+
+class TraceSurvey {
+public:
+    struct Use {
+        TraceCall::Kind kind = TraceCall::Kind::Event;  // Event or Policy
+        int cmdId = 0;                                  // Event
+        std::string policy;                             // Policy: the name asked for
+        std::string where;                              // "file:line" of the first use
+        int calls = 0;                                  // calls using it
+    };
+    using ErrorSink = std::function<void(const std::string& message)>;
+
+    // Reads the trace at `path`, giving `onError` the message of every bad line (or the one
+    // saying the trace cannot be opened). The number of such messages.
+    int read(const std::string& path, const ErrorSink& onError);
+    void add(const TraceCall& call);
+
+    // Event command ids and policy names, in order of first use.
+    const std::vector<Use>& uses() const { return mUses; }
+
+private:
+    std::vector<Use> mUses;
+    std::map<int, size_t> mEvents;            // cmdId -> index in mUses
+    std::map<std::string, size_t> mPolicies;  // name -> index in mUses
+};
+
+}  // namespace velmora
