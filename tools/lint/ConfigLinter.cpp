@@ -19,7 +19,19 @@ int ConfigLinter::run(std::ostream& out) {
     loader.run(mPath);
     LocatedConfig located;
     located.load(mPath);
+    return report(loader, located, out);
+}
 
+int ConfigLinter::runText(const std::string& text, std::ostream& out) {
+    LoaderRun loader;
+    loader.runText(text);
+    LocatedConfig located;
+    located.parse(text);
+    return report(loader, located, out);
+}
+
+int ConfigLinter::report(const LoaderRun& loader, const LocatedConfig& located,
+                         std::ostream& out) {
     std::vector<CheckedCommand> commands;
     LoadChecker loadChecker(located, loader, mDiagnostics);
     if (loadChecker.check(&commands)) {

@@ -16,6 +16,9 @@
 
 namespace velmora {
 
+class LoaderRun;
+class LocatedConfig;
+
 struct LintOptions {
     bool explain = false;  // list every command's dispatch before the findings
     bool werror = false;   // warnings make the exit status 1
@@ -31,10 +34,16 @@ public:
     // Returns the exit status: Diagnostics::kClean, kWarningsAsErrors or kErrors.
     // REQUIRES: the file exists and is readable (the command line checks it first).
     int run(std::ostream& out);
+    // The same check on `text` given in memory; the path given to the constructor only names
+    // it in the findings.
+    int runText(const std::string& text, std::ostream& out);
 
     const Diagnostics& diagnostics() const { return mDiagnostics; }
 
 private:
+    // The checks and the printing, once both reads of the configuration are done.
+    int report(const LoaderRun& loader, const LocatedConfig& located, std::ostream& out);
+
     std::string mPath;
     LintOptions mOptions;
     Diagnostics mDiagnostics;

@@ -1,6 +1,8 @@
 #include "tools/lint/LoaderRun.h"
 
 #include <android/log.h>
+#include <sys/mman.h>
+#include <unistd.h>
 
 #include <memory>
 #include <mutex>
@@ -59,6 +61,27 @@ int LoaderRun::run(const std::string& path) {
         mActionMap = loader->createActionMap(mRawMap);
     }
     return mStatus;
+}
+
+int LoaderRun::runText(const std::string& text) {
+    const int fd = memfd_create("velmora-lint-config", MFD_CLOEXEC);
+    if (fd < 0) {
+        mStatus = -1;
+        return mStatus;
+    }
+    size_t written = 0;
+    while (written < text.size()) {
+        const ssize_t n = write(fd, text.data() + written, text.size() - written);
+        if (n <= 0) {
+            close(fd);
+            mStatus = -1;
+            return mStatus;
+        }
+        written += static_cast<size_t>(n);
+    }
+    const int status = run("/proc/self/fd/" + std::to_string(fd));
+    close(fd);
+    return status;
 }
 
 const Action* LoaderRun::chainOf(int cmdId) const {

@@ -27,6 +27,10 @@ public:
     // Loads `path`. Returns innerLoad's status: 0 loaded, 2 XML error, 3 no "policy" or no
     // command element in it; -1 when the platform layer supplied no loader.
     int run(const std::string& path);
+    // Loads `text` as if it were the file's contents. The loader only opens paths, so the text
+    // goes to an anonymous file in memory (memfd) that the loader opens by its /proc/self/fd
+    // name; nothing is written to a file system. -1 also when no such file can be made.
+    int runText(const std::string& text);
 
     int status() const { return mStatus; }
     const RawXmlDataMap& rawMap() const { return mRawMap; }

@@ -51,6 +51,16 @@ bool LocatedConfig::load(const std::string& path) {
     // Entity processing on, like the loader, so that texts compare equal.
     tinyxml2::XMLDocument doc(true);
     doc.LoadFile(path.c_str());
+    return read(doc);
+}
+
+bool LocatedConfig::parse(const std::string& text) {
+    tinyxml2::XMLDocument doc(true);
+    doc.Parse(text.data(), text.size());
+    return read(doc);
+}
+
+bool LocatedConfig::read(const tinyxml2::XMLDocument& doc) {
     if (doc.Error()) {
         mXmlError = XmlErrorText::describe(doc);
         mErrorLine = doc.ErrorLineNum();

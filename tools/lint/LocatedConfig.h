@@ -10,6 +10,10 @@
 #include <string>
 #include <vector>
 
+namespace tinyxml2 {
+class XMLDocument;
+}
+
 namespace velmora {
 
 // One parameter element: <name>text</name>.
@@ -42,6 +46,8 @@ class LocatedConfig {
 public:
     // Reads `path`. False when tinyxml2 cannot parse it; xmlError() and errorLine() tell why.
     bool load(const std::string& path);
+    // The same on the configuration's text.
+    bool parse(const std::string& text);
 
     const std::string& xmlError() const { return mXmlError; }
     int errorLine() const { return mErrorLine; }
@@ -56,6 +62,8 @@ public:
     const LocatedCommand* firstWithId(int id) const;
 
 private:
+    bool read(const tinyxml2::XMLDocument& doc);
+
     std::string mXmlError;
     int mErrorLine = 0;
     int mRootLine = 0;
