@@ -25,8 +25,29 @@ TEST(TraceParserTest, CallsTheExampleMinuteLacksParse) {
     EXPECT_EQ(250, calls[2].sleepMs);
 }
 
+// A call with `n` pairs, tags or payload ints: "setconfig 1 2=1 2=1 ...", "getconfig 22 22 ...",
+// "event 4099 0 0 ...".
+std::string longCall(const std::string& verb, int n) {
+    std::string line = verb + (verb == "setconfig" ? " 1" : verb == "event" ? " 4099" : "");
+    for (int i = 0; i < n; ++i)
+        line += verb == "setconfig" ? " 2=1" : verb == "event" ? " 0" : " 22";
+    return line;
+}
+
+TEST(TraceParserTest, RequestsAndQueriesTakeUpToTheMostTags) {
+    std::vector<TraceCall> calls;
+    std::string error;
+    ASSERT_EQ(0, TraceParser::parseText(longCall("setconfig", TraceParser::kMaxTags) + "\n" +
+                                            longCall("getconfig", TraceParser::kMaxTags) + "\n",
+                                        "t.trace", &calls, &error))
+        << error;
+    ASSERT_EQ(2u, calls.size());
+    EXPECT_EQ(1024u, calls[0].values.size());
+    EXPECT_EQ(1024u, calls[1].tags.size());
+}
+
 TEST(TraceParserTest, BadLineNamesFileAndLine) {
-    const std::pair<const char*, const char*> rows[] = {
+    const std::pair<std::string, std::string> rows[] = {
         {"evnt 4098 0", "minute.trace:2: unknown call 'evnt'; did you mean 'event'?"},
         {"event 40x9 0", "minute.trace:2: malformed number '40x9' for command id"},
         {"@-5 reload", "minute.trace:2: malformed time '-5' for time stamp"},
@@ -40,11 +61,17 @@ TEST(TraceParserTest, BadLineNamesFileAndLine) {
         // Wrong shapes (a wrong argument count: the byte-order-mark test below).
         {"setconfig 1 2:1497600", "minute.trace:2: expected <tag>=<value>, got '2:1497600'"},
         {"event 4116 0 msg=\"pid=1", "minute.trace:2: unterminated quote"},
+        // One argument past the most each call takes.
+        {longCall("setconfig", 1025),
+         "minute.trace:2: 'setconfig' takes 2..1025 argument(s), got 1026"},
+        {longCall("getconfig", 1025),
+         "minute.trace:2: 'getconfig' takes 1..1024 argument(s), got 1025"},
+        {longCall("event", 64), "minute.trace:2: 'event' takes 1..64 argument(s), got 65"},
     };
     for (const auto& row : rows) {
         std::vector<TraceCall> calls;
         std::string error;
-        const std::string text = std::string("event 4099 0\n") + row.first + "\n";
+        const std::string text = "event 4099 0\n" + row.first + "\n";
         EXPECT_EQ(-1, TraceParser::parseText(text, "minute.trace", &calls, &error)) << row.first;
         EXPECT_EQ(row.second, error);
     }
@@ -57,7 +84,7 @@ TEST(TraceParserTest, EveryBadLineIsReportedAndAByteOrderMarkIsSkipped) {
                                          "event 4099 0\nsetconfig 1\nreload\nsleeep 5\n",
                                          "t.trace", &calls, &error));
     EXPECT_EQ(
-        "t.trace:2: 'setconfig' takes 2..64 argument(s), got 1\n"
+        "t.trace:2: 'setconfig' takes 2..1025 argument(s), got 1\n"
         "t.trace:4: unknown call 'sleeep'; did you mean 'sleep'?",
         error);
 }

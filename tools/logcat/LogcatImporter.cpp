@@ -4,6 +4,7 @@
 #include <cstdio>
 
 #include "config/CommandIds.h"
+#include "tools/replay/TraceParser.h"
 
 namespace velmora {
 
@@ -20,6 +21,17 @@ constexpr int kPlaceholderQueryTag = 22;
 // the year counted then is 2000, a leap year.
 constexpr int64_t kHalfYearUs = 183LL * 24 * 3600 * 1000000;
 constexpr int64_t kYearWithoutYearUs = 366LL * 24 * 3600 * 1000000;
+// Calls start in this column: "@25000  event 4099 0".
+constexpr size_t kCallColumn = 8;
+
+// `text` with control characters (a newline in a file name) as '?', for a comment line.
+std::string printable(std::string text) {
+    for (char& c : text) {
+        if (static_cast<unsigned char>(c) < 0x20 || c == 0x7f)
+            c = '?';
+    }
+    return text;
+}
 
 std::string plural(int n, const char* one, const char* many) {
     return std::to_string(n) + " " + (n == 1 ? one : many);
@@ -36,7 +48,9 @@ std::string ImportCounts::text() const {
            plural(unjoined, "request", "requests") + " not joined; skipped " +
            std::to_string(otherTags) + " other tags, " + std::to_string(otherProcesses) +
            " other processes, " + std::to_string(garbage) + " garbage, " +
-           std::to_string(otherServerLines) + " other server lines";
+           std::to_string(otherServerLines) + " other server lines" +
+           (tooLong > 0 ? "; " + plural(tooLong, "request", "requests") + " too long to write"
+                        : std::string());
 }
 
 int LogcatImporter::importText(const std::string& text, const std::string& sourceName,
@@ -196,6 +210,18 @@ void LogcatImporter::addEvent(const ServerMessage& m, int64_t timeUs, int line,
 }
 
 void LogcatImporter::addRequest(const JoinedRequest& request) {
+    if (request.tags.size() > static_cast<size_t>(TraceParser::kMaxTags)) {
+        // velmora-replay would refuse the line.
+        mEntries.push_back({request.timeUs, request.firstLine, "",
+                            "not written: a request of client " +
+                                std::to_string(request.clientId) + " with " +
+                                std::to_string(request.tags.size()) +
+                                " pairs, more than a trace call takes (" +
+                                std::to_string(TraceParser::kMaxTags) + "), log line " +
+                                std::to_string(request.firstLine)});
+        ++mCounts.tooLong;
+        return;
+    }
     std::string call = "setconfig " + std::to_string(request.clientId);
     for (size_t i = 0; i < request.tags.size(); ++i)
         call += " " + std::to_string(request.tags[i]) + "=" + std::to_string(request.configs[i]);
@@ -226,7 +252,7 @@ void LogcatImporter::writeTrace(const std::string& sourceName) {
             break;
         }
     }
-    mTrace = "# Imported by velmora-import-logcat from " + sourceName + " (logcat -v " +
+    mTrace = "# Imported by velmora-import-logcat from " + printable(sourceName) + " (logcat -v " +
              mFormat.name() + ", process " + std::to_string(mPid) + ").\n# " + mCounts.text() +
              ".\n# Times are milliseconds since the first call. The log holds the first payload "
              "int of an\n# event only, no launch-policy answers and no dump but \"--logon\".\n\n";
@@ -240,8 +266,10 @@ void LogcatImporter::writeTrace(const std::string& sourceName) {
             mTrace += "# " + std::string(stamp) + " " + e.comment + "\n";
             continue;
         }
-        snprintf(stamp, sizeof(stamp), "%-8s", ("@" + std::to_string(lastMs)).c_str());
-        std::string line = stamp + e.call;
+        // At least one blank after the stamp, however long the log.
+        std::string line = "@" + std::to_string(lastMs);
+        line.append(line.size() < kCallColumn ? kCallColumn - line.size() : 1, ' ');
+        line += e.call;
         if (!e.comment.empty())
             line += "  # " + e.comment;
         mTrace += line + "\n";

@@ -32,6 +32,7 @@ struct ImportCounts {
     int dumps = 0;         // dump options seen: "--logon" (the entry-point lines), turned down
     int placeholders = 0;  // calls with a part the log lacks, marked EDIT
     int unjoined = 0;      // requests whose pairs could not be joined
+    int tooLong = 0;       // requests of more pairs than a trace call takes, written as notes
     int otherTags = 0;
     int otherProcesses = 0;
     int garbage = 0;           // not a logcat line of the format

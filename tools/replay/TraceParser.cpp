@@ -170,7 +170,7 @@ int TraceParser::parseLine(const std::string& line, const std::string& file, int
             return -1;
     } else if (verb == "setconfig") {
         call.kind = TraceCall::Kind::SetConfig;
-        if (!argc(2, 64) || !p.intArg(args[0], "client id", &call.id))
+        if (!argc(2, kMaxTags + 1) || !p.intArg(args[0], "client id", &call.id))
             return -1;
         for (size_t k = 1; k < args.size(); ++k) {
             const size_t eq = args[k].find('=');
@@ -188,7 +188,7 @@ int TraceParser::parseLine(const std::string& line, const std::string& file, int
         }
     } else if (verb == "getconfig") {
         call.kind = TraceCall::Kind::GetConfig;
-        if (!argc(1, 64))
+        if (!argc(1, kMaxTags))
             return -1;
         for (const auto& arg : args) {
             int tag = 0;

@@ -11,6 +11,8 @@
 //     dump <option>                   --help --logon --logoff --freqlist --easgrouplist
 //     policy <name> <duration>        launch-policy answer (cold, winswitch); -1 clears it
 //
+// An event takes up to 63 payload ints, a request up to kMaxTags pairs and a query up to kMaxTags
+// tags (velmora-import-logcat writes a longer request of a device's log as a note).
 // Numbers are decimal or 0x hexadecimal, with an optional minus sign; times (the "@" stamp and
 // sleep) are not negative. Errors name the file and line: "trace.txt:12: malformed number 'x1'
 // for payload"; an unknown call name gets a did-you-mean ("unknown call 'evnt'; did you mean
@@ -42,6 +44,8 @@ struct TraceCall {
 
 class TraceParser {
 public:
+    static constexpr int kMaxTags = 1024;
+
     // Parses one line; appends a call unless the line is blank or a comment. 0, or -1 with
     // `error` naming file:line.
     static int parseLine(const std::string& line, const std::string& file, int lineNo,
