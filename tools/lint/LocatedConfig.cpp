@@ -82,17 +82,17 @@ bool LocatedConfig::read(const tinyxml2::XMLDocument& doc) {
     for (const tinyxml2::XMLElement* element = root->FirstChildElement(); element != nullptr;
          element = element->NextSiblingElement()) {
         mCommands.push_back(locateCommand(element));
+        const LocatedCommand& command = mCommands.back();
+        if (command.idIsDecimal) {
+            mFirstWithId.emplace(command.id, mCommands.size() - 1);  // kept when already there
+        }
     }
     return true;
 }
 
 const LocatedCommand* LocatedConfig::firstWithId(int id) const {
-    for (const auto& command : mCommands) {
-        if (command.idIsDecimal && command.id == id) {
-            return &command;
-        }
-    }
-    return nullptr;
+    auto it = mFirstWithId.find(id);
+    return it != mFirstWithId.end() ? &mCommands[it->second] : nullptr;
 }
 
 }  // namespace velmora

@@ -8,6 +8,7 @@
 #pragma once
 
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 namespace tinyxml2 {
@@ -70,6 +71,8 @@ private:
     std::string mRootName;
     bool mHasPolicy = false;
     std::vector<LocatedCommand> mCommands;
+    // id -> index in mCommands of the first command with it: checks ask for every command.
+    std::unordered_map<int, size_t> mFirstWithId;
 };
 
 }  // namespace velmora
