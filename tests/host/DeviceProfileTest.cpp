@@ -2,6 +2,9 @@
 // simulated device makes of written values: rounding between available frequencies and refusals.
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <chrono>
+
 #include "host/device/NodeMap.h"
 #include "host/device/profile/DeviceProfile.h"
 #include "host/device/profile/KernelRules.h"
@@ -21,6 +24,14 @@ TEST(DeviceProfileTest, BuiltInProfileHasTheLevelRangeAndANodeForEveryTag) {
     }
 }
 
+// `count` nodes k0, k1, ... on lines 2 on, then k0 once more.
+std::string manyNodesAndATwin(int count) {
+    std::string text = "<device>\n";
+    for (int i = 0; i < count; ++i)
+        text += "<node key=\"k" + std::to_string(i) + "\" kind=\"value\" path=\"x\"/>\n";
+    return text + "<node key=\"k0\" kind=\"value\" path=\"x\"/>\n</device>\n";
+}
+
 struct BadProfile {
     const char* name;
     std::string text;
@@ -34,6 +45,9 @@ const BadProfile kBadProfiles[] = {
      "P:2: node 'a' has kind \"max\" (expected floor, cap, value or text)"},
     {"AbsolutePath", "<device>\n<node key=\"a\" kind=\"value\" path=\"/sys/x\"/>\n</device>\n",
      "P:2: node 'a' needs a path relative to the device root"},
+    // Each node was compared with every node before it: half a minute for 50,000.
+    {"TwinAmongFiftyThousandNodes", manyNodesAndATwin(50000),
+     "P:50002: node 'k0' is defined twice (first on line 2)"},
 };
 
 class BadProfileTest : public testing::TestWithParam<BadProfile> {};
@@ -49,6 +63,28 @@ INSTANTIATE_TEST_SUITE_P(Rows, BadProfileTest, testing::ValuesIn(kBadProfiles),
                          [](const testing::TestParamInfo<BadProfile>& info) {
                              return info.param.name;
                          });
+
+// Seconds of parse() of `text`; the best of `tries`.
+double parseSeconds(const std::string& text, int tries) {
+    double best = 1e9;
+    for (int i = 0; i < tries; ++i) {
+        const auto start = std::chrono::steady_clock::now();
+        DeviceProfile profile;
+        std::string error;
+        profile.parse(text, "P", &error);
+        best = std::min(best, std::chrono::duration<double>(std::chrono::steady_clock::now() -
+                                                            start).count());
+    }
+    return best;
+}
+
+// Eight times the nodes may take eight times as long, not sixty-four (each node compared with
+// all before it, the TwinAmongFiftyThousandNodes row).
+TEST(DeviceProfileTest, ParseTakesTimeInProportionToTheNodes) {
+    const double small = parseSeconds(manyNodesAndATwin(10000), 3);
+    const double large = parseSeconds(manyNodesAndATwin(80000), 1);
+    EXPECT_LT(large, 25 * small) << small << " s for 10,000 nodes, " << large << " s for 80,000";
+}
 
 struct Write {
     const char* key;

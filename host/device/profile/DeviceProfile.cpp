@@ -182,12 +182,10 @@ public:
             if (unit != nullptr) {
                 node.rule.unit = unit;
             }
-            for (const auto& other : *nodes) {
-                if (other.key == node.key) {
-                    return fail(node.line, "node '" + node.key +
-                                               "' is defined twice (first on line " +
-                                               std::to_string(other.line) + ")");
-                }
+            const auto first = mKeyLines.emplace(node.key, node.line);
+            if (!first.second) {
+                return fail(node.line, "node '" + node.key + "' is defined twice (first on line " +
+                                           std::to_string(first.first->second) + ")");
             }
             nodes->push_back(node);
         }
@@ -200,6 +198,7 @@ public:
 
 private:
     std::map<std::string, ValueRule> mTables;  // "frequencies:ID" or "governors:ID"
+    std::map<std::string, int> mKeyLines;      // node key -> its line, for a second definition
 };
 
 }  // namespace
