@@ -27,6 +27,12 @@ std::string Spelling::closest(const std::string& word, const std::vector<std::st
     std::string best;
     size_t bestDistance = limit + 1;
     for (const auto& candidate : candidates) {
+        // The distance is at least the difference in length: a long word (a line of garbage in
+        // a trace) costs nothing.
+        const size_t longer = std::max(word.size(), candidate.size());
+        if (longer - std::min(word.size(), candidate.size()) >= bestDistance) {
+            continue;
+        }
         const size_t d = distance(word, candidate);
         if (d < bestDistance) {
             best = candidate;
