@@ -8,6 +8,7 @@
 #include <chrono>
 #include <functional>
 #include <sstream>
+#include <ostream>
 #include <string>
 
 #include "tests/lint/LintTestSupport.h"
@@ -45,6 +46,11 @@ struct BadConfigRow {
     size_t lines;           // lines printed
     std::string firstLine;  // "" when nothing is printed
 };
+
+// Rows print as their name.
+void PrintTo(const BadConfigRow& row, std::ostream* out) {
+    *out << row.name;
+}
 
 class LintBadInputTest : public testing::TestWithParam<BadConfigRow> {};
 

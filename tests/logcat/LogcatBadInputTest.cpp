@@ -3,6 +3,7 @@
 // line; rows that once gave traces the replay refused are marked with what went wrong.
 #include <gtest/gtest.h>
 
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -41,6 +42,11 @@ struct BadLogRow {
     int requests;
     int tooLong;
 };
+
+// Rows print as their name.
+void PrintTo(const BadLogRow& row, std::ostream* out) {
+    *out << row.name;
+}
 
 class LogcatBadInputTest : public testing::TestWithParam<BadLogRow> {};
 
