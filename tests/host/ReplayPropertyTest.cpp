@@ -1,0 +1,182 @@
+// Replays of random traces (tools/tracegen) agree with each other: two --fast replays of a trace
+// print and write byte for byte the same, and a real-time replay at 20 times speed ends with the
+// node summary, the report lines and the per-call results of --fast. The traces keep every call
+// 20 ms (1 ms of real time at that speed) clear of the deadlines the generator foresees, and end
+// past the last of them, so neither replay has a race to lose.
+//
+// 30 seeds by default; VELMORA_PROPERTY_SEEDS=N runs seeds 1..N (ctest -C property -L property
+// runs 300, see docs/testing.md). VELMORA_PROPERTY_WHOLE_TIMELINE=1 also asks the real-time
+// replay for the whole timeline and every printed line of --fast, trace times included.
+// A failing seed is reproduced with velmora-gen-trace (the arguments are in the failure).
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <condition_variable>
+#include <cstdio>
+#include <cstdlib>
+#include <functional>
+#include <mutex>
+#include <sstream>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "host/platform/HostEnvironment.h"
+#include "tests/host/HostTestSupport.h"
+#include "tools/replay/ReplaySession.h"
+#include "tools/tracegen/TraceGenerator.h"
+
+namespace velmora {
+namespace {
+
+constexpr int kDefaultSeeds = 30;
+constexpr double kSpeed = 20;
+// Real seconds a real-time replay may take beyond its trace's duration at kSpeed before the
+// test gives up on it (a replay that hangs would otherwise hold the suite until its timeout).
+constexpr int kSlackSeconds = 5;
+
+int seedCount() {
+    const char* text = getenv("VELMORA_PROPERTY_SEEDS");
+    const int n = text != nullptr ? atoi(text) : 0;
+    return n > 0 ? n : kDefaultSeeds;
+}
+
+bool wholeTimeline() {
+    const char* text = getenv("VELMORA_PROPERTY_WHOLE_TIMELINE");
+    return text != nullptr && text[0] == '1';
+}
+
+TraceGenOptions traceOptions(uint64_t seed) {
+    TraceGenOptions options;
+    options.seed = seed;
+    options.durationMs = 2000;
+    options.meanGapMs = 25;
+    options.marginMs = 20;
+    return options;
+}
+
+struct Replayed {
+    int status = -1;
+    int calls = -1;
+    std::string printed;                // everything the replay printed
+    std::vector<std::string> results;   // "file:line call -> result", without the trace time
+    std::string summary;                // the node table
+    std::vector<std::string> reports;   // report lines, clock stamps blanked
+    std::string reportFile;             // the event log as written
+    std::string timeline;
+};
+
+// Ends the test program with a message if `run` has not returned within `seconds`.
+void withinSeconds(int seconds, const std::string& what, const std::function<void()>& run) {
+    std::mutex lock;
+    std::condition_variable done;
+    bool finished = false;
+    std::thread watchdog([&] {
+        std::unique_lock<std::mutex> hold(lock);
+        if (!done.wait_for(hold, std::chrono::seconds(seconds), [&] { return finished; })) {
+            fprintf(stderr, "ReplayPropertyTest: %s did not finish in %d s\n", what.c_str(),
+                    seconds);
+            fflush(stderr);
+            _exit(1);
+        }
+    });
+    run();
+    {
+        std::lock_guard<std::mutex> hold(lock);
+        finished = true;
+    }
+    done.notify_one();
+    watchdog.join();
+}
+
+Replayed replay(const std::string& dir, const std::string& trace, bool fast) {
+    ReplayOptions options = hosttest::replayOptions(dir, trace);
+    options.configDirs = {hosttest::examplesDir()};
+    options.quiet = false;
+    options.fast = fast;
+    options.speed = fast ? 1.0 : kSpeed;
+    Replayed r;
+    FILE* out = tmpfile();
+    {
+        ReplaySession session(options, out, stderr);
+        r.status = session.run();
+        r.calls = session.calls();
+        r.summary = session.summaryText();
+    }
+    r.printed = hosttest::readAndClose(out);
+    std::istringstream lines(r.printed);
+    for (std::string line; std::getline(lines, line);) {
+        if (line.compare(0, 1, "[") == 0 && line.find("] ") != std::string::npos) {
+            r.results.push_back(line.substr(line.find("] ") + 2));
+        }
+    }
+    for (std::string line : HostEnvironment::get().eventLog().lines()) {
+        if (line.size() >= 21) {
+            line.replace(7, 14, 14, '#');  // "#ARG1:<" YYYYMMDDhhmmss
+        }
+        r.reports.push_back(line);
+    }
+    r.reportFile = hosttest::readFile(options.eventLogPath);
+    r.timeline = hosttest::readFile(options.timelinePath);
+    return r;
+}
+
+class ReplayPropertyTest : public testing::TestWithParam<uint64_t> {
+protected:
+    void SetUp() override {
+        mDir = hosttest::makeScratchDir("property-" + std::to_string(GetParam()));
+        mTrace = mDir + "/random.trace";
+        hosttest::writeFile(mTrace, TraceGenerator::generate(traceOptions(GetParam()), &mStats));
+    }
+
+    // How to write this seed's trace again, for a failure message.
+    std::string reproduce() const {
+        return "trace: velmora-gen-trace " + TraceGenerator::arguments(traceOptions(GetParam()));
+    }
+
+    std::string mDir;
+    std::string mTrace;
+    TraceGenStats mStats;
+};
+
+TEST_P(ReplayPropertyTest, FastReplayRepeatsItselfExactly) {
+    SCOPED_TRACE(reproduce());
+    const Replayed first = replay(mDir, mTrace, true);
+    const Replayed second = replay(mDir, mTrace, true);
+
+    ASSERT_EQ(ReplaySession::kOk, first.status);
+    // Every host call of the trace was made, the ones stamped in the past included.
+    EXPECT_EQ(mStats.hostCalls, first.calls);
+    EXPECT_EQ(first.printed, second.printed);
+    EXPECT_EQ(first.timeline, second.timeline);
+    EXPECT_EQ(first.reportFile, second.reportFile);
+}
+
+TEST_P(ReplayPropertyTest, RealTimeEndsLikeFast) {
+    SCOPED_TRACE(reproduce());
+    // One directory for both, so that even the paths they print are the same.
+    const Replayed fast = replay(mDir, mTrace, true);
+    Replayed real;
+    const int limit = static_cast<int>(mStats.endMs / 1000 / kSpeed) + kSlackSeconds;
+    withinSeconds(limit, "the --speed 20 replay of seed " + std::to_string(GetParam()) + " (" +
+                             reproduce() + ")",
+                  [&] { real = replay(mDir, mTrace, false); });
+
+    ASSERT_EQ(ReplaySession::kOk, real.status);
+    EXPECT_EQ(fast.summary, real.summary);
+    EXPECT_EQ(fast.results, real.results);
+    EXPECT_EQ(fast.reports, real.reports);
+    if (wholeTimeline()) {
+        EXPECT_EQ(fast.timeline, real.timeline);
+        EXPECT_EQ(fast.printed, real.printed);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Seeds, ReplayPropertyTest, testing::Range<uint64_t>(1, seedCount() + 1),
+                         [](const testing::TestParamInfo<uint64_t>& info) {
+                             return "seed" + std::to_string(info.param);
+                         });
+
+}  // namespace
+}  // namespace velmora
