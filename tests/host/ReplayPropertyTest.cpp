@@ -173,6 +173,48 @@ TEST_P(ReplayPropertyTest, RealTimeEndsLikeFast) {
     }
 }
 
+// The generated probes reach both of the worker's ways to boost, as the margins assume: a thread
+// is boosted 8 ms after its request, or at once when its process's main thread is boosted; and
+// a boost lasts at most its 256 ms lifetime, ending on time or at a later request's boost.
+TEST(ReplayPropertyProbeTest, BoostsStartAtTheRequestOrEightMsLater) {
+    int atOnce = 0;
+    int delayed = 0;
+    for (uint64_t seed = 1; seed <= 10; ++seed) {
+        SCOPED_TRACE(seed);
+        const std::string dir = hosttest::makeScratchDir("probe-paths");
+        const std::string trace = dir + "/random.trace";
+        hosttest::writeFile(trace, TraceGenerator::generate(traceOptions(seed)));
+        ReplayOptions options = hosttest::replayOptions(dir, trace);
+        options.configDirs = {hosttest::examplesDir()};
+        FILE* out = tmpfile();
+        ReplaySession session(options, out, stderr);
+        ASSERT_EQ(ReplaySession::kOk, session.run());
+        fclose(out);
+        const InsightResult& result = session.insight();
+        for (const SpanInsight& span : result.spans) {
+            if (span.category != "probe") {
+                continue;
+            }
+            // The last boost request of that thread id before the boost began.
+            const std::string tid = "|tid=" + span.name.substr(span.name.find(' ') + 1) + "\"";
+            int64_t requestUs = -1;
+            for (const CallRef& call : result.calls) {
+                if (call.us <= span.beginUs && call.text.find("event 4116 0 ") != std::string::npos &&
+                    call.text.find(tid) != std::string::npos) {
+                    requestUs = call.us;
+                }
+            }
+            const int64_t delayUs = span.beginUs - requestUs;
+            EXPECT_TRUE(requestUs >= 0 && (delayUs == 0 || delayUs == 8000))
+                << span.name << " boosted at " << span.beginUs << " us, asked at " << requestUs;
+            EXPECT_LE(span.endUs - span.beginUs, 264000) << span.name << " at " << span.beginUs;
+            (delayUs == 0 ? atOnce : delayed) += 1;
+        }
+    }
+    EXPECT_GT(atOnce, 0);
+    EXPECT_GT(delayed, 0);
+}
+
 INSTANTIATE_TEST_SUITE_P(Seeds, ReplayPropertyTest, testing::Range<uint64_t>(1, seedCount() + 1),
                          [](const testing::TestParamInfo<uint64_t>& info) {
                              return "seed" + std::to_string(info.param);

@@ -81,8 +81,11 @@ std::pair<int, int> DeviceUseModel::probedThread() {
     if (mRandom.chance(3000)) {
         return {pid, 0};  // thread id 0: queued like any other, never boosted on the platform
     }
-    // Main threads often enough that a render thread finds its process already boosted.
-    return {pid, mRandom.chance(300000) ? pid : pid + 1 + static_cast<int>(mRandom.below(24))};
+    return {pid, mRandom.chance(400000) ? pid : renderThread(pid)};
+}
+
+int DeviceUseModel::renderThread(int pid) {
+    return pid + 1 + static_cast<int>(mRandom.below(24));
 }
 
 std::string DeviceUseModel::threadMsg(const std::pair<int, int>& thread) const {
@@ -90,32 +93,47 @@ std::string DeviceUseModel::threadMsg(const std::pair<int, int>& thread) const {
            "\"";
 }
 
-GeneratedCall DeviceUseModel::probe() {
-    GeneratedCall call;
-    call.probe = true;
-    if (!mProbed.empty() && (mProbed.size() >= kMostProbed || mRandom.chance(450000))) {
-        const size_t i = static_cast<size_t>(mRandom.below(mProbed.size()));
-        call.text = event(4116, -1) + " " + threadMsg(mProbed[i]);
-        mProbed.erase(mProbed.begin() + static_cast<std::ptrdiff_t>(i));
-        call.deadlines = {0};
-        return call;
-    }
-    if (mRandom.chance(40000)) {  // a withdrawal of a thread that was never asked for
-        call.text = event(4116, -1) + " " + threadMsg(probedThread());
-        call.deadlines = {0};
-        return call;
-    }
-    // Mostly a new thread; now and then one asked for already (which keeps its timer).
-    const std::pair<int, int> thread =
-        !mProbed.empty() && mRandom.chance(80000) ? mRandom.among(mProbed) : probedThread();
+GeneratedCall DeviceUseModel::probeRequest(const std::pair<int, int>& thread) {
     if (std::find(mProbed.begin(), mProbed.end(), thread) == mProbed.end()) {
         mProbed.push_back(thread);
     }
+    GeneratedCall call;
+    call.probe = true;
     call.text = event(4116, 0) + " " + threadMsg(thread);
     // Boosted at once (its process is boosted) or after the delay; either way withdrawn by the
     // worker a lifetime later.
     call.deadlines = {0, kProbeDelayMs, kProbeLifetimeMs, kProbeDelayMs + kProbeLifetimeMs};
     return call;
+}
+
+GeneratedCall DeviceUseModel::probeWithdrawal(const std::pair<int, int>& thread) {
+    GeneratedCall call;
+    call.probe = true;
+    call.text = event(4116, -1) + " " + threadMsg(thread);
+    call.deadlines = {0};
+    return call;
+}
+
+GeneratedCall DeviceUseModel::probe() {
+    // Often a main thread asked for is followed by its render threads: they skip the delay
+    // while the main thread is boosted.
+    auto main = std::find_if(mProbed.begin(), mProbed.end(),
+                             [](const std::pair<int, int>& t) { return t.first == t.second; });
+    if (main != mProbed.end() && mProbed.size() < kMostProbed && mRandom.chance(500000)) {
+        return probeRequest({main->first, renderThread(main->first)});
+    }
+    if (!mProbed.empty() && (mProbed.size() >= kMostProbed || mRandom.chance(450000))) {
+        const size_t i = static_cast<size_t>(mRandom.below(mProbed.size()));
+        const std::pair<int, int> thread = mProbed[i];
+        mProbed.erase(mProbed.begin() + static_cast<std::ptrdiff_t>(i));
+        return probeWithdrawal(thread);
+    }
+    if (mRandom.chance(40000)) {
+        return probeWithdrawal(probedThread());  // a thread that was never asked for
+    }
+    // Mostly a new thread; now and then one asked for already (which keeps its timer).
+    return probeRequest(!mProbed.empty() && mRandom.chance(80000) ? mRandom.among(mProbed)
+                                                                 : probedThread());
 }
 
 std::string DeviceUseModel::policyLine(const char* name, int* policy) {

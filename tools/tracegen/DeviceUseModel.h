@@ -83,7 +83,10 @@ private:
     GeneratedCall thermalClient();
     GeneratedCall levelClient();
     GeneratedCall query();
+    GeneratedCall probeRequest(const std::pair<int, int>& thread);
+    GeneratedCall probeWithdrawal(const std::pair<int, int>& thread);
     std::pair<int, int> probedThread();
+    int renderThread(int pid);
     std::string threadMsg(const std::pair<int, int>& thread) const;
     int frequencyFor(int tag);
 
