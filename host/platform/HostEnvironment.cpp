@@ -1,6 +1,7 @@
 #include "host/platform/HostEnvironment.h"
 
 #include <errno.h>
+#include <ftw.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -13,6 +14,12 @@
 namespace velmora {
 
 namespace {
+
+constexpr const char* kSimulatedMarker = "/.velmora-simulated";
+
+int removeEntry(const char* path, const struct stat*, int, struct FTW*) {
+    return remove(path) == 0 ? 0 : -1;
+}
 
 bool makeDirs(const std::string& dir) {
     for (size_t pos = dir.find('/', 1);; pos = dir.find('/', pos + 1)) {
@@ -53,7 +60,7 @@ std::string HostEnvironment::defaultSimulatedRoot() {
 }
 
 void HostEnvironment::reset() {
-    mClock.setRealTime(1.0);
+    mClock.setVirtual();
     mTimeline.clear();
     mNodeMap = NodeMap();
     mProperties.reset();
@@ -81,7 +88,7 @@ int HostEnvironment::useDeviceRoot(const std::string& root, bool fresh) {
         VLOGE("host: cannot create device root %s: %s", root.c_str(), strerror(errno));
         return -1;
     }
-    const std::string marker = root + "/.velmora-simulated";
+    const std::string marker = root + kSimulatedMarker;
     struct stat st;
     if (fresh || stat(marker.c_str(), &st) != 0) {
         if (mDevice.seed() != 0) {
@@ -104,6 +111,24 @@ int HostEnvironment::prepareDevice() {
         }
     }
     return useDeviceRoot(mDevice.root(), false);
+}
+
+bool HostEnvironment::removeSimulatedRoot(const std::string& root, std::string* error) {
+    struct stat st;
+    if (root.empty() || root == "/" || stat((root + kSimulatedMarker).c_str(), &st) != 0) {
+        *error = "not removing " + root + ": not a simulated device";
+        return false;
+    }
+    mDevice.setRoot(defaultSimulatedRoot());  // closes the nodes it has open
+    {
+        std::lock_guard<std::mutex> lock(mLock);
+        mPrepared = false;
+    }
+    if (nftw(root.c_str(), removeEntry, 16, FTW_DEPTH | FTW_PHYS) != 0) {
+        *error = "cannot remove the simulated device " + root + ": " + strerror(errno);
+        return false;
+    }
+    return true;
 }
 
 }  // namespace velmora

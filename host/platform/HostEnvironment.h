@@ -32,7 +32,7 @@ class HostEnvironment {
 public:
     static HostEnvironment& get();
 
-    // Everything back to the defaults: real-time clock at speed 1, empty timeline and event
+    // Everything back to the defaults: an unpaced clock at 0, empty timeline and event
     // log, default node map and properties, no policies, the default simulated device root.
     void reset();
 
@@ -43,6 +43,9 @@ public:
     int prepareDevice();
     // Directory of the default simulated device: /tmp/velmora-sim-<pid>.
     static std::string defaultSimulatedRoot();
+    // Deletes the simulated device at `root` with everything in it, and goes back to the
+    // default root. Refuses (false, `error` set) a directory this layer did not seed.
+    bool removeSimulatedRoot(const std::string& root, std::string* error);
 
     HostClock& clock() { return mClock; }
     Timeline& timeline() { return mTimeline; }

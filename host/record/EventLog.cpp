@@ -57,7 +57,7 @@ void EventLog::clear() {
 
 void EventLog::write(int prio, int tag, const std::string& line) {
     const int64_t ms = mClock.nowMs();
-    const std::string text = mClock.isVirtual() ? restamped(line, ms) : line;
+    const std::string text = restamped(line, ms);
     mTimeline.recordInstant("report", text);
     std::lock_guard<std::mutex> lock(mLock);
     mLines.push_back(text);

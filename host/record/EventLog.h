@@ -1,6 +1,6 @@
 // The device event log of the host: every line the library reports (frequency-limit periods)
 // is kept in memory, appended to a file when one is set, and marked on the timeline.
-// In virtual time a report line's wall-clock stamp ("#ARG1:<YYYYMMDDhhmmss,...") is replaced by
+// A report line's wall-clock stamp ("#ARG1:<YYYYMMDDhhmmss,...") is replaced by
 // the trace time counted from 2000-01-01 00:00:00 UTC, so that a replay is the same every run.
 // Thread safe.
 #pragma once
@@ -24,7 +24,7 @@ public:
     std::string path() const;
     void clear();
 
-    // Records one line with its priority and event tag (restamped in virtual time).
+    // Records one line with its priority and event tag (restamped with the trace time).
     void write(int prio, int tag, const std::string& text);
     std::vector<std::string> lines() const;
 

@@ -29,22 +29,16 @@ void HostProbeClock::sleepMs(int64_t ms) {
     mClock.workerSleep(mWorkerId, ms);
 }
 
-void HostProbeClock::wait(android::Condition& cond, android::Mutex& lock) {
-    if (!mClock.isVirtual()) {
-        mClock.workerWaiting(mWorkerId);
-        cond.wait(lock);
-        mClock.workerResumed(mWorkerId);
-        return;
-    }
+void HostProbeClock::wait(android::Condition& /*cond*/, android::Mutex& lock) {
     // The worker's mutex is held on entry and on return; in between the clock lets it go.
     auto release = [&lock]() NO_THREAD_SAFETY_ANALYSIS { lock.unlock(); };
     auto reacquire = [&lock]() NO_THREAD_SAFETY_ANALYSIS { lock.lock(); };
     mClock.workerWait(mWorkerId, release, reacquire);
 }
 
-void HostProbeClock::signal(android::Condition& cond) {
+void HostProbeClock::signal(android::Condition& /*cond*/) {
+    // The worker waits on the clock, never on its condition.
     mClock.workerSignal(mWorkerId);
-    cond.signal();
 }
 
 void HostProbeClock::wakeForExit() {

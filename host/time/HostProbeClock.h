@@ -1,6 +1,6 @@
-// The library's probe worker on the host clock: its time is trace time, its sleeps and waits go
-// through HostClock, so at --speed 10 boosts come ten times sooner in real time and in virtual
-// time each pass runs at the exact trace time it would on a device.
+// The library's probe worker on the host clock: its time is trace time and its sleeps and waits
+// go through HostClock, so each pass runs at the exact trace time it would on a device, whether
+// the replay is paced by the wall clock or not.
 //
 // One per probe worker, made by the factory the host layer installs (HostEnvironment) when the
 // worker is built, i.e. while the server initialises; it attaches the worker to the clock as

@@ -1,22 +1,18 @@
 // Deadlines of timed actions: an action applied with a positive duration is reverted when its
 // deadline passes, unless the same command re-arms it first or withdraws it.
 //
-// A worker thread waits for the earliest deadline in real time (scaled by the clock's speed) and
-// is woken only when the earliest deadline changes. In virtual time the clock asks for the
-// earliest deadline and runs expireDue() on the advancing thread when it gets there, so expiry
-// happens exactly at the trace time it falls due. The expiry callback runs without the
-// scheduler's lock; it must re-check armed() under its own lock, because the command may have
-// been re-armed between expiry and callback. Lock order: mExpiryLock, then the caller's lock,
-// then mLock, then the clock's lock.
+// The scheduler is a listener of the clock: an advance stops at the earliest deadline and runs
+// expireDue() on the advancing thread there, so expiry happens exactly at the trace time it
+// falls due, paced or not. The expiry callback runs without the scheduler's lock; it must
+// re-check armed() under its own lock, because a host thread may have re-armed the command
+// between expiry and callback. Lock order: the caller's lock, then mLock, then the clock's.
 #pragma once
 
-#include <condition_variable>
 #include <cstdint>
 #include <functional>
 #include <map>
 #include <mutex>
 #include <set>
-#include <thread>
 #include <utility>
 
 #include "host/time/HostClock.h"
@@ -28,7 +24,7 @@ public:
     using ExpiryCallback = std::function<void(int cmdId)>;
 
     TimedActionScheduler(HostClock& clock, ExpiryCallback onExpire);
-    // Stops the worker; pending deadlines are dropped without callbacks.
+    // Pending deadlines are dropped without callbacks; no callback runs once this returns.
     ~TimedActionScheduler();
 
     // (Re-)arms `cmdId` to expire `durationMs` of clock time from now.
@@ -43,7 +39,6 @@ public:
     void expireDue();
 
 private:
-    void run();
     // REQUIRES: mLock held.
     int64_t earliestLocked() const;
     bool eraseLocked(int cmdId);
@@ -51,14 +46,9 @@ private:
     HostClock& mClock;
     ExpiryCallback mOnExpire;
     int mListenerId = 0;
-    // Held for a whole expireDue, callbacks included; taken before the callbacks' locks.
-    std::mutex mExpiryLock;
     mutable std::mutex mLock;                   // guards everything below
-    std::condition_variable mCond;              // the earliest deadline changed, or stop
     std::map<int, int64_t> mDeadlines;          // cmdId -> trace time in ms
     std::set<std::pair<int64_t, int>> mByTime;  // (trace time, cmdId), earliest first
-    bool mStop = false;
-    std::thread mThread;  // last: started once everything above exists
 };
 
 }  // namespace velmora

@@ -3,6 +3,8 @@
 // a simulated device in virtual time, so expiry happens exactly when the clock is advanced.
 #include <gtest/gtest.h>
 
+#include <chrono>
+
 #include <unistd.h>
 
 #include <memory>
@@ -166,18 +168,29 @@ TEST_F(HostExecutorTest, ReportsARefusedWriteAndKeepsTheRoundedOne) {
               notes[1].name);
 }
 
-class HostExecutorRealTime : public HostExecutorTest {
+class HostExecutorPaced : public HostExecutorTest {
 protected:
-    void setClock() override { mClock.setRealTime(50.0); }  // 1000 trace ms in 20 real ms
+    void setClock() override { mClock.setPaced(50.0); }  // 1000 trace ms in 20 real ms
 };
 
-TEST_F(HostExecutorRealTime, TimerThreadRevertsWithoutAnyCaller) {
+TEST_F(HostExecutorPaced, RevertsAtItsTraceTimeAfterTheWallClockGetsThere) {
+    mClock.restart();  // the pacing counts from here, not from the fixture's set-up
+    const auto start = std::chrono::steady_clock::now();
     ASSERT_EQ(0, apply(action(4099, 1000, {7, 500000000}), 0));
-    // Generous bound: the revert is due after 20 ms real.
-    for (int i = 0; i < 200 && node("gpu.min") != "257000000"; ++i) {
-        usleep(10000);
-    }
+    mClock.advanceTo(999);
+    EXPECT_EQ("500000000", node("gpu.min"));
+    mClock.advanceTo(1000);
     EXPECT_EQ("257000000", node("gpu.min"));
+    EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(19));
+    // An interrupt stops the advance under way where the wall clock has got to, and pacing
+    // for good: the next trace minute passes without waiting for it.
+    mClock.interrupt();
+    mClock.advanceTo(100000);
+    EXPECT_LT(mClock.nowMs(), 100000);
+    const auto interrupted = std::chrono::steady_clock::now();
+    mClock.advanceTo(100000);
+    EXPECT_EQ(100000, mClock.nowMs());
+    EXPECT_LT(std::chrono::steady_clock::now() - interrupted, std::chrono::seconds(1));
 }
 
 }  // namespace

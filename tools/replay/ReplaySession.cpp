@@ -19,7 +19,9 @@
 #include "tools/insight/InsightJson.h"
 #include "tools/insight/InsightSummary.h"
 #include "tools/insight/ReplayInsight.h"
+#include "tools/replay/PacedLineReader.h"
 #include "tools/replay/ProgressLine.h"
+#include "tools/replay/SameCpuScope.h"
 
 namespace velmora {
 
@@ -34,6 +36,8 @@ constexpr const char* kWinSwitchPolicy = kWinSwitchPolicyName;
 constexpr int64_t kProbeDrainLimitMs = 1000;
 constexpr int64_t kProbeDrainStepMs = 1;
 constexpr int64_t kProbeSettleMs = 20;
+// How often a paced interactive replay brings the device up to the wall clock between lines.
+constexpr int kInteractiveTickMs = 10;
 
 std::string directoryOf(const std::string& path) {
     const size_t slash = path.find_last_of('/');
@@ -63,7 +67,7 @@ int ReplaySession::setUp() {
     if (mOptions.fast) {
         env.clock().setVirtual();
     } else {
-        env.clock().setRealTime(mOptions.speed);
+        env.clock().setPaced(mOptions.speed);
     }
     std::string error;
     if (!mOptions.devicePath.empty()) {
@@ -92,6 +96,8 @@ int ReplaySession::setUp() {
     }
     const std::string root =
         mOptions.deviceRoot.empty() ? HostEnvironment::defaultSimulatedRoot() : mOptions.deviceRoot;
+    // A device root of our own making goes again at the end; one the user named stays.
+    mOwnedRoot = mOptions.deviceRoot.empty() ? root : std::string();
     if (env.useDeviceRoot(root, /*fresh=*/true) != 0) {
         fprintf(mErr, "velmora-replay: device root %s is not usable\n", root.c_str());
         return kSetupFailed;
@@ -110,12 +116,15 @@ int ReplaySession::setUp() {
         if (env.device().read(node.key, &text) && mInsight != nullptr)
             mInsight->setInitial(node.key, text);
     }
+    if (mOptions.fast)
+        mSameCpu.reset(new SameCpuScope());
     mServer.reset(new VelmoraServer());
     const int status = mServer->init();
     if (auto* plat = dynamic_cast<HostPlatform*>(mServer->mPlatPtr); plat && mInsight) {
         plat->executor()->setObserver(mInsight.get());
     }
     fprintf(mOut, "init -> %d (device %s)\n", status, root.c_str());
+    env.clock().alignWall();  // trace time 0 is the end of the initialisation
     // 4 means the probe command is missing; everything else is running.
     if (status != 0 && status != 4) {
         fprintf(mErr,
@@ -123,6 +132,7 @@ int ReplaySession::setUp() {
                 "velmora-lint %s\n",
                 status, env.properties().findConfigFile("xml/velmora_config_cust.xml").c_str());
         mServer.reset();
+        mSameCpu.reset();
         return kSetupFailed;
     }
     return kOk;
@@ -183,9 +193,19 @@ int ReplaySession::perform(const TraceCall& call) {
 
 int ReplaySession::performCall(const TraceCall& call) {
     HostEnvironment& env = HostEnvironment::get();
-    // In virtual time this also lets the probe worker finish what the last call gave it, so a
-    // line without a time runs after it, as it would a moment later on a device.
+    if (call.atMs >= 0 && call.atMs < env.clock().nowMs()) {
+        fprintf(mErr,
+                "velmora-replay: %s:%d: warning: @%lld is before the time already reached "
+                "(%lld ms); the call runs at %lld ms\n",
+                call.file.c_str(), call.line, static_cast<long long>(call.atMs),
+                static_cast<long long>(env.clock().nowMs()),
+                static_cast<long long>(env.clock().nowMs()));
+    }
+    // This also lets the probe worker finish what the last call gave it, so a line without a
+    // time runs after it, as it would a moment later on a device.
     env.clock().advanceTo(call.atMs >= 0 ? call.atMs : env.clock().nowMs());
+    if (env.clock().interrupted())
+        return 0;  // interrupted on the way: the call never came
     int status = 0;
     std::string result;
     switch (call.kind) {
@@ -248,20 +268,16 @@ int ReplaySession::replayFile() {
     if (setup != kOk)
         return setup;
     warnAboutCalls(calls);
-    // In real time the clock is held at the next timed call, so that calls are never late.
     HostClock& clock = HostEnvironment::get().clock();
     ProgressLine progress(mErr);
-    for (size_t i = 0; i < calls.size(); ++i) {
-        size_t next = i;
-        while (next < calls.size() && calls[next].atMs < 0) {
-            ++next;
+    for (const auto& call : calls) {
+        if (clock.interrupted()) {
+            break;
         }
-        clock.holdAt(next < calls.size() ? calls[next].atMs : HostClock::kNoDeadline);
-        perform(calls[i]);
+        perform(call);
         progress.update(clock.nowMs(), mCalls);
     }
     progress.clear();
-    clock.holdAt(HostClock::kNoDeadline);
     return kOk;
 }
 
@@ -270,12 +286,28 @@ int ReplaySession::replayInteractive() {
     if (setup != kOk)
         return setup;
     int result = kOk;
-    char buffer[4096];
     int lineNo = 0;
-    while (fgets(buffer, sizeof(buffer), mInput) != nullptr) {
-        std::string line(buffer);
-        if (!line.empty() && line.back() == '\n')
-            line.pop_back();
+    HostClock& clock = HostEnvironment::get().clock();
+    // Paced, the device follows the wall clock between lines too; unpaced, time moves only
+    // with the "@" stamps of the lines.
+    const bool paced = clock.paced() && fileno(mInput) >= 0;
+    auto catchUp = [&clock] { clock.advanceTo(clock.wallUs() / 1000); };
+    PacedLineReader reader(paced ? fileno(mInput) : -1, catchUp, kInteractiveTickMs);
+    auto stop = [&clock] { return clock.interrupted(); };
+    std::string line;
+    char buffer[4096];
+    for (;;) {
+        if (paced) {
+            if (!reader.next(&line, stop))
+                break;
+            catchUp();
+        } else {
+            if (clock.interrupted() || fgets(buffer, sizeof(buffer), mInput) == nullptr)
+                break;
+            line = buffer;
+            if (!line.empty() && line.back() == '\n')
+                line.pop_back();
+        }
         std::vector<TraceCall> calls;
         std::string error;
         if (TraceParser::parseLine(line, "<stdin>", ++lineNo, &calls, &error) != 0) {
@@ -344,6 +376,17 @@ void ReplaySession::tearDown() {
         plat->executor()->setObserver(nullptr);
     }
     mServer.reset();
+    mSameCpu.reset();
+    removeOwnedRoot();
+}
+
+void ReplaySession::removeOwnedRoot() {
+    if (mOwnedRoot.empty())
+        return;
+    std::string error;
+    if (!HostEnvironment::get().removeSimulatedRoot(mOwnedRoot, &error))
+        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+    mOwnedRoot.clear();
 }
 
 void ReplaySession::finishInsight() {
@@ -446,6 +489,9 @@ int ReplaySession::run() {
     finishInsight();
     tearDown();
     HostEnvironment& env = HostEnvironment::get();
+    if (env.clock().interrupted())
+        fprintf(mOut, "\ninterrupted at %lld ms: what ran so far\n",
+                static_cast<long long>(env.clock().nowMs()));
     fprintf(mOut, "\n%d host calls, %d with a nonzero status, %zu report lines\n\n", mCalls,
             mFailed, env.eventLog().lines().size());
     fputs(summaryText().c_str(), mOut);

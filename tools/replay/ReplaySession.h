@@ -20,6 +20,7 @@ class VelmoraServer;
 namespace velmora {
 
 class ReplayInsight;
+class SameCpuScope;
 
 struct ReplayOptions {
     std::string tracePath;                // ignored when interactive
@@ -76,6 +77,8 @@ private:
     // configuration lacks, launch-policy names the server never asks for.
     void warnAboutCalls(const std::vector<TraceCall>& calls);
     void waitForProbeBoosts();
+    // Removes the simulated device root when this session made it.
+    void removeOwnedRoot();
     void echo(const TraceCall& call, const std::string& result);
     std::string commandName(int cmdId) const;
     int writeOutputs();
@@ -84,6 +87,9 @@ private:
     FILE* mOut;
     FILE* mErr;
     FILE* mInput;
+    std::string mOwnedRoot;  // the simulated device root made by setUp, removed at tear-down
+    // --fast: the replay thread and the probe worker share one processor (SameCpuScope.h).
+    std::unique_ptr<SameCpuScope> mSameCpu;
     std::unique_ptr<VelmoraServer> mServer;
     std::unique_ptr<ReplayInsight> mInsight;  // watches the executor while the server runs
     InsightResult mResult;

@@ -1,10 +1,13 @@
 // velmora-replay: replays an event trace against the server on the host platform layer.
 // See docs/replay.md for the trace format.
+#include <signal.h>
+
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <string>
 
+#include "host/platform/HostEnvironment.h"
 #include "tools/replay/ComparisonRun.h"
 #include "tools/replay/InstalledExample.h"
 #include "tools/replay/ReplaySession.h"
@@ -19,12 +22,13 @@ void usage(FILE* to) {
         "                       default: the trace's directory, then the installed example\n"
         "                       in <prefix>/share/velmora/examples)\n"
         "  --root DIR           device root: a fresh simulated device is created there\n"
-        "                       (default /tmp/velmora-sim-<pid>); \"/\" writes the real nodes\n"
+        "                       and kept (default /tmp/velmora-sim-<pid>, removed at the\n"
+        "                       end); \"/\" writes the real nodes\n"
         "  --device FILE        device profile (default: the example device,\n"
         "                       examples/device/example-device.xml)\n"
         "  --nodes FILE         node map overrides\n"
-        "  --speed X            replay X times faster than real time\n"
-        "  --fast               do not wait at all (virtual time)\n"
+        "  --speed X            pace the replay at X times real time (default 1)\n"
+        "  --fast               no pacing: same results, no waiting at all\n"
         "  --timeline FILE      Chrome JSON timeline (default velmora-timeline.json)\n"
         "  --event-log FILE     device event log lines (default velmora-events.log)\n"
         "  --property KEY=VAL   system property seen by the server (repeatable)\n"
@@ -36,6 +40,30 @@ void usage(FILE* to) {
         "  --interactive        read calls from stdin\n",
         to);
 }
+
+// Ctrl-C (or a polite kill) during a replay: the clock stops pacing and the replay stops after
+// the call in progress, then reports what ran so far and cleans up. A second one ends the
+// process at once.
+velmora::HostClock* gClock = nullptr;
+
+void onInterrupt(int) {
+    if (gClock != nullptr) {
+        gClock->interrupt();
+    }
+}
+
+void catchInterrupts() {
+    gClock = &velmora::HostEnvironment::get().clock();
+    struct sigaction action = {};
+    action.sa_handler = onInterrupt;
+    action.sa_flags = SA_RESETHAND;  // no SA_RESTART: a read of stdin ends with EINTR
+    sigemptyset(&action.sa_mask);
+    sigaction(SIGINT, &action, nullptr);
+    sigaction(SIGTERM, &action, nullptr);
+}
+
+// Exit status after an interrupt, as a shell reports a process ended by SIGINT.
+constexpr int kInterrupted = 130;
 
 }  // namespace
 
@@ -117,6 +145,8 @@ int main(int argc, char** argv) {
         velmora::ComparisonRun comparison(options, compareDir, stdout, stderr);
         return comparison.run();
     }
+    catchInterrupts();
     velmora::ReplaySession session(options, stdout, stderr);
-    return session.run();
+    const int status = session.run();
+    return gClock->interrupted() ? kInterrupted : status;
 }
