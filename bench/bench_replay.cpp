@@ -155,8 +155,8 @@ void writeJson(const std::string& path, const std::vector<Case>& cases) {
                 "  {\"load\": \"%s\", \"trace\": \"%s\", \"runs\": %zu, \"calls\": %ld, "
                 "\"wall_s\": %.3f, \"calls_per_s\": %.0f, \"cpu_us_per_call\": %.2f, "
                 "\"max_rss_mb\": %.1f}%s\n",
-                c.load.c_str(), c.trace.c_str(), c.runs.size(), calls, median(wall),
-                median(rate), median(cpuUs), median(rssMb), i + 1 < cases.size() ? "," : "");
+                c.load.c_str(), c.trace.c_str(), c.runs.size(), calls, median(wall), median(rate),
+                median(cpuUs), median(rssMb), i + 1 < cases.size() ? "," : "");
     }
     fprintf(out, "]}\n");
     fclose(out);
@@ -180,8 +180,9 @@ int main(int argc, char** argv) {
         } else if (arg == "--seed") {
             seed = strtoull(argv[i + 1], nullptr, 0);
         } else {
-            fprintf(stderr, "usage: velmora_bench_replay [--repetitions N] [--out FILE.json] "
-                            "[--replay PATH] [--seed N]\n");
+            fprintf(stderr,
+                    "usage: velmora_bench_replay [--repetitions N] [--out FILE.json] "
+                    "[--replay PATH] [--seed N]\n");
             return 2;
         }
     }
@@ -207,11 +208,12 @@ int main(int argc, char** argv) {
                 Run run;
                 ok = replayOnce(replay, cases[c].trace == "probes" ? probes : none, &run);
                 cases[c].runs.push_back(run);
-                printf("%-6s %-9s %7ld calls in %6.3f s: %8.0f calls/s, %6.2f us CPU per call, "
-                       "%6.1f MB resident\n",
-                       cases[c].load.c_str(), cases[c].trace.c_str(), run.calls, run.wallS,
-                       run.calls / run.wallS, run.cpuS * 1e6 / std::max(1L, run.calls),
-                       run.maxRssKb / 1024.0);
+                printf(
+                    "%-6s %-9s %7ld calls in %6.3f s: %8.0f calls/s, %6.2f us CPU per call, "
+                    "%6.1f MB resident\n",
+                    cases[c].load.c_str(), cases[c].trace.c_str(), run.calls, run.wallS,
+                    run.calls / run.wallS, run.cpuS * 1e6 / std::max(1L, run.calls),
+                    run.maxRssKb / 1024.0);
                 fflush(stdout);
             }
         }

@@ -51,9 +51,9 @@ TraceGenOptions traceOptions(uint64_t seed) {
 struct Replayed {
     int status = -1;
     int calls = -1;
-    std::string printed;                // everything the replay printed
-    std::string summary;                // the node table
-    std::string reportFile;             // the event log as written
+    std::string printed;     // everything the replay printed
+    std::string summary;     // the node table
+    std::string reportFile;  // the event log as written
     std::string timeline;
 };
 
@@ -137,9 +137,10 @@ TEST_P(ReplayPropertyTest, PacedReplayWritesWhatFastWrites) {
     const Replayed fast = replay(mDir, mTrace, true);
     Replayed paced;
     const int limit = static_cast<int>(mStats.endMs / 1000 / kSpeed) + kSlackSeconds;
-    withinSeconds(limit, "the --speed 20 replay of seed " + std::to_string(GetParam()) + " (" +
-                             reproduce() + ")",
-                  [&] { paced = replay(mDir, mTrace, false); });
+    withinSeconds(
+        limit,
+        "the --speed 20 replay of seed " + std::to_string(GetParam()) + " (" + reproduce() + ")",
+        [&] { paced = replay(mDir, mTrace, false); });
 
     ASSERT_EQ(ReplaySession::kOk, paced.status);
     // The node table first: where a difference is easiest to read.
@@ -175,7 +176,8 @@ TEST(ReplayPropertyProbeTest, BoostsStartAtTheRequestOrEightMsLater) {
             const std::string tid = "|tid=" + span.name.substr(span.name.find(' ') + 1) + "\"";
             int64_t requestUs = -1;
             for (const CallRef& call : result.calls) {
-                if (call.us <= span.beginUs && call.text.find("event 4116 0 ") != std::string::npos &&
+                if (call.us <= span.beginUs &&
+                    call.text.find("event 4116 0 ") != std::string::npos &&
                     call.text.find(tid) != std::string::npos) {
                     requestUs = call.us;
                 }

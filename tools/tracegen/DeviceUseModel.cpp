@@ -47,8 +47,8 @@ const std::vector<int> kGpuHz = {257000000, 342000000, 414000000, 500000000,
                                  600000000, 700000000, 800000000, 900000000};
 
 const std::vector<int> kFreqTags = {1, 2, 4, 5, 7, 8};
-const std::vector<int> kQueryTags = {1,  2,  4,  5,  7,  8,  17, 18, 19, 20, 22, 24, 26,
-                                     50, 51, 52, 53, 54, 55, 56, 57, 58};
+const std::vector<int> kQueryTags = {1,  2,  4,  5,  7,  8,  17, 18, 19, 20, 22,
+                                     24, 26, 50, 51, 52, 53, 54, 55, 56, 57, 58};
 const std::vector<int> kPolicyMs = {-1, 300, 600, 900, 1200, 2000, 2500};
 const std::vector<int> kNotificationWords = {0x50000, 0x40000, 0x10000, 0};
 const std::vector<const char*> kRatios = {"0.3", "0.5", "0.6", "0.7", "0.9"};
@@ -133,7 +133,7 @@ GeneratedCall DeviceUseModel::probe() {
     }
     // Mostly a new thread; now and then one asked for already (which keeps its timer).
     return probeRequest(!mProbed.empty() && mRandom.chance(80000) ? mRandom.among(mProbed)
-                                                                 : probedThread());
+                                                                  : probedThread());
 }
 
 std::string DeviceUseModel::policyLine(const char* name, int* policy) {
@@ -319,7 +319,8 @@ GeneratedCall DeviceUseModel::oddCall(bool probes) {
             call.deadlines = {0};
             break;
         case 1:
-            call.text = event(4116, 0) + " msg=\"pid=" + std::to_string(mRandom.among(kPids)) + "\"";
+            call.text =
+                event(4116, 0) + " msg=\"pid=" + std::to_string(mRandom.among(kPids)) + "\"";
             call.probe = true;
             call.deadlines = {0};
             break;

@@ -25,8 +25,8 @@ struct GeneratedCall {
     // Deadlines the call arms, in ms after the call; 0 stands for the probe worker's pass
     // that follows a probe call.
     std::vector<int64_t> deadlines;
-    bool probe = false;     // an event 4116
-    bool hostCall = true;   // false for a policy answer, which only the host layer sees
+    bool probe = false;    // an event 4116
+    bool hostCall = true;  // false for a policy answer, which only the host layer sees
 };
 
 class DeviceUseModel {

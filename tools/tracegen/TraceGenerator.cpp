@@ -66,8 +66,8 @@ std::string TraceGenerator::run() {
     if (mOptions.marginMs > 0) {
         // The replay runs on until no probe boost is left, then kSettleMs more: the trace ends
         // past the last boost, and no deadline falls near either end.
-        const int64_t end = mBook.placeFrom(std::max(mNow, mLastProbeDeadline + mOptions.marginMs),
-                                            {kSettleMs});
+        const int64_t end =
+            mBook.placeFrom(std::max(mNow, mLastProbeDeadline + mOptions.marginMs), {kSettleMs});
         if (end > mNow) {
             line("sleep " + std::to_string(end - mNow));
             ++mStats.sleeps;
@@ -94,8 +94,8 @@ GeneratedCall TraceGenerator::nextCall() {
 std::string TraceGenerator::stamp(const std::vector<int64_t>& deadlines) {
     if (mRandom.chance(mOptions.backwardsPpm) && mBook.fits(mNow, deadlines)) {
         ++mStats.backwards;
-        const int64_t back = 1 + static_cast<int64_t>(
-                                     mRandom.below(std::min<int64_t>(mNow, kMostBackwardsMs)));
+        const int64_t back =
+            1 + static_cast<int64_t>(mRandom.below(std::min<int64_t>(mNow, kMostBackwardsMs)));
         return "@" + std::to_string(mNow - back) + " ";
     }
     if (mRandom.chance(kSameTimePpm) && mBook.fits(mNow, deadlines)) {

@@ -23,9 +23,9 @@ namespace velmora {
 
 struct TraceGenOptions {
     uint64_t seed = 1;
-    int64_t startMs = 100;     // time of the first call
-    int64_t durationMs = 3000; // no call starts after this trace time
-    int64_t meanGapMs = 40;    // mean trace time from one call to the next
+    int64_t startMs = 100;      // time of the first call
+    int64_t durationMs = 3000;  // no call starts after this trace time
+    int64_t meanGapMs = 40;     // mean trace time from one call to the next
     // Shares, in parts per million: of the calls that are probe events, of the lines that are
     // sleeps, of the calls stamped below the time reached, that are reloads, that are refused.
     uint32_t probePpm = 150000;
@@ -44,8 +44,8 @@ struct TraceGenStats {
     int64_t hostCalls = 0;    // events, reloads, setconfig and getconfig: what the replay counts
     int64_t probeEvents = 0;  // of the host calls
     int64_t sleeps = 0;
-    int64_t backwards = 0;    // calls stamped below the time reached
-    int64_t endMs = 0;        // trace time at the end of the last line
+    int64_t backwards = 0;  // calls stamped below the time reached
+    int64_t endMs = 0;      // trace time at the end of the last line
 };
 
 class TraceGenerator {
