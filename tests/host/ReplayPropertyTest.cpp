@@ -29,7 +29,7 @@ namespace {
 
 constexpr int kDefaultSeeds = 30;
 constexpr double kSpeed = 20;
-// Real seconds a real-time replay may take beyond its trace's duration at kSpeed before the
+// Real seconds a paced replay may take beyond its trace's duration at kSpeed before the
 // test gives up on it (a replay that hangs would otherwise hold the suite until its timeout).
 constexpr int kSlackSeconds = 5;
 
