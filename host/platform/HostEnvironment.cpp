@@ -7,8 +7,8 @@
 
 #include <cstring>
 
-#include "probe/ProbeClock.h"
 #include "platform/VelmoraLog.h"
+#include "probe/ProbeClock.h"
 #include "trace/Trace.h"
 
 namespace velmora {

@@ -16,13 +16,13 @@
 #include <string>
 
 #include "host/device/DeviceTree.h"
-#include "host/record/EventLog.h"
-#include "host/time/HostClock.h"
+#include "host/device/NodeMap.h"
 #include "host/platform/HostProperties.h"
 #include "host/platform/LaunchPolicyTable.h"
-#include "host/device/NodeMap.h"
+#include "host/record/EventLog.h"
 #include "host/record/Timeline.h"
 #include "host/record/TimelineTraceSink.h"
+#include "host/time/HostClock.h"
 
 namespace velmora {
 

@@ -85,8 +85,9 @@ int64_t HostClock::wallUsLocked() const {
 }
 
 std::chrono::steady_clock::time_point HostClock::wallOf(int64_t us) const {
-    return mStart + std::chrono::duration_cast<std::chrono::steady_clock::duration>(
-                        std::chrono::duration<double, std::micro>(static_cast<double>(us) / mSpeed));
+    return mStart +
+           std::chrono::duration_cast<std::chrono::steady_clock::duration>(
+               std::chrono::duration<double, std::micro>(static_cast<double>(us) / mSpeed));
 }
 
 void HostClock::interrupt() {
@@ -142,8 +143,8 @@ void HostClock::advanceUs(int64_t targetUs) {
             const auto now = std::chrono::steady_clock::now();
             if (now < wall) {
                 lock.unlock();
-                std::this_thread::sleep_for(std::min<std::chrono::steady_clock::duration>(
-                    wall - now, kPaceSlice));
+                std::this_thread::sleep_for(
+                    std::min<std::chrono::steady_clock::duration>(wall - now, kPaceSlice));
                 lock.lock();
                 continue;  // someone may have armed or signalled something meanwhile
             }

@@ -147,7 +147,7 @@ private:
     std::mutex mAdvanceLock;
     std::map<int, Listener> mListeners;  // guarded by mAdvanceLock
 
-    mutable std::mutex mLock;  // guards everything below
+    mutable std::mutex mLock;          // guards everything below
     std::condition_variable mSettled;  // the last busy worker finished its pass
     bool mPaced = false;
     double mSpeed = 1.0;
