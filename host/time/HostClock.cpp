@@ -304,14 +304,22 @@ int64_t HostClock::workerNowUs(int id) {
     return mNowUs;
 }
 
-void HostClock::workerSleep(int id, int64_t ms) {
-    std::unique_lock<std::mutex> lock(mLock);
+HostClock::Worker* HostClock::callingWorkerLocked(int id) {
     auto it = mWorkers.find(id);
     if (it == mWorkers.end() || it->second->exiting) {
+        return nullptr;
+    }
+    it->second->thread = std::this_thread::get_id();
+    return it->second.get();
+}
+
+void HostClock::workerSleep(int id, int64_t ms) {
+    std::unique_lock<std::mutex> lock(mLock);
+    Worker* const found = callingWorkerLocked(id);
+    if (found == nullptr) {
         return;
     }
-    Worker& worker = *it->second;
-    worker.thread = std::this_thread::get_id();
+    Worker& worker = *found;
     if (ms <= 0 && worker.again) {
         worker.again = false;
         worker.freshPass = true;
@@ -327,12 +335,11 @@ void HostClock::workerSleep(int id, int64_t ms) {
 void HostClock::workerWait(int id, const std::function<void()>& release,
                            const std::function<void()>& reacquire) {
     std::unique_lock<std::mutex> lock(mLock);
-    auto it = mWorkers.find(id);
-    if (it == mWorkers.end() || it->second->exiting) {
+    Worker* const found = callingWorkerLocked(id);
+    if (found == nullptr) {
         return;
     }
-    Worker& worker = *it->second;
-    worker.thread = std::this_thread::get_id();
+    Worker& worker = *found;
     worker.again = false;
     setStateLocked(worker, WorkerState::Waiting);
     // Signals come with the caller's mutex held, so none is lost between here and the wait.
