@@ -1,6 +1,8 @@
 // One run of velmora-replay: sets up the host platform layer, initialises a VelmoraServer on it,
 // replays the calls of a trace (or of stdin, interactively), and reports what the device nodes
-// went through: a per-node summary and a timeline in Chrome's JSON trace format.
+// went through: a per-node summary and, for each output path that is set, a timeline in Chrome's
+// JSON trace format, the device event log, the summary JSON and the HTML report. Nothing else is
+// left behind: the default simulated device (in $TMPDIR) goes at the end unless kept.
 //
 // Used by the velmora-replay program and by the end-to-end tests; single threaded.
 #pragma once
