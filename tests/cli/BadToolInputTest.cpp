@@ -29,6 +29,11 @@ struct BadFileRow {
     bool onStdout = false;  // velmora-lint reports findings on stdout
 };
 
+// Rows print as their name: ctest lists the cases by it.
+void PrintTo(const BadFileRow& row, std::ostream* os) {
+    *os << row.name;
+}
+
 std::string withContent(const std::string& dir, const std::string& content) {
     writeFile(dir + "/input", content);
     return dir + "/input";

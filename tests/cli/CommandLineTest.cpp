@@ -118,6 +118,10 @@ struct UsageRow {
     std::string message;  // a part of what is said on stderr
 };
 
+void PrintTo(const UsageRow& row, std::ostream* os) {
+    *os << row.name;
+}
+
 class UsageErrorTest : public ::testing::TestWithParam<UsageRow> {};
 
 // A command line that cannot be run: status 2 for every tool, said on stderr, nothing on stdout

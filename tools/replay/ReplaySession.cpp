@@ -497,8 +497,7 @@ std::string ReplaySession::summaryText() const {
 int ReplaySession::run() {
     if (mOptions.writeFiles) {
         // Found out before anything is replayed, not after a long replay.
-        for (const std::string* path :
-             {&mOptions.timelinePath, &mOptions.summaryJsonPath, &mOptions.reportPath}) {
+        for (const std::string* path : {&mOptions.summaryJsonPath, &mOptions.reportPath}) {
             std::string error;
             if (!path->empty() && !checkWritable(*path, &error)) {
                 fprintf(mErr, "velmora-replay: %s\n", error.c_str());
