@@ -9,7 +9,7 @@ namespace velmora {
 
 namespace {
 
-std::mutex gLock;        // guards gFile; the server logs from several threads
+std::mutex gLock;        // guards gFile and gToStderr; the server logs from threads
 FILE* gFile = nullptr;   // --server-log, or null
 bool gToStderr = false;  // --verbose
 
@@ -33,9 +33,9 @@ char priorityLetter(int priority) {
 }
 
 void routedLogger(const struct __android_logger_data* data, const char* message) {
+    std::lock_guard<std::mutex> lock(gLock);
     if (gToStderr)
         __android_log_stderr_logger(data, message);
-    std::lock_guard<std::mutex> lock(gLock);
     if (gFile == nullptr || data == nullptr || message == nullptr)
         return;
     fprintf(gFile, "%c %s: %s\n", priorityLetter(data->priority),
