@@ -41,7 +41,8 @@ public:
     int useDeviceRoot(const std::string& root, bool fresh);
     // Makes sure the current root is usable (seeds the default simulated device on first use).
     int prepareDevice();
-    // Directory of the default simulated device: /tmp/velmora-sim-<pid>.
+    // Directory of the default simulated device: $TMPDIR/velmora-sim-<pid>, /tmp when TMPDIR is
+    // unset or not an absolute path.
     static std::string defaultSimulatedRoot();
     // Deletes the simulated device at `root` with everything in it, and goes back to the
     // default root. Refuses (false, `error` set) a directory this layer did not seed.
