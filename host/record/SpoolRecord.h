@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <cstring>
 #include <string>
+#include <string_view>
 
 namespace velmora {
 
@@ -38,11 +39,13 @@ public:
             }
             return value;
         }
-        std::string text() {
+        std::string text() { return std::string(view()); }
+        // The text in place: valid while the record's bytes are.
+        std::string_view view() {
             const int64_t size = integer();
             if (size <= 0 || static_cast<size_t>(size) > mLeft)
-                return "";
-            std::string out(mData, static_cast<size_t>(size));
+                return std::string_view();
+            std::string_view out(mData, static_cast<size_t>(size));
             mData += size;
             mLeft -= static_cast<size_t>(size);
             return out;

@@ -14,9 +14,9 @@
 #pragma once
 
 #include <cstdint>
+#include <cstdio>
 #include <functional>
 #include <mutex>
-#include <ostream>
 #include <string>
 #include <unordered_map>
 #include <vector>
@@ -118,7 +118,9 @@ private:
     Track* findTrackLocked(const std::string& key);
     uint32_t valueLocked(const std::string& text);
     size_t counterGroupLocked(const std::string& track);
-    bool writeLocked(std::ostream& out) const;
+    // Appends the file's text to `out`; with `file`, hands it over as it grows (`written`
+    // false when a write failed). False when the spool could not be read back whole.
+    bool writeLocked(std::string& out, FILE* file, bool* written) const;
 
     HostClock& mClock;
     mutable std::mutex mLock;  // guards everything below
