@@ -2,6 +2,7 @@
 
 #include <fstream>
 #include <sstream>
+#include <utility>
 
 namespace velmora {
 
@@ -55,11 +56,12 @@ TraceReader::Step TraceReader::next(TraceCall* call, std::string* error) {
             lineError = mFile + ":" + std::to_string(mLineNo) + ": line longer than " +
                         std::to_string(kMaxLineBytes) + " bytes";
         } else {
-            mParsed.clear();
-            if (TraceParser::parseLine(mLine, mFile, mLineNo, &mParsed, &lineError) == 0) {
-                if (mParsed.empty())
+            bool any = false;
+            if (TraceParser::parseInto(mLine, mFile, mLineNo, &mParsed, &any, &lineError) == 0) {
+                if (!any)
                     continue;  // blank or a comment
-                *call = std::move(mParsed.front());
+                // The caller's call goes back to be filled next time, with its buffers.
+                std::swap(*call, mParsed);
                 ++mCalls;
                 return Step::Call;
             }

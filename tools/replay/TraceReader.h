@@ -42,7 +42,7 @@ private:
     int mLineNo = 0;
     size_t mCalls = 0;
     std::string mLine;
-    std::vector<TraceCall> mParsed;  // parseLine's output, one call at most
+    TraceCall mParsed;  // the line being parsed; swapped with the caller's call when good
 };
 
 }  // namespace velmora
