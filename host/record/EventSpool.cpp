@@ -80,7 +80,7 @@ void EventSpool::flush(Group& group) {
     group.chunks.push_back(std::move(chunk));
 }
 
-void EventSpool::append(size_t group, const std::string& record) {
+void EventSpool::append(size_t group, std::string_view record) {
     if (group >= mGroups.size())
         mGroups.resize(group + 1);
     Group& g = mGroups[group];

@@ -15,6 +15,7 @@
 #include <cstring>
 #include <functional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace velmora {
@@ -30,7 +31,7 @@ public:
 
     // Appends one record (any bytes) to `group`. Groups are numbered from 0; a group is made on
     // its first record.
-    void append(size_t group, const std::string& record);
+    void append(size_t group, std::string_view record);
     // Calls `visit` with each record of `group` in the order appended. False when part of the
     // scratch file could not be read back: the records from there on are missing.
     using Visitor = std::function<void(const char* data, size_t size)>;

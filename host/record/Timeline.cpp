@@ -71,12 +71,12 @@ uint32_t Timeline::valueLocked(const std::string& text) {
     return id;
 }
 
-size_t Timeline::counterGroupLocked(const std::string& track) {
+size_t Timeline::counterGroupLocked(std::string_view track) {
     for (size_t i = 0; i < mCounters.size(); ++i) {
         if (mCounters[i] == track)
             return kFirstCounterGroup + i;
     }
-    mCounters.push_back(track);
+    mCounters.emplace_back(track);
     return kFirstCounterGroup + mCounters.size() - 1;
 }
 
@@ -102,21 +102,21 @@ void Timeline::recordWrite(const std::string& key, const std::string& path,
     track->samples.push_back({now, valueLocked(text)});
 }
 
-void Timeline::recordInstant(const std::string& category, const std::string& name) {
+void Timeline::recordInstant(std::string_view category, std::string_view name) {
     SpoolRecord record;
     record.add(mClock.nowUs()).add(category).add(name);
     std::lock_guard<std::mutex> lock(mLock);
     mSpool.append(kInstantGroup, record.bytes());
 }
 
-void Timeline::recordCounter(const std::string& track, int64_t value) {
+void Timeline::recordCounter(std::string_view track, int64_t value) {
     SpoolRecord record;
     record.add(mClock.nowUs()).add(value);
     std::lock_guard<std::mutex> lock(mLock);
     mSpool.append(counterGroupLocked(track), record.bytes());
 }
 
-void Timeline::recordSlice(const std::string& name, int64_t beginUs, int64_t endUs, int tid) {
+void Timeline::recordSlice(std::string_view name, int64_t beginUs, int64_t endUs, int tid) {
     SpoolRecord record;
     record.add(beginUs).add(endUs).add(static_cast<int64_t>(tid)).add(name);
     std::lock_guard<std::mutex> lock(mLock);
