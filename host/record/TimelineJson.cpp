@@ -36,10 +36,20 @@ void TimelineJson::appendInteger(std::string& out, int64_t value) {
 }
 
 void TimelineJson::appendEscaped(std::string& out, std::string_view in) {
+    // Which bytes a JSON string cannot hold as they are: controls, the quote, the backslash.
+    static const struct Special {
+        bool byte[256] = {};
+        Special() {
+            for (int c = 0; c < 0x20; ++c)
+                byte[c] = true;
+            byte[static_cast<unsigned char>('"')] = true;
+            byte[static_cast<unsigned char>('\\')] = true;
+        }
+    } kSpecial;
     size_t plain = 0;  // start of the run of characters that need no escape
     for (size_t i = 0; i < in.size(); ++i) {
         const unsigned char c = static_cast<unsigned char>(in[i]);
-        if (c >= 0x20 && c != '"' && c != '\\')
+        if (!kSpecial.byte[c])
             continue;
         out.append(in.data() + plain, i - plain);
         plain = i + 1;

@@ -75,10 +75,34 @@ bool tokenize(const std::string& line, Words* words, std::string* problem) {
     return true;
 }
 
+// A plain decimal ("1804800", "-1"; no leading zero, which strtoll reads as octal) of at most
+// 18 digits, read without strtoll: most numbers of a trace are such. False for anything else.
+bool parsePlainDecimal(std::string_view text, int64_t* value) {
+    const bool negative = !text.empty() && text[0] == '-';
+    const std::string_view digits = negative ? text.substr(1) : text;
+    if (digits.empty() || digits.size() > 18 || (digits[0] == '0' && digits.size() > 1))
+        return false;
+    int64_t v = 0;
+    for (char c : digits) {
+        if (c < '0' || c > '9')
+            return false;
+        v = v * 10 + (c - '0');
+    }
+    *value = negative ? -v : v;
+    return true;
+}
+
 bool parseNumber(std::string_view text, int64_t min, int64_t max, int64_t* value) {
     // strtoll would skip the blanks of a quoted " 5".
     if (text.empty() || isspace(static_cast<unsigned char>(text[0]))) {
         return false;
+    }
+    int64_t plain = 0;
+    if (parsePlainDecimal(text, &plain)) {
+        if (plain < min || plain > max)
+            return false;
+        *value = plain;
+        return true;
     }
     char small[64];
     std::string large;
