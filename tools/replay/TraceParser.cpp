@@ -21,22 +21,23 @@ const std::vector<std::string> kCalls = {"sleep",     "event", "reload", "setcon
 // once they have grown: the characters of every word (quotes removed) one after the other, and
 // each word as a view into them.
 struct Words {
-    std::string chars;
+    std::string chars;  // only grows: as long as the longest line so far
     std::vector<std::string_view> list;
 };
 
 // Splits a line into words; a word may contain a double-quoted part (msg="a b").
 bool tokenize(const std::string& line, Words* words, std::string* problem) {
-    words->chars.clear();
     words->list.clear();
-    // Reserved up front: the words never outgrow the line, so the views stay valid.
-    words->chars.reserve(line.size());
+    // The words never outgrow the line, so the views into the buffer stay valid.
+    if (words->chars.size() < line.size())
+        words->chars.resize(line.size());
+    char* const chars = &words->chars[0];
+    size_t size = 0;  // characters of words so far
     size_t wordStart = 0;
     bool inWord = false;
     bool quoted = false;
     auto endWord = [&] {
-        words->list.emplace_back(words->chars.data() + wordStart,
-                                 words->chars.size() - wordStart);
+        words->list.emplace_back(chars + wordStart, size - wordStart);
         inWord = false;
     };
     for (char c : line) {
@@ -44,7 +45,7 @@ bool tokenize(const std::string& line, Words* words, std::string* problem) {
             if (c == '"') {
                 quoted = false;
             } else {
-                words->chars.push_back(c);
+                chars[size++] = c;
             }
             continue;
         }
@@ -58,12 +59,12 @@ bool tokenize(const std::string& line, Words* words, std::string* problem) {
         }
         if (!inWord) {
             inWord = true;
-            wordStart = words->chars.size();
+            wordStart = size;
         }
         if (c == '"') {
             quoted = true;
         } else {
-            words->chars.push_back(c);
+            chars[size++] = c;
         }
     }
     if (quoted) {
