@@ -41,28 +41,47 @@ bool NodeResolver::take(const std::string& key, const std::string& source, const
     return false;
 }
 
-bool NodeResolver::stillHeld(const Node& node, const std::string& source) const {
-    if (!node.resolved || node.holder != source || node.treeGeneration != mTree.generation())
+bool NodeResolver::refreshHeld(const std::string& key, const std::string& source,
+                               const std::string& value, int* ret) {
+    auto node = mRequests.find(key);
+    if (node == mRequests.end() || !node->second.resolved || node->second.holder != source ||
+        node->second.treeGeneration != mTree.generation()) {
         return false;
-    // Only `source` changed its requests since the last resolution. The holder of a floor or
-    // cap stays the holder as the latest of equal requests, and the holder of a "latest wins"
-    // node is the latest again: with the same value, nothing moves.
-    auto request = node.requests.find(source);
-    return request != node.requests.end() && request->second.value == node.heldRequest;
+    }
+    auto request = node->second.requests.find(source);
+    if (request == node->second.requests.end() || !request->second.asked ||
+        request->second.value != value) {
+        return false;
+    }
+    // The holder of a floor or cap stays the holder as the latest of equal requests, and the
+    // holder of a "latest wins" node was the latest already: the node keeps its value.
+    request->second.seq = ++mSeq;
+    if (mObserver != nullptr) {
+        mObserver->onNodeResolved(key, node->second.value, source);
+    }
+    // Written as resolve() would: the tree writes nothing when the node holds the value.
+    *ret = mTree.write(key, node->second.value);
+    node->second.resolved = *ret == 0;
+    return true;
 }
 
 int NodeResolver::set(const std::string& key, const std::string& source, const std::string& value) {
+    int ret = 0;
+    if (refreshHeld(key, source, value, &ret)) {
+        return ret;
+    }
     std::string effective;
     if (!take(key, source, value, &effective)) {
         return -1;
     }
+    const bool asked = effective == value;
     Node& node = mRequests[key];
-    node.requests[source] = {std::move(effective), ++mSeq};
+    node.requests[source] = {std::move(effective), ++mSeq, asked};
     std::vector<std::string>& keys = mSourceKeys[source];
     if (std::find(keys.begin(), keys.end(), key) == keys.end()) {
         keys.push_back(key);
     }
-    return resolve(key, node, source);
+    return resolve(key, node);
 }
 
 int NodeResolver::clear(const std::string& key, const std::string& source) {
@@ -72,7 +91,7 @@ int NodeResolver::clear(const std::string& key, const std::string& source) {
     }
     std::vector<std::string>& keys = mSourceKeys[source];
     keys.erase(std::remove(keys.begin(), keys.end(), key), keys.end());
-    return resolve(key, it->second, source);
+    return resolve(key, it->second);
 }
 
 int NodeResolver::replaceSource(const std::string& source, const Requests& requests) {
@@ -89,7 +108,8 @@ int NodeResolver::replaceSource(const std::string& source, const Requests& reque
             ret = -1;
             continue;
         }
-        mRequests[request.first].requests[source] = {std::move(effective), ++mSeq};
+        const bool asked = effective == request.second;
+        mRequests[request.first].requests[source] = {std::move(effective), ++mSeq, asked};
         if (std::find(keys.begin(), keys.end(), request.first) == keys.end()) {
             keys.push_back(request.first);
         }
@@ -98,7 +118,7 @@ int NodeResolver::replaceSource(const std::string& source, const Requests& reque
     std::sort(touched.begin(), touched.end());
     touched.erase(std::unique(touched.begin(), touched.end()), touched.end());
     for (const auto& key : touched) {
-        ret |= resolve(key, mRequests[key], source);
+        ret |= resolve(key);
     }
     return ret;
 }
@@ -118,16 +138,11 @@ std::vector<std::string> NodeResolver::sources(const std::string& key) const {
     return out;
 }
 
-int NodeResolver::resolve(const std::string& key, Node& node, const std::string& changedBy) {
-    if (stillHeld(node, changedBy)) {
-        if (mObserver != nullptr) {
-            mObserver->onNodeResolved(key, node.value, node.holder);
-        }
-        // Written as below: the tree writes nothing when the node holds the value.
-        const int ret = mTree.write(key, node.value);
-        node.resolved = ret == 0;
-        return ret;
-    }
+int NodeResolver::resolve(const std::string& key) {
+    return resolve(key, mRequests[key]);
+}
+
+int NodeResolver::resolve(const std::string& key, Node& node) {
     node.resolved = false;
     const uint64_t generation = mTree.generation();
     const NodeSpec* spec = mNodes.find(key);
@@ -181,7 +196,6 @@ int NodeResolver::resolve(const std::string& key, Node& node, const std::string&
     if (ret == 0) {
         node.resolved = true;
         node.holder = holder != nullptr ? *holder : std::string();
-        node.heldRequest = holder != nullptr ? requests.at(*holder).value : std::string();
         node.value = std::move(value);
         node.treeGeneration = generation;
     }

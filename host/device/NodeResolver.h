@@ -11,9 +11,8 @@
 // one between available frequencies is rounded, and the rounding is noted on the timeline.
 //
 // A source asking again for the value it already holds (the server re-sends every group level
-// whenever one of them moves, an action applied again re-sends all its values) changes nothing
-// on the node: the request only becomes the latest, the observer hears of the same resolution,
-// and nothing is combined anew.
+// whenever one of them moves) changes nothing on the node: the request only becomes the latest,
+// the observer hears of the same resolution, and nothing is combined or compared anew.
 // Not thread safe: the executor calls it under its own lock.
 #pragma once
 
@@ -54,24 +53,25 @@ public:
 private:
     struct Request {
         std::string value;
-        uint64_t seq = 0;  // order of arrival, for "latest wins"
+        uint64_t seq = 0;     // order of arrival, for "latest wins"
+        bool asked = false;   // `value` is what the source wrote: the node took it unchanged
     };
     struct Node {
         std::map<std::string, Request> requests;  // by source
-        // The last resolution, valid when it was written: the value in force, its holder ("" for
-        // the baseline) and the holder's request then, on the tree as it was then.
+        // The last resolution, valid when it was written: the value in force and its holder
+        // ("" for the baseline), on the tree as it was then.
         bool resolved = false;
         std::string value;
         std::string holder;
-        std::string heldRequest;
         uint64_t treeGeneration = 0;
     };
 
-    // Combines the requests for `key` after `changedBy` changed its own, and writes the node.
-    int resolve(const std::string& key, Node& node, const std::string& changedBy);
-    // Whether `node` keeps its last resolution though `source` changed its requests: it held
-    // the value and asks for the same again.
-    bool stillHeld(const Node& node, const std::string& source) const;
+    int resolve(const std::string& key);
+    int resolve(const std::string& key, Node& node);
+    // set() for a source re-requesting the value it holds: true when that is the case, with
+    // the request refreshed, the observer told and `ret` what set() returns.
+    bool refreshHeld(const std::string& key, const std::string& source, const std::string& value,
+                     int* ret);
     // The value node `key` takes for `value`; false when the node refuses it (logged).
     bool take(const std::string& key, const std::string& source, const std::string& value,
               std::string* effective);
