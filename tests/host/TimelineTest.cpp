@@ -147,10 +147,12 @@ TEST_F(TimelineTest, AnyNameAndNumberComesBackExactly) {
     std::vector<std::string> names;
     for (const auto& event : json["traceEvents"]) {
         names.push_back(event["name"]);
-        if (event["name"] == "velmora.low")
+        if (event["name"] == "velmora.low") {
             EXPECT_EQ(INT64_MIN, event["args"]["value"].get<int64_t>());
-        if (event["name"] == "velmora.high")
+        }
+        if (event["name"] == "velmora.high") {
             EXPECT_EQ(INT64_MAX, event["args"]["value"].get<int64_t>());
+        }
     }
     EXPECT_NE(names.end(), std::find(names.begin(), names.end(), longName));
     EXPECT_NE(names.end(), std::find(names.begin(), names.end(), oddName));
