@@ -2,8 +2,8 @@
 // - an event that writes 4 device nodes (4099 cold_launch on, then off again: little_min,
 //   big_min, gpu_min, fork_on_big) on a tmpfs device root, against 4 pwrite calls to
 //   descriptors opened once on the same nodes; per-call latency p50 and p99;
-// - velmora-replay --fast on a synthetic hour of device use (about 120,000 calls) generated
-//   here, in calls per second, against parsing the same trace.
+// - velmora-replay --fast on a generated hour of device use (about 120,000 calls), in calls per
+//   second, against parsing the same trace.
 // Log output is dropped.
 #include <android/log.h>
 #include <benchmark/benchmark.h>
@@ -22,6 +22,7 @@
 #include "server/VelmoraServer.h"
 #include "tools/replay/ReplaySession.h"
 #include "tools/replay/TraceParser.h"
+#include "tools/tracegen/TraceGenerator.h"
 
 namespace {
 
@@ -116,54 +117,12 @@ void BM_FourPwritesFloor(benchmark::State& state) {
 }
 BENCHMARK(BM_FourPwritesFloor);
 
-// An hour of device use, one call every 30 ms: probes on render threads (boost and withdrawal),
-// launches and window switches, scrolling, a video scene, battery saver, thermal caps.
+// The generated hour of device use that velmora_bench_replay also replays (tools/tracegen):
+// about 120,000 calls, 15 % of them probe events.
 std::string hourTrace() {
     const std::string path = gScratch + "/hour.trace";
-    std::ofstream out(path);
-    int pid = 2000;
-    for (int64_t ms = 100, n = 0; ms < 3600 * 1000; ms += 30, ++n) {
-        out << "@" << ms << " ";
-        switch (n % 20) {
-            case 0:
-                out << "event 4099 0";
-                break;
-            case 3:
-                out << "event 4116 0 msg=\"pid=" << pid << "|tid=" << pid + 1 << "\"";
-                break;
-            case 5:
-                out << "event 4101 0";
-                break;
-            case 8:
-                out << "event 4116 -1 msg=\"pid=" << pid << "|tid=" << pid + 1 << "\"";
-                break;
-            case 9:
-                out << "event 4102 0";
-                break;
-            case 10:
-                out << "event 4098 0";
-                break;
-            case 12:
-                out << "setconfig 1 2=1497600 5=2016000";
-                break;
-            case 13:
-                out << "event 4118 " << (n / 20 % 2 == 0 ? "0" : "-1");
-                break;
-            case 15:
-                out << "event 12288 " << (n / 20 % 2 == 0 ? "0" : "-1");
-                break;
-            case 17:
-                out << "setconfig 1 2=0 5=0";
-                break;
-            default:
-                out << "getconfig 22";
-                break;
-        }
-        out << "\n";
-        if (n % 20 == 19) {
-            pid = 2000 + (pid - 1999) % 50;
-        }
-    }
+    std::ofstream(path) << velmora::TraceGenerator::generate(
+        velmora::TraceGenOptions::hour(1, 150000));
     return path;
 }
 

@@ -47,6 +47,7 @@ void DeviceTree::forgetLocked() {
         }
     }
     mNodeState.clear();
+    mGeneration.fetch_add(1, std::memory_order_release);
 }
 
 DeviceTree::Node* DeviceTree::nodeLocked(const std::string& key) {

@@ -11,6 +11,8 @@
 // also cut to length. Changing the root closes every descriptor.
 #pragma once
 
+#include <atomic>
+#include <cstdint>
 #include <map>
 #include <mutex>
 #include <string>
@@ -46,6 +48,9 @@ public:
     int write(const std::string& key, const std::string& text);
     // The value `key` had when first seen (what requests fall back to). False when unreadable.
     bool baseline(const std::string& key, std::string* text);
+    // Moves on whenever the tree forgets what it knew (a new root, a fresh seed): values and
+    // baselines learnt before may no longer hold.
+    uint64_t generation() const { return mGeneration.load(std::memory_order_acquire); }
 
 private:
     struct Node {
@@ -72,6 +77,7 @@ private:
     mutable std::mutex mLock;  // guards everything below
     std::string mRoot;
     std::map<std::string, Node> mNodeState;  // by key
+    std::atomic<uint64_t> mGeneration{0};     // bumped by forgetLocked, read without mLock
 };
 
 }  // namespace velmora

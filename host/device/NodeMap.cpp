@@ -70,9 +70,10 @@ const NodeSpec* NodeMap::find(const std::string& key) const {
     return it == mIndex.end() ? nullptr : &mNodes[it->second];
 }
 
-std::string NodeMap::keyForTag(int tag) const {
+const std::string& NodeMap::keyForTag(int tag) const {
+    static const std::string kNone;
     auto it = mTagKeys.find(tag);
-    return it == mTagKeys.end() ? std::string() : it->second;
+    return it == mTagKeys.end() ? kNone : it->second;
 }
 
 int NodeMap::parse(const std::string& text, const std::string& origin, std::string* error) {

@@ -35,7 +35,7 @@ public:
     // Null when `key` is not a node.
     const NodeSpec* find(const std::string& key) const;
     // Node of an integer tag (1 little min ... 58 background group), or "" when the tag has none.
-    std::string keyForTag(int tag) const;
+    const std::string& keyForTag(int tag) const;
 
     // Applies override lines from `text`; `origin` names the source in `error` ("file:line:
     // message"). Returns 0, or -1 at the first bad line (earlier lines stay applied).

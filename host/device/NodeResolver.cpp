@@ -41,27 +41,57 @@ bool NodeResolver::take(const std::string& key, const std::string& source, const
     return false;
 }
 
+bool NodeResolver::refreshHeld(const std::string& key, const std::string& source,
+                               const std::string& value, int* ret) {
+    auto node = mRequests.find(key);
+    if (node == mRequests.end() || !node->second.resolved || node->second.holder != source ||
+        node->second.treeGeneration != mTree.generation()) {
+        return false;
+    }
+    auto request = node->second.requests.find(source);
+    if (request == node->second.requests.end() || !request->second.asked ||
+        request->second.value != value) {
+        return false;
+    }
+    // The holder of a floor or cap stays the holder as the latest of equal requests, and the
+    // holder of a "latest wins" node was the latest already: the node keeps its value.
+    request->second.seq = ++mSeq;
+    if (mObserver != nullptr) {
+        mObserver->onNodeResolved(key, node->second.value, source);
+    }
+    // Written as resolve() would: the tree writes nothing when the node holds the value.
+    *ret = mTree.write(key, node->second.value);
+    node->second.resolved = *ret == 0;
+    return true;
+}
+
 int NodeResolver::set(const std::string& key, const std::string& source, const std::string& value) {
+    int ret = 0;
+    if (refreshHeld(key, source, value, &ret)) {
+        return ret;
+    }
     std::string effective;
     if (!take(key, source, value, &effective)) {
         return -1;
     }
-    mRequests[key][source] = {effective, ++mSeq};
+    const bool asked = effective == value;
+    Node& node = mRequests[key];
+    node.requests[source] = {std::move(effective), ++mSeq, asked};
     std::vector<std::string>& keys = mSourceKeys[source];
     if (std::find(keys.begin(), keys.end(), key) == keys.end()) {
         keys.push_back(key);
     }
-    return resolve(key);
+    return resolve(key, node);
 }
 
 int NodeResolver::clear(const std::string& key, const std::string& source) {
     auto it = mRequests.find(key);
-    if (it == mRequests.end() || it->second.erase(source) == 0) {
+    if (it == mRequests.end() || it->second.requests.erase(source) == 0) {
         return 0;
     }
     std::vector<std::string>& keys = mSourceKeys[source];
     keys.erase(std::remove(keys.begin(), keys.end(), key), keys.end());
-    return resolve(key);
+    return resolve(key, it->second);
 }
 
 int NodeResolver::replaceSource(const std::string& source, const Requests& requests) {
@@ -69,7 +99,7 @@ int NodeResolver::replaceSource(const std::string& source, const Requests& reque
     std::vector<std::string> touched;
     touched.swap(keys);
     for (const auto& key : touched) {
-        mRequests[key].erase(source);
+        mRequests[key].requests.erase(source);
     }
     int ret = 0;
     for (const auto& request : requests) {
@@ -78,7 +108,8 @@ int NodeResolver::replaceSource(const std::string& source, const Requests& reque
             ret = -1;
             continue;
         }
-        mRequests[request.first][source] = {effective, ++mSeq};
+        const bool asked = effective == request.second;
+        mRequests[request.first].requests[source] = {std::move(effective), ++mSeq, asked};
         if (std::find(keys.begin(), keys.end(), request.first) == keys.end()) {
             keys.push_back(request.first);
         }
@@ -100,7 +131,7 @@ std::vector<std::string> NodeResolver::sources(const std::string& key) const {
     std::vector<std::string> out;
     auto it = mRequests.find(key);
     if (it != mRequests.end()) {
-        for (const auto& entry : it->second) {
+        for (const auto& entry : it->second.requests) {
             out.push_back(entry.first);
         }
     }
@@ -108,13 +139,19 @@ std::vector<std::string> NodeResolver::sources(const std::string& key) const {
 }
 
 int NodeResolver::resolve(const std::string& key) {
+    return resolve(key, mRequests[key]);
+}
+
+int NodeResolver::resolve(const std::string& key, Node& node) {
+    node.resolved = false;
+    const uint64_t generation = mTree.generation();
     const NodeSpec* spec = mNodes.find(key);
     std::string base;
     if (spec == nullptr || !mTree.baseline(key, &base)) {
         VLOGE("host: node %s is not available", key.c_str());
         return -1;
     }
-    const auto& requests = mRequests[key];
+    const auto& requests = node.requests;
     std::string value = base;
     const std::string* holder = nullptr;  // source whose request is in force; none: the baseline
     if (spec->kind == NodeKind::Floor || spec->kind == NodeKind::Cap) {
@@ -155,7 +192,14 @@ int NodeResolver::resolve(const std::string& key) {
     if (mObserver != nullptr) {
         mObserver->onNodeResolved(key, value, holder != nullptr ? *holder : std::string());
     }
-    return mTree.write(key, value);
+    const int ret = mTree.write(key, value);
+    if (ret == 0) {
+        node.resolved = true;
+        node.holder = holder != nullptr ? *holder : std::string();
+        node.value = std::move(value);
+        node.treeGeneration = generation;
+    }
+    return ret;
 }
 
 }  // namespace velmora

@@ -9,6 +9,10 @@
 // Every request is first taken the way the device's kernel takes a write (KernelRules): a
 // value the node refuses is dropped (the call reports -1, the source's earlier request stays),
 // one between available frequencies is rounded, and the rounding is noted on the timeline.
+//
+// A source asking again for the value it already holds (the server re-sends every group level
+// whenever one of them moves) changes nothing on the node: the request only becomes the latest,
+// the observer hears of the same resolution, and nothing is combined or compared anew.
 // Not thread safe: the executor calls it under its own lock.
 #pragma once
 
@@ -49,10 +53,25 @@ public:
 private:
     struct Request {
         std::string value;
-        uint64_t seq;  // order of arrival, for "latest wins"
+        uint64_t seq = 0;     // order of arrival, for "latest wins"
+        bool asked = false;   // `value` is what the source wrote: the node took it unchanged
+    };
+    struct Node {
+        std::map<std::string, Request> requests;  // by source
+        // The last resolution, valid when it was written: the value in force and its holder
+        // ("" for the baseline), on the tree as it was then.
+        bool resolved = false;
+        std::string value;
+        std::string holder;
+        uint64_t treeGeneration = 0;
     };
 
     int resolve(const std::string& key);
+    int resolve(const std::string& key, Node& node);
+    // set() for a source re-requesting the value it holds: true when that is the case, with
+    // the request refreshed, the observer told and `ret` what set() returns.
+    bool refreshHeld(const std::string& key, const std::string& source, const std::string& value,
+                     int* ret);
     // The value node `key` takes for `value`; false when the node refuses it (logged).
     bool take(const std::string& key, const std::string& source, const std::string& value,
               std::string* effective);
@@ -60,7 +79,7 @@ private:
     const NodeMap& mNodes;
     DeviceTree& mTree;
     Timeline* mTimeline;
-    std::map<std::string, std::map<std::string, Request>> mRequests;  // key -> source -> request
+    std::map<std::string, Node> mRequests;                            // by node key
     std::map<std::string, std::vector<std::string>> mSourceKeys;      // source -> its keys
     uint64_t mSeq = 0;
     ExecutorObserver* mObserver = nullptr;

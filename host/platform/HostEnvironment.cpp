@@ -5,10 +5,11 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <cstdlib>
 #include <cstring>
 
-#include "probe/ProbeClock.h"
 #include "platform/VelmoraLog.h"
+#include "probe/ProbeClock.h"
 #include "trace/Trace.h"
 
 namespace velmora {
@@ -56,7 +57,12 @@ HostEnvironment::~HostEnvironment() {
 }
 
 std::string HostEnvironment::defaultSimulatedRoot() {
-    return "/tmp/velmora-sim-" + std::to_string(getpid());
+    const char* tmp = getenv("TMPDIR");
+    std::string dir = tmp != nullptr && tmp[0] == '/' ? tmp : "/tmp";
+    while (dir.size() > 1 && dir.back() == '/') {
+        dir.pop_back();
+    }
+    return (dir == "/" ? "" : dir) + "/velmora-sim-" + std::to_string(getpid());
 }
 
 void HostEnvironment::reset() {

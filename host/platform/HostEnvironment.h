@@ -16,13 +16,13 @@
 #include <string>
 
 #include "host/device/DeviceTree.h"
-#include "host/record/EventLog.h"
-#include "host/time/HostClock.h"
+#include "host/device/NodeMap.h"
 #include "host/platform/HostProperties.h"
 #include "host/platform/LaunchPolicyTable.h"
-#include "host/device/NodeMap.h"
+#include "host/record/EventLog.h"
 #include "host/record/Timeline.h"
 #include "host/record/TimelineTraceSink.h"
+#include "host/time/HostClock.h"
 
 namespace velmora {
 
@@ -41,7 +41,8 @@ public:
     int useDeviceRoot(const std::string& root, bool fresh);
     // Makes sure the current root is usable (seeds the default simulated device on first use).
     int prepareDevice();
-    // Directory of the default simulated device: /tmp/velmora-sim-<pid>.
+    // Directory of the default simulated device: $TMPDIR/velmora-sim-<pid>, /tmp when TMPDIR is
+    // unset or not an absolute path.
     static std::string defaultSimulatedRoot();
     // Deletes the simulated device at `root` with everything in it, and goes back to the
     // default root. Refuses (false, `error` set) a directory this layer did not seed.

@@ -16,9 +16,10 @@ constexpr int kProbeCmdId = kCmdProbe;
 constexpr int kPriorityTag = kTagScenePriority;
 constexpr int kForkOnBigTag = VELMORA_TAG_FORK_ON_BIG_CLUSTER;
 constexpr int kNoSchedLevel = ZOLA_SCHED_LEVEL_NONE;  // group level of "nothing requested"
-constexpr const char* kFreqSource = "freq";
-constexpr const char* kSchedSource = "sched";
-constexpr const char* kProbeSource = "probe";
+// Source names as strings once: they are passed for every node of every request.
+const std::string kFreqSource = "freq";
+const std::string kSchedSource = "sched";
+const std::string kProbeSource = "probe";
 
 // Kind of a command as far as its lifetime goes; also the timeline category of its instants.
 const char* categoryOf(int cmdId) {
@@ -53,7 +54,7 @@ NodeResolver::Requests HostExecutor::requestsOf(const Action& action) {
         if (tag == kPriorityTag) {
             return;  // read by the server's arbitration, nothing to write
         }
-        const std::string key = mNodes.keyForTag(tag);
+        const std::string& key = mNodes.keyForTag(tag);
         const NodeSpec* spec = key.empty() ? nullptr : mNodes.find(key);
         if (spec == nullptr) {
             VLOGW("host: cmdId=%d: tag %d has no node, ignored", action.mCmdId, tag);
@@ -166,7 +167,7 @@ int HostExecutor::doPerfSetConfig(int id, int count, const int* tags, const int*
     std::lock_guard<std::mutex> lock(mLock);
     int ret = 0;
     for (int i = 0; i < count; ++i) {
-        const std::string key = mNodes.keyForTag(tags[i]);
+        const std::string& key = mNodes.keyForTag(tags[i]);
         if (key.empty() || isTopFreqTag(tags[i])) {
             VLOGW("host: setConfig id=%d: tag %d cannot be set, ignored", id, tags[i]);
             ret = -1;
@@ -190,7 +191,7 @@ int HostExecutor::doPerfGetConfig(int count, const int* tags, int* values) {
     }
     int ret = 0;
     for (int i = 0; i < count; ++i) {
-        const std::string key = mNodes.keyForTag(tags[i]);
+        const std::string& key = mNodes.keyForTag(tags[i]);
         std::string text;
         if (key.empty() || !mTree.read(key, &text)) {
             VLOGW("host: getConfig: tag %d has no readable node", tags[i]);
@@ -209,7 +210,8 @@ int HostExecutor::doSchedLevelAction(int count, const int* groups, const int* le
     std::lock_guard<std::mutex> lock(mLock);
     int ret = 0;
     for (int i = 0; i < count; ++i) {
-        const std::string key = isGroupTag(groups[i]) ? mNodes.keyForTag(groups[i]) : std::string();
+        static const std::string kNoKey;
+        const std::string& key = isGroupTag(groups[i]) ? mNodes.keyForTag(groups[i]) : kNoKey;
         if (key.empty()) {
             VLOGW("host: sched level for unknown group tag %d, ignored", groups[i]);
             ret = -1;

@@ -3,7 +3,6 @@
 #include <cstdarg>
 #include <cstdio>
 #include <ctime>
-#include <fstream>
 
 
 namespace velmora {
@@ -35,14 +34,24 @@ std::string restamped(const std::string& text, int64_t ms) {
 
 EventLog::EventLog(HostClock& clock, Timeline& timeline) : mClock(clock), mTimeline(timeline) {}
 
+EventLog::~EventLog() {
+    if (mFile != nullptr)
+        fclose(mFile);
+}
+
 bool EventLog::setPath(const std::string& path) {
     std::lock_guard<std::mutex> lock(mLock);
     mPath = path;
+    if (mFile != nullptr) {
+        fclose(mFile);
+        mFile = nullptr;
+    }
     if (path.empty()) {
         return true;
     }
-    std::ofstream file(path, std::ios::trunc);
-    return static_cast<bool>(file);
+    // Truncated now; lines are appended from here on.
+    mFile = fopen(path.c_str(), "we");
+    return mFile != nullptr;
 }
 
 std::string EventLog::path() const {
@@ -61,12 +70,12 @@ void EventLog::write(int prio, int tag, const std::string& line) {
     mTimeline.recordInstant("report", text);
     std::lock_guard<std::mutex> lock(mLock);
     mLines.push_back(text);
-    if (!mPath.empty()) {
-        std::ofstream file(mPath, std::ios::app);
-        char stamp[64];
-        snprintf(stamp, sizeof(stamp), "%lld.%03lld", static_cast<long long>(ms / 1000),
-                 static_cast<long long>(ms % 1000));
-        file << stamp << " prio=" << prio << " tag=" << tag << " " << text << "\n";
+    if (mFile != nullptr) {
+        fprintf(mFile, "%lld.%03lld prio=%d tag=%d ", static_cast<long long>(ms / 1000),
+                static_cast<long long>(ms % 1000), prio, tag);
+        fwrite(text.data(), 1, text.size(), mFile);
+        fputc('\n', mFile);
+        fflush(mFile);
     }
 }
 

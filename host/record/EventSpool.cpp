@@ -12,9 +12,6 @@ namespace velmora {
 
 namespace {
 
-// A record is its size (native byte order: a spool never outlives its process), then its bytes.
-using RecordSize = uint32_t;
-
 bool writeAll(int fd, const char* data, size_t size, off_t offset) {
     while (size > 0) {
         const ssize_t n = pwrite(fd, data, size, offset);
@@ -41,18 +38,6 @@ bool readAll(int fd, char* data, size_t size, off_t offset) {
         offset += n;
     }
     return true;
-}
-
-// Calls `visit` with each record of one chunk's bytes.
-void visitRecords(const std::string& chunk, const EventSpool::Visitor& visit) {
-    size_t at = 0;
-    while (at + sizeof(RecordSize) <= chunk.size()) {
-        RecordSize size = 0;
-        memcpy(&size, chunk.data() + at, sizeof(size));
-        at += sizeof(size);
-        visit(chunk.data() + at, size);
-        at += size;
-    }
 }
 
 }  // namespace
@@ -95,7 +80,7 @@ void EventSpool::flush(Group& group) {
     group.chunks.push_back(std::move(chunk));
 }
 
-void EventSpool::append(size_t group, const std::string& record) {
+void EventSpool::append(size_t group, std::string_view record) {
     if (group >= mGroups.size())
         mGroups.resize(group + 1);
     Group& g = mGroups[group];
@@ -109,21 +94,25 @@ void EventSpool::append(size_t group, const std::string& record) {
 }
 
 bool EventSpool::forEach(size_t group, const Visitor& visit) const {
+    return forEachRecord(group, visit);
+}
+
+bool EventSpool::forEachChunk(size_t group, const Visitor& visit) const {
     if (group >= mGroups.size())
         return true;
     const Group& g = mGroups[group];
     std::string buffer;
     for (const Chunk& chunk : g.chunks) {
         if (!chunk.inFile) {
-            visitRecords(chunk.kept, visit);
+            visit(chunk.kept.data(), chunk.kept.size());
             continue;
         }
         buffer.resize(chunk.size);
         if (!readAll(mFd, &buffer[0], chunk.size, chunk.offset))
             return false;
-        visitRecords(buffer, visit);
+        visit(buffer.data(), buffer.size());
     }
-    visitRecords(g.open, visit);
+    visit(g.open.data(), g.open.size());
     return true;
 }
 

@@ -11,8 +11,11 @@
 #include <sys/types.h>
 
 #include <cstddef>
+#include <cstdint>
+#include <cstring>
 #include <functional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace velmora {
@@ -28,11 +31,26 @@ public:
 
     // Appends one record (any bytes) to `group`. Groups are numbered from 0; a group is made on
     // its first record.
-    void append(size_t group, const std::string& record);
+    void append(size_t group, std::string_view record);
     // Calls `visit` with each record of `group` in the order appended. False when part of the
     // scratch file could not be read back: the records from there on are missing.
     using Visitor = std::function<void(const char* data, size_t size)>;
     bool forEach(size_t group, const Visitor& visit) const;
+    // forEach() with the visitor called directly, for readers that go through millions of
+    // records.
+    template <typename Visit>
+    bool forEachRecord(size_t group, Visit&& visit) const {
+        return forEachChunk(group, [&](const char* data, size_t size) {
+            size_t at = 0;
+            while (at + sizeof(RecordSize) <= size) {
+                RecordSize recordSize = 0;
+                memcpy(&recordSize, data + at, sizeof(recordSize));
+                at += sizeof(recordSize);
+                visit(data + at, static_cast<size_t>(recordSize));
+                at += recordSize;
+            }
+        });
+    }
     // Forgets every record; the scratch file is kept for the next ones.
     void clear();
 
@@ -41,6 +59,13 @@ public:
     size_t spooledBytes() const { return static_cast<size_t>(mFileEnd); }
 
 private:
+    // A record is its size (native byte order: a spool never outlives its process), then its
+    // bytes.
+    using RecordSize = uint32_t;
+
+    // Calls `visit` with the bytes of each chunk of `group` in order; false as forEach().
+    bool forEachChunk(size_t group, const Visitor& visit) const;
+
     struct Chunk {
         bool inFile = false;
         off_t offset = 0;  // in the scratch file

@@ -7,21 +7,28 @@
 #include <cstdint>
 #include <cstring>
 #include <string>
+#include <string_view>
 
 namespace velmora {
 
 class SpoolRecord {
 public:
+    SpoolRecord() = default;
+    SpoolRecord(const SpoolRecord&) = delete;
+    SpoolRecord& operator=(const SpoolRecord&) = delete;
+
     SpoolRecord& add(int64_t value) {
-        mBytes.append(reinterpret_cast<const char*>(&value), sizeof(value));
+        append(reinterpret_cast<const char*>(&value), sizeof(value));
         return *this;
     }
-    SpoolRecord& add(const std::string& text) {
+    SpoolRecord& add(std::string_view text) {
         add(static_cast<int64_t>(text.size()));
-        mBytes.append(text);
+        append(text.data(), text.size());
         return *this;
     }
-    const std::string& bytes() const { return mBytes; }
+    std::string_view bytes() const {
+        return mLarge.empty() ? std::string_view(mSmall, mSize) : std::string_view(mLarge);
+    }
 
     // Reads the fields of one record in order. Past the end of a record cut short, integers read
     // as 0 and texts as "".
@@ -38,11 +45,13 @@ public:
             }
             return value;
         }
-        std::string text() {
+        std::string text() { return std::string(view()); }
+        // The text in place: valid while the record's bytes are.
+        std::string_view view() {
             const int64_t size = integer();
             if (size <= 0 || static_cast<size_t>(size) > mLeft)
-                return "";
-            std::string out(mData, static_cast<size_t>(size));
+                return std::string_view();
+            std::string_view out(mData, static_cast<size_t>(size));
             mData += size;
             mLeft -= static_cast<size_t>(size);
             return out;
@@ -54,7 +63,21 @@ public:
     };
 
 private:
-    std::string mBytes;
+    // Most records fit the inline buffer: one is made for every server counter and slice.
+    void append(const char* data, size_t size) {
+        if (mLarge.empty() && mSize + size <= sizeof(mSmall)) {
+            memcpy(mSmall + mSize, data, size);
+            mSize += size;
+            return;
+        }
+        if (mLarge.empty())
+            mLarge.assign(mSmall, mSize);
+        mLarge.append(data, size);
+    }
+
+    char mSmall[192];
+    size_t mSize = 0;
+    std::string mLarge;  // the bytes, once they outgrow mSmall
 };
 
 }  // namespace velmora

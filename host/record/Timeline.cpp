@@ -2,8 +2,6 @@
 
 #include <cstdio>
 #include <cstdlib>
-#include <fstream>
-#include <sstream>
 
 #include "host/record/SpoolRecord.h"
 #include "host/record/TimelineJson.h"
@@ -73,12 +71,12 @@ uint32_t Timeline::valueLocked(const std::string& text) {
     return id;
 }
 
-size_t Timeline::counterGroupLocked(const std::string& track) {
+size_t Timeline::counterGroupLocked(std::string_view track) {
     for (size_t i = 0; i < mCounters.size(); ++i) {
         if (mCounters[i] == track)
             return kFirstCounterGroup + i;
     }
-    mCounters.push_back(track);
+    mCounters.emplace_back(track);
     return kFirstCounterGroup + mCounters.size() - 1;
 }
 
@@ -104,21 +102,21 @@ void Timeline::recordWrite(const std::string& key, const std::string& path,
     track->samples.push_back({now, valueLocked(text)});
 }
 
-void Timeline::recordInstant(const std::string& category, const std::string& name) {
+void Timeline::recordInstant(std::string_view category, std::string_view name) {
     SpoolRecord record;
     record.add(mClock.nowUs()).add(category).add(name);
     std::lock_guard<std::mutex> lock(mLock);
     mSpool.append(kInstantGroup, record.bytes());
 }
 
-void Timeline::recordCounter(const std::string& track, int64_t value) {
+void Timeline::recordCounter(std::string_view track, int64_t value) {
     SpoolRecord record;
     record.add(mClock.nowUs()).add(value);
     std::lock_guard<std::mutex> lock(mLock);
     mSpool.append(counterGroupLocked(track), record.bytes());
 }
 
-void Timeline::recordSlice(const std::string& name, int64_t beginUs, int64_t endUs, int tid) {
+void Timeline::recordSlice(std::string_view name, int64_t beginUs, int64_t endUs, int tid) {
     SpoolRecord record;
     record.add(beginUs).add(endUs).add(static_cast<int64_t>(tid)).add(name);
     std::lock_guard<std::mutex> lock(mLock);
@@ -209,89 +207,121 @@ int Timeline::changes(const std::string& key) const {
     return 0;
 }
 
-bool Timeline::writeLocked(std::ostream& out) const {
-    out << TimelineJson::opening();
+bool Timeline::writeLocked(std::string& out, FILE* file, bool* written) const {
+    constexpr size_t kFlushBytes = 256 * 1024;
+    *written = true;
+    // Hands what the buffer holds to the file; without one the buffer keeps the whole text.
+    auto drain = [&](bool last) {
+        if (file == nullptr || (!last && out.size() < kFlushBytes))
+            return;
+        *written &= fwrite(out.data(), 1, out.size(), file) == out.size();
+        out.clear();
+    };
+    TimelineJson::opening(out);
+    // A value is formatted once however many samples share it.
+    std::vector<std::string> numbers(mValues.size());
+    for (size_t i = 0; i < mValues.size(); ++i) {
+        if (mValues[i].numeric)
+            numbers[i] = TimelineJson::formatNumber(mValues[i].number);
+    }
     for (const auto& track : mTracks) {
         for (size_t i = 0; i < track.samples.size(); ++i) {
             const Sample& sample = track.samples[i];
             const Value& value = mValues[sample.value];
-            out << ",\n";
+            out.append(",\n");
             if (value.numeric) {
                 const std::string source =
                     mCounterSource ? mCounterSource(track.key, i) : std::string();
-                out << TimelineJson::nodeCounter(track.key, value.number, sample.us, source);
+                TimelineJson::nodeCounter(out, track.key, numbers[sample.value], sample.us,
+                                          source);
             } else {
-                out << TimelineJson::nodeText(track.key, value.text, sample.us);
+                TimelineJson::nodeText(out, track.key, value.text, sample.us);
             }
+            drain(false);
         }
     }
     // The server's tracks, named as on a device: counters and complete slices per thread.
     bool complete = true;
     for (size_t i = 0; i < mCounters.size(); ++i) {
-        complete &= mSpool.forEach(kFirstCounterGroup + i, [&](const char* data, size_t size) {
+        complete &= mSpool.forEachRecord(kFirstCounterGroup + i, [&](const char* data, size_t size) {
             SpoolRecord::Reader record(data, size);
             const int64_t us = record.integer();
-            out << ",\n" << TimelineJson::serverCounter(mCounters[i], record.integer(), us);
+            out.append(",\n");
+            TimelineJson::serverCounter(out, mCounters[i], record.integer(), us);
+            drain(false);
         });
     }
-    complete &= mSpool.forEach(kSliceGroup, [&](const char* data, size_t size) {
+    complete &= mSpool.forEachRecord(kSliceGroup, [&](const char* data, size_t size) {
         SpoolRecord::Reader record(data, size);
         const int64_t beginUs = record.integer();
         const int64_t endUs = record.integer();
         const int tid = static_cast<int>(record.integer());
-        out << ",\n" << TimelineJson::serverSlice(record.text(), beginUs, endUs, tid);
+        out.append(",\n");
+        TimelineJson::serverSlice(out, record.view(), beginUs, endUs, tid);
+        drain(false);
     });
-    complete &= mSpool.forEach(kInstantGroup, [&](const char* data, size_t size) {
+    complete &= mSpool.forEachRecord(kInstantGroup, [&](const char* data, size_t size) {
         SpoolRecord::Reader record(data, size);
         const int64_t us = record.integer();
-        const std::string category = record.text();
-        out << ",\n" << TimelineJson::instant(category, record.text(), us);
+        const std::string_view category = record.view();
+        out.append(",\n");
+        TimelineJson::instant(out, category, record.view(), us);
+        drain(false);
     });
     // Spans: one named thread of the "events" process per track, tid 0 keeps the instants.
     std::vector<std::string> spanTracks;
-    complete &= mSpool.forEach(kSpanGroup, [&](const char* data, size_t size) {
+    complete &= mSpool.forEachRecord(kSpanGroup, [&](const char* data, size_t size) {
         SpoolRecord::Reader record(data, size);
-        const std::string track = record.text();
-        const std::string category = record.text();
-        const std::string name = record.text();
+        const std::string_view track = record.view();
+        const std::string_view category = record.view();
+        const std::string_view name = record.view();
         const int64_t beginUs = record.integer();
         const int64_t endUs = record.integer();
         size_t tid = 1;
         while (tid <= spanTracks.size() && spanTracks[tid - 1] != track)
             ++tid;
         if (tid > spanTracks.size()) {
-            spanTracks.push_back(track);
-            out << ",\n" << TimelineJson::spanTrack(static_cast<int>(tid), track);
+            spanTracks.emplace_back(track);
+            out.append(",\n");
+            TimelineJson::spanTrack(out, static_cast<int>(tid), track);
         }
-        out << ",\n" << TimelineJson::span(category, name, beginUs, endUs, static_cast<int>(tid));
+        out.append(",\n");
+        TimelineJson::span(out, category, name, beginUs, endUs, static_cast<int>(tid));
+        drain(false);
     });
-    out << TimelineJson::closing();
+    TimelineJson::closing(out);
+    drain(true);
     return complete;
 }
 
 std::string Timeline::chromeJson() const {
     std::lock_guard<std::mutex> lock(mLock);
-    std::ostringstream out;
-    writeLocked(out);
-    return out.str();
+    std::string out;
+    bool written = true;
+    writeLocked(out, nullptr, &written);
+    return out;
 }
 
 bool Timeline::writeChromeJson(const std::string& path, std::string* error) const {
-    std::ofstream file(path, std::ios::trunc);
-    if (!file) {
+    FILE* file = fopen(path.c_str(), "we");
+    if (file == nullptr) {
         if (error != nullptr)
             *error = "cannot write " + path;
         return false;
     }
     std::lock_guard<std::mutex> lock(mLock);
-    if (!writeLocked(file)) {
+    std::string out;
+    out.reserve(512 * 1024);
+    bool written = true;
+    const bool complete = writeLocked(out, file, &written);
+    written &= fclose(file) == 0;
+    if (!complete) {
         if (error != nullptr)
             *error =
                 "the timeline's scratch file could not be read back: " + path + " is incomplete";
         return false;
     }
-    file.close();
-    if (!file) {
+    if (!written) {
         if (error != nullptr)
             *error = "write failed: " + path;
         return false;

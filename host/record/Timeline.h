@@ -14,10 +14,11 @@
 #pragma once
 
 #include <cstdint>
+#include <cstdio>
 #include <functional>
 #include <mutex>
-#include <ostream>
 #include <string>
+#include <string_view>
 #include <unordered_map>
 #include <vector>
 
@@ -62,10 +63,10 @@ public:
     void recordInitial(const std::string& key, const std::string& path, const std::string& text);
     // A write that changed the node's value.
     void recordWrite(const std::string& key, const std::string& path, const std::string& text);
-    void recordInstant(const std::string& category, const std::string& name);
+    void recordInstant(std::string_view category, std::string_view name);
     // A server counter track took `value`; a server slice of thread `tid` ended.
-    void recordCounter(const std::string& track, int64_t value);
-    void recordSlice(const std::string& name, int64_t beginUs, int64_t endUs, int tid);
+    void recordCounter(std::string_view track, int64_t value);
+    void recordSlice(std::string_view name, int64_t beginUs, int64_t endUs, int tid);
 
     // One entry per node seen, in order of first appearance.
     std::vector<NodeSummary> summary() const;
@@ -117,8 +118,10 @@ private:
 
     Track* findTrackLocked(const std::string& key);
     uint32_t valueLocked(const std::string& text);
-    size_t counterGroupLocked(const std::string& track);
-    bool writeLocked(std::ostream& out) const;
+    size_t counterGroupLocked(std::string_view track);
+    // Appends the file's text to `out`; with `file`, hands it over as it grows (`written`
+    // false when a write failed). False when the spool could not be read back whole.
+    bool writeLocked(std::string& out, FILE* file, bool* written) const;
 
     HostClock& mClock;
     mutable std::mutex mLock;  // guards everything below

@@ -1,8 +1,10 @@
 #include "host/record/TimelineTraceSink.h"
 
+#include <pthread.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
+#include <mutex>
 #include <string>
 #include <vector>
 
@@ -15,11 +17,25 @@ struct OpenSlice {
     int64_t beginUs;
 };
 
-// Slices the calling thread has begun and not ended yet, innermost last.
+// Slices the calling thread has begun and not ended yet: the first tOpenDepth, innermost last.
+// Entries past the depth are kept for their names' buffers.
 thread_local std::vector<OpenSlice> tOpenSlices;
+thread_local size_t tOpenDepth = 0;
+
+// The calling thread's id, asked of the kernel once per thread (and again in a forked child).
+thread_local int tTid = 0;
+
+void forgetTidInChild() {
+    tTid = 0;
+}
 
 int currentTid() {
-    return static_cast<int>(syscall(SYS_gettid));
+    if (tTid == 0) {
+        static std::once_flag registered;
+        std::call_once(registered, [] { pthread_atfork(nullptr, nullptr, forgetTidInChild); });
+        tTid = static_cast<int>(syscall(SYS_gettid));
+    }
+    return tTid;
 }
 
 }  // namespace
@@ -32,15 +48,21 @@ void TimelineTraceSink::counter(const char* track, int64_t value) {
 }
 
 void TimelineTraceSink::beginSlice(const char* name) {
-    tOpenSlices.push_back({name, mClock.nowUs()});
+    const int64_t now = mClock.nowUs();
+    if (tOpenDepth == tOpenSlices.size()) {
+        tOpenSlices.push_back({name, now});
+    } else {
+        tOpenSlices[tOpenDepth].name.assign(name);
+        tOpenSlices[tOpenDepth].beginUs = now;
+    }
+    ++tOpenDepth;
 }
 
 void TimelineTraceSink::endSlice() {
-    if (tOpenSlices.empty()) {
+    if (tOpenDepth == 0) {
         return;  // begun before this sink was installed
     }
-    OpenSlice slice = std::move(tOpenSlices.back());
-    tOpenSlices.pop_back();
+    const OpenSlice& slice = tOpenSlices[--tOpenDepth];
     mTimeline.recordSlice(slice.name, slice.beginUs, mClock.nowUs(), currentTid());
 }
 

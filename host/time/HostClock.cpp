@@ -85,8 +85,9 @@ int64_t HostClock::wallUsLocked() const {
 }
 
 std::chrono::steady_clock::time_point HostClock::wallOf(int64_t us) const {
-    return mStart + std::chrono::duration_cast<std::chrono::steady_clock::duration>(
-                        std::chrono::duration<double, std::micro>(static_cast<double>(us) / mSpeed));
+    return mStart +
+           std::chrono::duration_cast<std::chrono::steady_clock::duration>(
+               std::chrono::duration<double, std::micro>(static_cast<double>(us) / mSpeed));
 }
 
 void HostClock::interrupt() {
@@ -142,8 +143,8 @@ void HostClock::advanceUs(int64_t targetUs) {
             const auto now = std::chrono::steady_clock::now();
             if (now < wall) {
                 lock.unlock();
-                std::this_thread::sleep_for(std::min<std::chrono::steady_clock::duration>(
-                    wall - now, kPaceSlice));
+                std::this_thread::sleep_for(
+                    std::min<std::chrono::steady_clock::duration>(wall - now, kPaceSlice));
                 lock.lock();
                 continue;  // someone may have armed or signalled something meanwhile
             }
@@ -303,14 +304,22 @@ int64_t HostClock::workerNowUs(int id) {
     return mNowUs;
 }
 
-void HostClock::workerSleep(int id, int64_t ms) {
-    std::unique_lock<std::mutex> lock(mLock);
+HostClock::Worker* HostClock::callingWorkerLocked(int id) {
     auto it = mWorkers.find(id);
     if (it == mWorkers.end() || it->second->exiting) {
+        return nullptr;
+    }
+    it->second->thread = std::this_thread::get_id();
+    return it->second.get();
+}
+
+void HostClock::workerSleep(int id, int64_t ms) {
+    std::unique_lock<std::mutex> lock(mLock);
+    Worker* const found = callingWorkerLocked(id);
+    if (found == nullptr) {
         return;
     }
-    Worker& worker = *it->second;
-    worker.thread = std::this_thread::get_id();
+    Worker& worker = *found;
     if (ms <= 0 && worker.again) {
         worker.again = false;
         worker.freshPass = true;
@@ -326,12 +335,11 @@ void HostClock::workerSleep(int id, int64_t ms) {
 void HostClock::workerWait(int id, const std::function<void()>& release,
                            const std::function<void()>& reacquire) {
     std::unique_lock<std::mutex> lock(mLock);
-    auto it = mWorkers.find(id);
-    if (it == mWorkers.end() || it->second->exiting) {
+    Worker* const found = callingWorkerLocked(id);
+    if (found == nullptr) {
         return;
     }
-    Worker& worker = *it->second;
-    worker.thread = std::this_thread::get_id();
+    Worker& worker = *found;
     worker.again = false;
     setStateLocked(worker, WorkerState::Waiting);
     // Signals come with the caller's mutex held, so none is lost between here and the wait.

@@ -134,6 +134,8 @@ private:
     // Wakes the workers due at the current time; true when one was woken.
     bool wakeDueLocked();
     void setStateLocked(Worker& worker, WorkerState state);
+    // The worker `id` calling from its own thread (remembered), or null when it is leaving.
+    Worker* callingWorkerLocked(int id);
     void markExitingLocked(Worker& worker);
     static bool countsAsBusy(const Worker& worker) {
         return worker.state == WorkerState::Busy && !worker.exiting;
@@ -147,7 +149,7 @@ private:
     std::mutex mAdvanceLock;
     std::map<int, Listener> mListeners;  // guarded by mAdvanceLock
 
-    mutable std::mutex mLock;  // guards everything below
+    mutable std::mutex mLock;          // guards everything below
     std::condition_variable mSettled;  // the last busy worker finished its pass
     bool mPaced = false;
     double mSpeed = 1.0;

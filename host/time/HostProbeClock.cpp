@@ -1,6 +1,5 @@
 #include "host/time/HostProbeClock.h"
 
-
 namespace velmora {
 
 namespace {

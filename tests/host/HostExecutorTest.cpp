@@ -11,10 +11,10 @@
 
 #include "config/Action.h"
 #include "host/device/DeviceTree.h"
-#include "host/time/HostClock.h"
-#include "host/platform/HostExecutor.h"
 #include "host/device/NodeMap.h"
+#include "host/platform/HostExecutor.h"
 #include "host/record/Timeline.h"
+#include "host/time/HostClock.h"
 #include "tests/host/HostTestSupport.h"
 
 namespace velmora {

@@ -82,7 +82,8 @@ INSTANTIATE_TEST_SUITE_P(Traces, ReplayTimeTest,
 TEST(ReplayPacedTest, EndsAfterTrailingSleepAndWarnsAboutTimeGoingBack) {
     const std::string dir = hosttest::makeScratchDir("paced-sleep");
     const std::string trace = dir + "/back.trace";
-    hosttest::writeFile(trace, "@100 event 4101 0\n@300 sleep 20\n@200 event 4101 -1\n@400 sleep 10\n");
+    hosttest::writeFile(trace,
+                        "@100 event 4101 0\n@300 sleep 20\n@200 event 4101 -1\n@400 sleep 10\n");
     ReplayOptions options = hosttest::replayOptions(dir, trace);
     options.configDirs = {hosttest::examplesDir()};
     options.fast = false;
@@ -99,7 +100,8 @@ TEST(ReplayPacedTest, EndsAfterTrailingSleepAndWarnsAboutTimeGoingBack) {
                   .find("back.trace:3: warning: @200 is before the time already reached (320 "
                         "ms); the call runs at 320 ms"));
     EXPECT_NE(std::string::npos,
-              hosttest::readFile(dir + "/stdout.txt").find("[      0.320] " + trace + ":3 @200 event 4101 -1 -> 0"));
+              hosttest::readFile(dir + "/stdout.txt")
+                  .find("[      0.320] " + trace + ":3 @200 event 4101 -1 -> 0"));
 }
 
 // A paced interactive replay keeps the device up to the wall clock while nobody types: the
@@ -122,7 +124,8 @@ TEST(ReplayPacedTest, InteractiveDeviceFollowsTheWallClockBetweenLines) {
         const std::string second = "getconfig 22\n";
         EXPECT_EQ(static_cast<ssize_t>(first.size()), write(fd, first.data(), first.size()));
         // Once applied, 200 ms of wall clock are two trace seconds: long reverted by then.
-        for (int i = 0; i < 1000 && hosttest::readFile(dir + "/device/" + littleMin) != "1401600"; ++i)
+        for (int i = 0; i < 1000 && hosttest::readFile(dir + "/device/" + littleMin) != "1401600";
+             ++i)
             std::this_thread::sleep_for(std::chrono::milliseconds(5));
         std::this_thread::sleep_for(std::chrono::milliseconds(200));
         whileWaiting = hosttest::readFile(dir + "/device/" + littleMin);

@@ -3,6 +3,9 @@
 // written to a file or asked for; a long recording that went through the spool comes back whole.
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <climits>
+#include <cstdint>
 #include <nlohmann/json.hpp>
 #include <string>
 #include <vector>
@@ -124,6 +127,36 @@ TEST_F(TimelineTest, ALongRecordingComesBackWhole) {
         }
     }
     EXPECT_EQ(19998, lastScene);
+}
+
+// Names of any length and any bytes, and extreme numbers, come back from the spool and the file
+// exactly: longer than a record keeps inline, with control characters, quotes and UTF-8.
+TEST_F(TimelineTest, AnyNameAndNumberComesBackExactly) {
+    const std::string longName = "slice " + std::string(300, 'n') + " end";
+    const std::string oddName = std::string("tab\there \"q\" back\\ bell\x07 \xC3\xA9", 27);
+    mTimeline.recordSlice(longName, 1, 2, 7);
+    mTimeline.recordInstant("device", oddName);
+    mTimeline.recordCounter("velmora.low", INT64_MIN);
+    mTimeline.recordCounter("velmora.high", INT64_MAX);
+    ASSERT_EQ(1u, mTimeline.slices().size());
+    EXPECT_EQ(longName, mTimeline.slices()[0].name);
+    ASSERT_EQ(1u, mTimeline.instants("device").size());
+    EXPECT_EQ(oddName, mTimeline.instants("device")[0].name);
+
+    const auto json = nlohmann::json::parse(mTimeline.chromeJson());
+    std::vector<std::string> names;
+    for (const auto& event : json["traceEvents"]) {
+        names.push_back(event["name"]);
+        if (event["name"] == "velmora.low") {
+            EXPECT_EQ(INT64_MIN, event["args"]["value"].get<int64_t>());
+        }
+        if (event["name"] == "velmora.high") {
+            EXPECT_EQ(INT64_MAX, event["args"]["value"].get<int64_t>());
+        }
+    }
+    EXPECT_NE(names.end(), std::find(names.begin(), names.end(), longName));
+    EXPECT_NE(names.end(), std::find(names.begin(), names.end(), oddName));
+    EXPECT_NE(std::string::npos, mTimeline.chromeJson().find("bell\\u0007"));
 }
 
 TEST_F(TimelineTest, AnUnwritablePathIsReported) {

@@ -2,6 +2,8 @@
 // and errors that name the file and line.
 #include <gtest/gtest.h>
 
+#include <cstdint>
+
 #include "tools/replay/TraceParser.h"
 
 namespace velmora {
@@ -46,6 +48,22 @@ TEST(TraceParserTest, RequestsAndQueriesTakeUpToTheMostTags) {
     EXPECT_EQ(1024u, calls[1].tags.size());
 }
 
+// Plain decimals are read without strtoll; every other spelling must still read as strtoll
+// reads it (base 0), and the range limits hold for both (bad spellings: the table below).
+TEST(TraceParserTest, NumbersReadAsStrtollReadsThem) {
+    std::vector<TraceCall> calls;
+    std::string error;
+    ASSERT_EQ(0, TraceParser::parseText("event 4099 010 0x10 -0 0 -7 4294967295 -2147483648 +5\n"
+                                        "@9223372036854775 sleep 0\n",
+                                        "t.trace", &calls, &error))
+        << error;
+    ASSERT_EQ(2u, calls.size());
+    // Octal, hex, zeros, the unsigned top wrapping to -1 as a command id or payload does.
+    EXPECT_EQ((std::vector<int>{8, 16, 0, 0, -7, -1, INT32_MIN, 5}), calls[0].payload);
+    EXPECT_EQ(9223372036854775, calls[1].atMs);  // the largest time in milliseconds
+    EXPECT_EQ(0, calls[1].sleepMs);
+}
+
 TEST(TraceParserTest, BadLineNamesFileAndLine) {
     const std::pair<std::string, std::string> rows[] = {
         {"evnt 4098 0", "minute.trace:2: unknown call 'evnt'; did you mean 'event'?"},
@@ -58,6 +76,13 @@ TEST(TraceParserTest, BadLineNamesFileAndLine) {
         {"sleep soon", "minute.trace:2: malformed time 'soon' for sleep"},
         {"sleep \" 5\"", "minute.trace:2: malformed time ' 5' for sleep"},
         {"event 99999999999 0", "minute.trace:2: malformed number '99999999999' for command id"},
+        {"event 4294967296 0", "minute.trace:2: malformed number '4294967296' for command id"},
+        {"event -2147483649 0", "minute.trace:2: malformed number '-2147483649' for command id"},
+        {"event 1234567890123456789 0",
+         "minute.trace:2: malformed number '1234567890123456789' for command id"},
+        {"event 4099 \"\"", "minute.trace:2: malformed number '' for payload"},
+        {"sleep 0009", "minute.trace:2: malformed time '0009' for sleep"},
+        {"sleep 9223372036854776", "minute.trace:2: malformed time '9223372036854776' for sleep"},
         // Wrong shapes (a wrong argument count: the byte-order-mark test below).
         {"setconfig 1 2:1497600", "minute.trace:2: expected <tag>=<value>, got '2:1497600'"},
         {"event 4116 0 msg=\"pid=1", "minute.trace:2: unterminated quote"},

@@ -52,6 +52,27 @@ TEST(TraceReaderTest, ReadsAFileCallByCallGoingOnPastBadLines) {
     EXPECT_FALSE(TraceReader(dir + "/missing.trace").isOpen());
 }
 
+// The reader takes the file a block at a time: lines that straddle blocks come back whole, a
+// line of exactly the limit is no bad line, and a last line without a newline still counts.
+TEST(TraceReaderTest, LinesAcrossBlocksComeBackWhole) {
+    std::string text;
+    std::vector<std::string> expected;
+    for (int i = 0; text.size() < 3 * 64 * 1024; ++i) {
+        expected.push_back("@" + std::to_string(i) + " event 4099 " + std::to_string(i * 7));
+        text += expected.back() + (i % 3 == 0 ? "\r\n" : "\n");
+    }
+    const std::string longest = "event 4099 msg=" + std::string(TraceReader::kMaxLineBytes - 15, 'x');
+    text += longest + "\nreload";
+    expected.push_back(longest);
+    expected.push_back("reload");
+    const std::string path = hosttest::makeScratchDir("blocks") + "/t.trace";
+    hosttest::writeFile(path, text);
+    TraceReader reader(path);
+    const Read read = readAll(reader);
+    EXPECT_TRUE(read.errors.empty()) << read.errors.front();
+    EXPECT_EQ(expected, read.calls);
+}
+
 // A line is read into memory up to the limit and no further; the lines after it still count.
 TEST(TraceReaderTest, AnOverlongLineIsABadLineAndReadingGoesOn) {
     const std::string text = "event " + std::string(TraceReader::kMaxLineBytes, '1') + "\nreload\n";

@@ -80,7 +80,7 @@ void ReplayInsight::beginCall(CallRecord call) {
         const std::string label = SourceLedger::clientName(mCall.id);
         mClientBefore = mLedger.requestsOf(label);
         for (size_t i = 0; i < mCall.tags.size() && i < mCall.values.size(); ++i) {
-            const std::string key = mNodes.keyForTag(mCall.tags[i]);
+            const std::string& key = mNodes.keyForTag(mCall.tags[i]);
             if (!key.empty())
                 mLedger.set(key, label, mCall.values[i], /*client=*/true, mCallRef);
         }
@@ -204,6 +204,8 @@ void ReplayInsight::onNodeResolved(const std::string& key, const std::string& va
     }
     NodeTrack& track = it->second;
     const bool changed = value != track.value;
+    if (!changed && SourceLedger::keepsHolder(source, track.holder))
+        return;
     const std::string holder =
         mLedger.holderName(key, value, source, track.holder, changed, mInCall ? mCallLabel : "");
     if (!changed && holder == track.holder)

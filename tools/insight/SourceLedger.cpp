@@ -87,6 +87,14 @@ std::string SourceLedger::holderName(const std::string& key, const std::string& 
     return best != nullptr ? best->first : "freq";
 }
 
+bool SourceLedger::keepsHolder(const std::string& source, const std::string& previousHolder) {
+    if (source.empty())
+        return previousHolder == "initial";
+    if (source == "probe")
+        return previousHolder == "probe boost";
+    return source == "sched" && previousHolder.compare(0, 6, "sched ") == 0;
+}
+
 std::vector<SourceLedger::Standing> SourceLedger::clientRequests() const {
     std::vector<Standing> out;
     for (const auto& node : mRequests) {

@@ -41,6 +41,11 @@ public:
                            const std::string& source, const std::string& previousHolder,
                            bool valueChanged, const std::string& currentCall) const;
 
+    // Whether holderName() of an unchanged value names `previousHolder` again whatever the
+    // requests: for the baseline, the probe, and the group levels that did not move. Lets a
+    // caller skip the lookup for the resolutions that repeat themselves.
+    static bool keepsHolder(const std::string& source, const std::string& previousHolder);
+
     // Every client request still standing, for the end-of-replay warnings.
     struct Standing {
         std::string key;

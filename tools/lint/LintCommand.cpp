@@ -13,6 +13,8 @@ namespace velmora {
 namespace {
 
 constexpr const char* kProgram = "velmora-lint";
+// The loader refuses a larger configuration before reading it (config/VelmoraLoadXml.cpp).
+constexpr long long kMaxConfigBytes = 16LL * 1024 * 1024;
 
 // Empty when `path` is a readable regular file, else why not.
 std::string unreadableReason(const std::string& path) {
@@ -40,6 +42,7 @@ void LintCommand::printUsage(std::ostream& to) {
        << "  --werror    exit 1 when there are warnings (and no errors)\n"
        << "  --device F  check values against device profile F (default: the example device,\n"
        << "              examples/device/example-device.xml)\n"
+       << "  --version   print the version and exit\n"
        << "Exit status: 0 clean (notes allowed), 1 warnings with --werror, 2 errors or a\n"
        << "usage error.\n";
 }
@@ -64,6 +67,9 @@ int LintCommand::run(const std::vector<std::string>& args, std::ostream& out, st
         } else if (arg == "--help" || arg == "-h") {
             printUsage(out);
             return 0;
+        } else if (arg == "--version") {
+            out << kProgram << ' ' << VELMORA_VERSION << '\n';
+            return 0;
         } else if (arg.size() > 1 && arg[0] == '-') {
             err << kProgram << ": unknown option " << arg << '\n';
             printUsage(err);
@@ -85,6 +91,15 @@ int LintCommand::run(const std::vector<std::string>& args, std::ostream& out, st
     const std::string reason = unreadableReason(path);
     if (!reason.empty()) {
         err << kProgram << ": " << path << ": " << reason << '\n';
+        return kUsageError;
+    }
+    struct stat info {};
+    if (stat(path.c_str(), &info) == 0 && static_cast<long long>(info.st_size) > kMaxConfigBytes) {
+        // Said here in words: the checker would otherwise read it whole and find the loader
+        // refusing what the checker parsed.
+        out << path << ":1: error: the file is " << static_cast<long long>(info.st_size)
+            << " bytes, more than the " << kMaxConfigBytes
+            << " (16 MiB) a configuration may have: the server refuses it without reading it\n";
         return kUsageError;
     }
     DeviceProfile device;

@@ -3,6 +3,7 @@
 #include <fstream>
 #include <sstream>
 
+#include "tools/common/InputFile.h"
 #include "tools/logcat/LogcatImporter.h"
 
 namespace velmora {
@@ -11,8 +12,11 @@ namespace {
 
 constexpr const char* kUsage =
     "usage: velmora-import-logcat LOG -o TRACE\n"
-    "  LOG       text of adb logcat (threadtime or time; year, epoch, monotonic, uid)\n"
-    "  -o TRACE  the event trace to write, for velmora-replay\n";
+    "  LOG        text of adb logcat (threadtime or time; year, epoch, monotonic, uid), at\n"
+    "             most 256 MiB\n"
+    "  -o TRACE   the event trace to write, for velmora-replay\n"
+    "  --version  print the version and exit\n"
+    "Exit status: 0 imported, 1 bad input, 2 a usage error.\n";
 
 }  // namespace
 
@@ -25,17 +29,26 @@ int LogcatImportCommand::run(const std::vector<std::string>& args, std::ostream&
             out << kUsage;
             return kOk;
         }
+        if (args[i] == "--version") {
+            out << "velmora-import-logcat " << VELMORA_VERSION << "\n";
+            return kOk;
+        }
         if (args[i] == "-o" && i + 1 < args.size()) {
             tracePath = args[++i];
         } else if (!args[i].empty() && args[i][0] != '-' && logPath.empty()) {
             logPath = args[i];
         } else {
             err << "velmora-import-logcat: unexpected argument '" << args[i] << "'\n" << kUsage;
-            return kBadInput;
+            return kUsageError;
         }
     }
     if (logPath.empty() || tracePath.empty()) {
         err << kUsage;
+        return kUsageError;
+    }
+    const std::string refusal = InputFile::refusal(logPath);
+    if (!refusal.empty()) {
+        err << "velmora-import-logcat: " << logPath << " " << refusal << "\n";
         return kBadInput;
     }
     std::ifstream in(logPath, std::ios::binary);

@@ -8,12 +8,13 @@
 
 #include "config/CommandIds.h"
 #include "config/VelmoraParser.h"
+#include "host/device/profile/DeviceProfile.h"
 #include "host/platform/HostEnvironment.h"
 #include "host/platform/HostPlatform.h"
-#include "tools/common/Spelling.h"
-#include "host/device/profile/DeviceProfile.h"
 #include "platform/VelmoraPlat.h"
 #include "server/VelmoraServer.h"
+#include "tools/common/InputFile.h"
+#include "tools/common/Spelling.h"
 #include "tools/insight/HtmlReport.h"
 #include "tools/insight/InsightJson.h"
 #include "tools/insight/InsightSummary.h"
@@ -97,8 +98,9 @@ int ReplaySession::setUp() {
     }
     const std::string root =
         mOptions.deviceRoot.empty() ? HostEnvironment::defaultSimulatedRoot() : mOptions.deviceRoot;
-    // A device root of our own making goes again at the end; one the user named stays.
-    mOwnedRoot = mOptions.deviceRoot.empty() ? root : std::string();
+    // A device root of our own making goes again at the end, unless asked to keep it; one the
+    // user named stays.
+    mOwnedRoot = mOptions.deviceRoot.empty() && !mOptions.keepRoot ? root : std::string();
     if (env.useDeviceRoot(root, /*fresh=*/true) != 0) {
         fprintf(mErr, "velmora-replay: device root %s is not usable\n", root.c_str());
         return kSetupFailed;
@@ -258,6 +260,15 @@ int ReplaySession::performCall(const TraceCall& call) {
 int ReplaySession::replayFile() {
     // Every bad line is reported before anything runs. The first pass keeps what the warnings
     // need, the second replays the calls as it reads them: the trace is never held in memory.
+    // A directory, a binary file or a huge one is refused before a byte of it is parsed; a
+    // missing trace is reported by the survey.
+    if (access(mOptions.tracePath.c_str(), F_OK) == 0) {
+        const std::string refusal = InputFile::refusal(mOptions.tracePath);
+        if (!refusal.empty()) {
+            fprintf(mErr, "velmora-replay: %s %s\n", mOptions.tracePath.c_str(), refusal.c_str());
+            return kBadInput;
+        }
+    }
     TraceSurvey survey;
     const int errors = survey.read(mOptions.tracePath, [this](const std::string& message) {
         fprintf(mErr, "velmora-replay: %s\n", message.c_str());
@@ -430,7 +441,8 @@ int ReplaySession::writeOutputs() {
         return kOk;
     HostEnvironment& env = HostEnvironment::get();
     std::string error;
-    if (!env.timeline().writeChromeJson(mOptions.timelinePath, &error) ||
+    if ((!mOptions.timelinePath.empty() &&
+         !env.timeline().writeChromeJson(mOptions.timelinePath, &error)) ||
         (!mOptions.summaryJsonPath.empty() &&
          !InsightJson::writeSummary(mResult, mOptions.summaryJsonPath, &error)) ||
         (!mOptions.reportPath.empty() &&
@@ -438,8 +450,15 @@ int ReplaySession::writeOutputs() {
         fprintf(mErr, "velmora-replay: %s\n", error.c_str());
         return kSetupFailed;
     }
-    fprintf(mOut, "\ntimeline: %s (open in https://ui.perfetto.dev)\nevent log: %s\n",
-            mOptions.timelinePath.c_str(), mOptions.eventLogPath.c_str());
+    const bool any = !mOptions.timelinePath.empty() || !mOptions.eventLogPath.empty() ||
+                     !mOptions.summaryJsonPath.empty() || !mOptions.reportPath.empty();
+    if (any)
+        fputc('\n', mOut);
+    if (!mOptions.timelinePath.empty())
+        fprintf(mOut, "timeline: %s (open in https://ui.perfetto.dev)\n",
+                mOptions.timelinePath.c_str());
+    if (!mOptions.eventLogPath.empty())
+        fprintf(mOut, "event log: %s\n", mOptions.eventLogPath.c_str());
     if (!mOptions.summaryJsonPath.empty())
         fprintf(mOut, "summary: %s\n", mOptions.summaryJsonPath.c_str());
     if (!mOptions.reportPath.empty())
@@ -503,6 +522,8 @@ int ReplaySession::run() {
         fputs(("\n" + InsightSummary::warnings(mResult)).c_str(), mOut);
     }
     const int written = writeOutputs();
+    if (mOptions.keepRoot && mOptions.deviceRoot.empty())
+        fprintf(mOut, "device kept: %s\n", env.device().root().c_str());
     return written != kOk ? written : result;
 }
 

@@ -1,6 +1,8 @@
 // One run of velmora-replay: sets up the host platform layer, initialises a VelmoraServer on it,
 // replays the calls of a trace (or of stdin, interactively), and reports what the device nodes
-// went through: a per-node summary and a timeline in Chrome's JSON trace format.
+// went through: a per-node summary and, for each output path that is set, a timeline in Chrome's
+// JSON trace format, the device event log, the summary JSON and the HTML report. Nothing else is
+// left behind: the default simulated device (in $TMPDIR) goes at the end unless kept.
 //
 // Used by the velmora-replay program and by the end-to-end tests; single threaded.
 #pragma once
@@ -28,13 +30,14 @@ struct ReplayOptions {
     std::string tracePath;                // ignored when interactive
     bool interactive = false;             // read calls from `input` until end of file
     std::vector<std::string> configDirs;  // default: the trace's directory
-    std::string deviceRoot;               // default: a fresh simulated device in /tmp
+    std::string deviceRoot;               // default: a fresh simulated device in $TMPDIR
+    bool keepRoot = false;                // the default simulated device stays after the run
     std::string devicePath;               // device profile; default: the example device
     std::string nodeMapPath;              // node map overrides, optional
     double speed = 1.0;                   // trace ms per real ms
     bool fast = false;                    // virtual time: no waiting at all
-    std::string timelinePath = "velmora-timeline.json";
-    std::string eventLogPath = "velmora-events.log";
+    std::string timelinePath;             // Chrome JSON timeline; optional
+    std::string eventLogPath;             // device event log lines; optional
     std::vector<std::pair<std::string, std::string>> properties;
     bool quiet = false;           // no per-call lines
     std::string summaryJsonPath;  // everything the analysis found, as JSON; optional

@@ -50,6 +50,11 @@ public:
     // `error` naming file:line.
     static int parseLine(const std::string& line, const std::string& file, int lineNo,
                          std::vector<TraceCall>* calls, std::string* error);
+    // parseLine() into `call`, whose buffers are reused: `any` tells whether the line held a
+    // call (false for a blank line or a comment, `call` then untouched). On an error `call` may
+    // be half filled.
+    static int parseInto(const std::string& line, const std::string& file, int lineNo,
+                         TraceCall* call, bool* any, std::string* error);
     // Every line of `text`, read by TraceReader (a UTF-8 byte-order mark at its start is
     // skipped). Goes on past bad lines: -1 when there was one, with `error` holding one message
     // per bad line, separated by newlines; the calls of the good lines are appended either way.

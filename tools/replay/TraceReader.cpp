@@ -1,7 +1,9 @@
 #include "tools/replay/TraceReader.h"
 
+#include <cstring>
 #include <fstream>
 #include <sstream>
+#include <utility>
 
 namespace velmora {
 
@@ -28,18 +30,32 @@ bool TraceReader::isOpen() const {
 bool TraceReader::readLine(std::string* line, bool* tooLong) {
     line->clear();
     *tooLong = false;
-    std::streambuf* in = mIn->rdbuf();
     bool any = false;
-    for (int c = in->sbumpc(); c != std::char_traits<char>::eof(); c = in->sbumpc()) {
+    for (;;) {
+        if (mBlockAt == mBlock.size()) {
+            // The stream is read a block at a time and the lines are cut out of the block.
+            mBlock.resize(kBlockBytes);
+            const std::streamsize got = mIn->rdbuf()->sgetn(&mBlock[0], kBlockBytes);
+            mBlock.resize(got > 0 ? static_cast<size_t>(got) : 0);
+            mBlockAt = 0;
+            if (mBlock.empty())
+                return any;  // a last line without a newline
+        }
         any = true;
-        if (c == '\n')
-            return true;
-        if (line->size() < kMaxLineBytes)
-            line->push_back(static_cast<char>(c));
-        else
+        const char* begin = mBlock.data() + mBlockAt;
+        const size_t left = mBlock.size() - mBlockAt;
+        const char* newline = static_cast<const char*>(memchr(begin, '\n', left));
+        const size_t size = newline != nullptr ? static_cast<size_t>(newline - begin) : left;
+        const size_t room = kMaxLineBytes - line->size();
+        line->append(begin, size < room ? size : room);
+        if (size > room)
             *tooLong = true;
+        mBlockAt += size;
+        if (newline != nullptr) {
+            ++mBlockAt;
+            return true;
+        }
     }
-    return any;  // a last line without a newline
 }
 
 TraceReader::Step TraceReader::next(TraceCall* call, std::string* error) {
@@ -55,11 +71,12 @@ TraceReader::Step TraceReader::next(TraceCall* call, std::string* error) {
             lineError = mFile + ":" + std::to_string(mLineNo) + ": line longer than " +
                         std::to_string(kMaxLineBytes) + " bytes";
         } else {
-            mParsed.clear();
-            if (TraceParser::parseLine(mLine, mFile, mLineNo, &mParsed, &lineError) == 0) {
-                if (mParsed.empty())
+            bool any = false;
+            if (TraceParser::parseInto(mLine, mFile, mLineNo, &mParsed, &any, &lineError) == 0) {
+                if (!any)
                     continue;  // blank or a comment
-                *call = std::move(mParsed.front());
+                // The caller's call goes back to be filled next time, with its buffers.
+                std::swap(*call, mParsed);
                 ++mCalls;
                 return Step::Call;
             }

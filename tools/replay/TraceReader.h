@@ -41,8 +41,11 @@ private:
     std::unique_ptr<std::istream> mIn;
     int mLineNo = 0;
     size_t mCalls = 0;
+    static constexpr size_t kBlockBytes = 64 * 1024;
+    std::string mBlock;   // read from the stream, not yet cut into lines from mBlockAt on
+    size_t mBlockAt = 0;
     std::string mLine;
-    std::vector<TraceCall> mParsed;  // parseLine's output, one call at most
+    TraceCall mParsed;  // the line being parsed; swapped with the caller's call when good
 };
 
 }  // namespace velmora

@@ -11,6 +11,7 @@
 #include "tools/replay/ComparisonRun.h"
 #include "tools/replay/InstalledExample.h"
 #include "tools/replay/ReplaySession.h"
+#include "tools/replay/ServerLog.h"
 
 namespace {
 
@@ -22,22 +23,28 @@ void usage(FILE* to) {
         "                       default: the trace's directory, then the installed example\n"
         "                       in <prefix>/share/velmora/examples)\n"
         "  --root DIR           device root: a fresh simulated device is created there\n"
-        "                       and kept (default /tmp/velmora-sim-<pid>, removed at the\n"
-        "                       end); \"/\" writes the real nodes\n"
+        "                       and kept (default $TMPDIR/velmora-sim-<pid>, removed at\n"
+        "                       the end); \"/\" writes the real nodes\n"
+        "  --keep-root          keep the default simulated device after the replay\n"
         "  --device FILE        device profile (default: the example device,\n"
         "                       examples/device/example-device.xml)\n"
         "  --nodes FILE         node map overrides\n"
         "  --speed X            pace the replay at X times real time (default 1)\n"
         "  --fast               no pacing: same results, no waiting at all\n"
-        "  --timeline FILE      Chrome JSON timeline (default velmora-timeline.json)\n"
-        "  --event-log FILE     device event log lines (default velmora-events.log)\n"
+        "  --timeline FILE      write a Chrome JSON timeline\n"
+        "  --event-log FILE     write the device event log lines (frequency-limit reports)\n"
         "  --property KEY=VAL   system property seen by the server (repeatable)\n"
         "  --summary-json FILE  what the analysis found, as JSON (docs/replay-insight.md)\n"
         "  --report FILE.html   self-contained HTML report (plots, holders, warnings)\n"
         "  --compare DIR_B      replay twice in virtual time, under the configuration and\n"
         "                       under DIR_B's, and report the differences\n"
         "  --quiet              no line per call\n"
-        "  --interactive        read calls from stdin\n",
+        "  --server-log FILE    write the server's own log to FILE (default: dropped)\n"
+        "  --verbose            show the server's own log on stderr\n"
+        "  --interactive        read calls from stdin\n"
+        "  --version            print the version and exit\n"
+        "Nothing is written but what an option names. Exit status: 0 the trace ran, 1 bad\n"
+        "input, 2 a usage error or the set-up failed, 130 interrupted.\n",
         to);
 }
 
@@ -64,18 +71,23 @@ void catchInterrupts() {
 
 // Exit status after an interrupt, as a shell reports a process ended by SIGINT.
 constexpr int kInterrupted = 130;
+// Exit status of a command line that cannot be run (the same for every velmora tool).
+constexpr int kUsageError = 2;
 
 }  // namespace
 
 int main(int argc, char** argv) {
     velmora::ReplayOptions options;
     std::string compareDir;
+    std::string serverLogPath;  // --server-log
+    bool verbose = false;       // the server's log on stderr
+    bool speedGiven = false;
     for (int i = 1; i < argc; ++i) {
         const std::string arg = argv[i];
         auto value = [&](const char* name) -> const char* {
             if (i + 1 >= argc) {
                 fprintf(stderr, "velmora-replay: %s needs a value\n", name);
-                exit(velmora::ReplaySession::kBadInput);
+                exit(kUsageError);
             }
             return argv[++i];
         };
@@ -93,8 +105,9 @@ int main(int argc, char** argv) {
             options.speed = strtod(text, &end);
             if (*end != '\0' || !(options.speed > 0)) {
                 fprintf(stderr, "velmora-replay: malformed speed '%s'\n", text);
-                return velmora::ReplaySession::kBadInput;
+                return kUsageError;
             }
+            speedGiven = true;
         } else if (arg == "--fast") {
             options.fast = true;
         } else if (arg == "--timeline") {
@@ -107,7 +120,7 @@ int main(int argc, char** argv) {
             if (eq == std::string::npos || eq == 0) {
                 fprintf(stderr, "velmora-replay: --property wants KEY=VALUE, got '%s'\n",
                         kv.c_str());
-                return velmora::ReplaySession::kBadInput;
+                return kUsageError;
             }
             options.properties.emplace_back(kv.substr(0, eq), kv.substr(eq + 1));
         } else if (arg == "--summary-json") {
@@ -118,6 +131,15 @@ int main(int argc, char** argv) {
             compareDir = value("--compare");
         } else if (arg == "--quiet") {
             options.quiet = true;
+        } else if (arg == "--keep-root") {
+            options.keepRoot = true;
+        } else if (arg == "--server-log") {
+            serverLogPath = value("--server-log");
+        } else if (arg == "--verbose") {
+            verbose = true;
+        } else if (arg == "--version") {
+            printf("velmora-replay %s\n", VELMORA_VERSION);
+            return 0;
         } else if (arg == "--interactive") {
             options.interactive = true;
         } else if (arg == "--help" || arg == "-h") {
@@ -126,17 +148,34 @@ int main(int argc, char** argv) {
         } else if (!arg.empty() && arg[0] == '-') {
             fprintf(stderr, "velmora-replay: unknown option %s\n", arg.c_str());
             usage(stderr);
-            return velmora::ReplaySession::kBadInput;
+            return kUsageError;
         } else if (options.tracePath.empty()) {
             options.tracePath = arg;
         } else {
             fprintf(stderr, "velmora-replay: more than one trace given\n");
-            return velmora::ReplaySession::kBadInput;
+            return kUsageError;
         }
     }
     if (options.tracePath.empty() && !options.interactive) {
         usage(stderr);
-        return velmora::ReplaySession::kBadInput;
+        return kUsageError;
+    }
+    if (options.fast && speedGiven) {
+        fprintf(stderr,
+                "velmora-replay: --fast and --speed exclude each other: --fast does not "
+                "pace at all\n");
+        return kUsageError;
+    }
+    if (options.keepRoot && !options.deviceRoot.empty()) {
+        fprintf(stderr,
+                "velmora-replay: --keep-root is for the default device: a --root is "
+                "always kept\n");
+        return kUsageError;
+    }
+    std::string logError;
+    if (!velmora::ServerLog::route(serverLogPath, verbose, &logError)) {
+        fprintf(stderr, "velmora-replay: %s\n", logError.c_str());
+        return velmora::ReplaySession::kSetupFailed;
     }
     if (options.configDirs.empty()) {
         options.configDirs = velmora::defaultConfigDirs(options.tracePath, options.interactive);

@@ -1,0 +1,179 @@
+// The tools as command-line programs: what a replay leaves on disk and on the terminal, where the
+// server's log goes, --version and the status of a usage error.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+
+#include <string>
+#include <vector>
+
+#include "tests/cli/ToolRun.h"
+
+namespace velmora {
+namespace clitest {
+namespace {
+
+std::string minuteTrace() {
+    return examplesDir() + "/minute.trace";
+}
+
+// A --fast replay of the example minute in an empty directory, with TMPDIR another empty one.
+struct CleanRun {
+    std::string cwd = scratchDir("cwd");
+    std::string tmp = scratchDir("tmp");
+    ToolResult result;
+
+    explicit CleanRun(std::vector<std::string> options) {
+        std::vector<std::string> argv = {replayTool(), "--fast"};
+        argv.insert(argv.end(), options.begin(), options.end());
+        argv.push_back(minuteTrace());
+        result = ToolRun::run(argv, cwd, {"TMPDIR=" + tmp});
+    }
+};
+
+TEST(ReplayLeavesNothingBehindTest, PlainReplayWritesNoFileAndRemovesItsDevice) {
+    CleanRun run({"--quiet"});
+    EXPECT_EQ(0, run.result.status) << run.result.err;
+    EXPECT_NE(std::string::npos, run.result.out.find("cpu.big.max"));  // the summary still comes
+    EXPECT_EQ(std::vector<std::string>{}, entries(run.cwd));
+    EXPECT_EQ(std::vector<std::string>{}, entries(run.tmp));
+    // The device was made under TMPDIR, not /tmp.
+    EXPECT_NE(std::string::npos, run.result.out.find("(device " + run.tmp + "/velmora-sim-"))
+        << run.result.out.substr(0, 200);
+}
+
+TEST(ReplayLeavesNothingBehindTest, WritesOnlyTheFilesItsOptionsName) {
+    CleanRun run({"--quiet", "--timeline", "t.json", "--event-log", "e.log"});
+    EXPECT_EQ(0, run.result.status) << run.result.err;
+    EXPECT_EQ((std::vector<std::string>{"e.log", "t.json"}), entries(run.cwd));
+    EXPECT_EQ(std::vector<std::string>{}, entries(run.tmp));
+    EXPECT_NE(std::string::npos, run.result.out.find("timeline: t.json"));
+    EXPECT_NE(std::string::npos, readFile(run.cwd + "/e.log").find("#ARG1:"));
+}
+
+TEST(ReplayLeavesNothingBehindTest, KeepRootKeepsTheDefaultDeviceAndSaysWhere) {
+    CleanRun run({"--quiet", "--keep-root"});
+    EXPECT_EQ(0, run.result.status) << run.result.err;
+    const std::vector<std::string> kept = entries(run.tmp);
+    ASSERT_FALSE(kept.empty());
+    const std::string device = kept.front();
+    EXPECT_EQ(0u, device.rfind("velmora-sim-", 0)) << device;
+    EXPECT_NE(std::string::npos, run.result.out.find("device kept: " + run.tmp + "/" + device));
+    EXPECT_NE(kept.end(), std::find(kept.begin(), kept.end(), device + "/.velmora-simulated"));
+    EXPECT_EQ(std::vector<std::string>{}, entries(run.cwd));
+}
+
+TEST(ReplayTerminalTest, PlainReplayKeepsTheServerLogOffTheTerminal) {
+    CleanRun run({});
+    EXPECT_EQ(0, run.result.status) << run.result.err;
+    EXPECT_LE(run.result.errLines(), 3) << run.result.err;
+    EXPECT_EQ(std::string::npos, run.result.err.find("velmora server")) << run.result.err;
+}
+
+TEST(ReplayTerminalTest, ServerLogGoesToTheFileNamed) {
+    CleanRun run({"--quiet", "--server-log", "server.log"});
+    EXPECT_EQ(0, run.result.status) << run.result.err;
+    const std::string log = readFile(run.cwd + "/server.log");
+    // A fresh host has no cloud copy: the server says so and loads the device copy.
+    EXPECT_NE(std::string::npos, log.find("E velmora server: LoadFile error")) << log;
+    EXPECT_NE(std::string::npos,
+              log.find("E velmora server: get cloud velmora_config_cust.xml failed!"))
+        << log;
+    EXPECT_EQ(std::string::npos, run.result.err.find("LoadFile error"));
+}
+
+TEST(ReplayTerminalTest, VerboseShowsTheServerLogOnStderr) {
+    CleanRun run({"--quiet", "--verbose"});
+    EXPECT_EQ(0, run.result.status) << run.result.err;
+    EXPECT_NE(std::string::npos, run.result.err.find("LoadFile error")) << run.result.err;
+}
+
+TEST(ReplayTerminalTest, ServerLogThatCannotBeWrittenIsASetUpFailure) {
+    const std::string cwd = scratchDir("cwd");
+    const ToolResult result = ToolRun::run(
+        {replayTool(), "--fast", "--server-log", cwd + "/none/server.log", minuteTrace()}, cwd);
+    EXPECT_EQ(2, result.status);
+    EXPECT_EQ("velmora-replay: cannot write " + cwd + "/none/server.log\n", result.err);
+}
+
+// Every tool prints its name and the project's version, and nothing else.
+TEST(ToolVersionTest, EveryToolPrintsItsNameAndTheProjectVersion) {
+    const std::string cwd = scratchDir("version");
+    const std::vector<std::pair<std::string, std::string>> tools = {
+        {replayTool(), "velmora-replay"},
+        {lintTool(), "velmora-lint"},
+        {logcatTool(), "velmora-import-logcat"}};
+    for (const auto& tool : tools) {
+        const ToolResult result = ToolRun::run({tool.first, "--version"}, cwd);
+        EXPECT_EQ(0, result.status) << tool.second;
+        EXPECT_EQ(tool.second + " " + VELMORA_PROJECT_VERSION + "\n", result.out);
+        EXPECT_EQ("", result.err) << tool.second;
+    }
+}
+
+struct UsageRow {
+    const char* name;
+    std::string tool;
+    std::vector<std::string> args;
+    std::string message;  // a part of what is said on stderr
+};
+
+void PrintTo(const UsageRow& row, std::ostream* os) {
+    *os << row.name;
+}
+
+class UsageErrorTest : public ::testing::TestWithParam<UsageRow> {};
+
+// A command line that cannot be run: status 2 for every tool, said on stderr, nothing on stdout
+// and nothing written.
+TEST_P(UsageErrorTest, ExitsTwoAndSaysWhy) {
+    const UsageRow& row = GetParam();
+    const std::string cwd = scratchDir("usage");
+    std::vector<std::string> argv = {row.tool};
+    argv.insert(argv.end(), row.args.begin(), row.args.end());
+    const ToolResult result = ToolRun::run(argv, cwd);
+    EXPECT_EQ(2, result.status) << result.err;
+    EXPECT_NE(std::string::npos, result.err.find(row.message)) << result.err;
+    EXPECT_EQ("", result.out);
+    EXPECT_EQ(std::vector<std::string>{}, entries(cwd));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Rows, UsageErrorTest,
+    ::testing::Values(
+        UsageRow{
+            "ReplayUnknownOption", replayTool(), {"--fsat", "t.trace"}, "unknown option --fsat"},
+        UsageRow{"ReplayNoTrace", replayTool(), {"--fast"}, "usage: velmora-replay"},
+        UsageRow{"ReplayTwoTraces", replayTool(), {"a.trace", "b.trace"}, "more than one trace"},
+        UsageRow{"ReplayOptionWithoutValue",
+                 replayTool(),
+                 {"t.trace", "--timeline"},
+                 "--timeline needs a value"},
+        UsageRow{"ReplayMalformedSpeed",
+                 replayTool(),
+                 {"--speed", "fast", "t.trace"},
+                 "malformed speed 'fast'"},
+        UsageRow{"ReplayFastWithSpeed",
+                 replayTool(),
+                 {"--fast", "--speed", "4", "t.trace"},
+                 "--fast and --speed exclude each other"},
+        UsageRow{"ReplayKeepRootWithRoot",
+                 replayTool(),
+                 {"--keep-root", "--root", "d", "t.trace"},
+                 "--keep-root is for the default device"},
+        UsageRow{"ReplayPropertyWithoutValue",
+                 replayTool(),
+                 {"--property", "k", "t.trace"},
+                 "--property wants KEY=VALUE"},
+        UsageRow{"LintUnknownOption", lintTool(), {"--explian", "c.xml"}, "unknown option"},
+        UsageRow{"LintNoConfiguration", lintTool(), {}, "no configuration file given"},
+        UsageRow{"LogcatUnknownOption",
+                 logcatTool(),
+                 {"--in", "a.log", "-o", "t.trace"},
+                 "unexpected argument '--in'"},
+        UsageRow{"LogcatNoOutput", logcatTool(), {"a.log"}, "usage: velmora-import-logcat"}),
+    [](const ::testing::TestParamInfo<UsageRow>& info) { return std::string(info.param.name); });
+
+}  // namespace
+}  // namespace clitest
+}  // namespace velmora

@@ -1,0 +1,77 @@
+#include "tools/replay/ServerLog.h"
+
+#include <android/log.h>
+
+#include <cstdio>
+#include <mutex>
+
+namespace velmora {
+
+namespace {
+
+std::mutex gLock;        // guards gFile and gToStderr; the server logs from threads
+FILE* gFile = nullptr;   // --server-log, or null
+bool gToStderr = false;  // --verbose
+
+char priorityLetter(int priority) {
+    switch (priority) {
+        case ANDROID_LOG_VERBOSE:
+            return 'V';
+        case ANDROID_LOG_DEBUG:
+            return 'D';
+        case ANDROID_LOG_INFO:
+            return 'I';
+        case ANDROID_LOG_WARN:
+            return 'W';
+        case ANDROID_LOG_ERROR:
+            return 'E';
+        case ANDROID_LOG_FATAL:
+            return 'F';
+        default:
+            return '?';
+    }
+}
+
+void routedLogger(const struct __android_logger_data* data, const char* message) {
+    std::lock_guard<std::mutex> lock(gLock);
+    if (gToStderr)
+        __android_log_stderr_logger(data, message);
+    if (gFile == nullptr || data == nullptr || message == nullptr)
+        return;
+    fprintf(gFile, "%c %s: %s\n", priorityLetter(data->priority),
+            data->tag != nullptr ? data->tag : "", message);
+    fflush(gFile);  // a replay that crashes or is killed still leaves what was logged
+}
+
+}  // namespace
+
+bool ServerLog::route(const std::string& path, bool toStderr, std::string* error) {
+    FILE* file = nullptr;
+    if (!path.empty()) {
+        file = fopen(path.c_str(), "w");
+        if (file == nullptr) {
+            *error = "cannot write " + path;
+            return false;
+        }
+    }
+    {
+        std::lock_guard<std::mutex> lock(gLock);
+        if (gFile != nullptr)
+            fclose(gFile);
+        gFile = file;
+        gToStderr = toStderr;
+    }
+    __android_log_set_logger(routedLogger);
+    return true;
+}
+
+void ServerLog::restore() {
+    __android_log_set_logger(__android_log_stderr_logger);
+    std::lock_guard<std::mutex> lock(gLock);
+    if (gFile != nullptr)
+        fclose(gFile);
+    gFile = nullptr;
+    gToStderr = false;
+}
+
+}  // namespace velmora
