@@ -17,7 +17,7 @@
 #include <unordered_map>
 #include <vector>
 
-#include "host/device/NodeSpec.h"
+#include "host/device/NodeKind.h"
 
 namespace velmora {
 

@@ -18,7 +18,7 @@
 #include <string>
 #include <vector>
 
-#include "host/device/NodeSpec.h"
+#include "host/device/NodeKind.h"
 
 namespace velmora {
 

@@ -13,7 +13,7 @@
 
 #include <string>
 
-#include "host/device/NodeSpec.h"
+#include "host/device/NodeKind.h"
 
 namespace velmora {
 

@@ -1,6 +1,6 @@
-// One node of the device: its logical name, where its file is, how requests for it combine, the
-// value a fresh simulated device starts with and what it accepts. Device profiles produce these;
-// the node map, the resolver and the checker read them.
+// How requests for a node combine (NodeKind), and one node of the device (NodeSpec): its logical
+// name, where its file is, the value a fresh simulated device starts with and what it accepts.
+// Device profiles produce these; the node map, the resolver and the checker read them.
 #pragma once
 
 #include <string>
