@@ -1,7 +1,10 @@
 // velmora-replay --fast as a user runs it: the real program in a child process on a generated
 // hour of device use (tools/tracegen, about 120,000 host calls), with 15 % probe events and with
 // none (the floor: no hand-over to the library's probe worker). Each trace is replayed on an
-// idle machine and with one CPU-bound process beside it. Measured per run: wall time from fork
+// idle machine and with one CPU-bound process beside it, as a plain `--fast` replay writes it
+// (the summary); on the idle machine the probe hour once more with the timeline and the event
+// log written too (the server's trace tracks and per-call records, which cost a plain replay
+// nothing). Measured per run: wall time from fork
 // to exit, host calls per second, the child's CPU time (user + system, from wait4) per call and
 // its largest resident set (ru_maxrss). Medians of the repetitions are printed and written as
 // JSON for scripts/bench, which sets them against the targets.
@@ -37,7 +40,7 @@ struct Run {
 
 struct Case {
     std::string load;   // "idle" or "loaded"
-    std::string trace;  // "probes" or "no-probes"
+    std::string trace;  // "probes", "no-probes" or "probes+files"
     std::vector<Run> runs;
 };
 
@@ -61,20 +64,20 @@ long hostCalls(const std::string& outPath) {
     return -1;
 }
 
-bool replayOnce(const std::string& replay, const std::string& trace, Run* run) {
+bool replayOnce(const std::string& replay, const std::string& trace, bool files, Run* run) {
     const std::string out = gScratch + "/replay-stdout.txt";
-    const std::vector<std::string> args = {replay,
-                                           "--fast",
-                                           "--quiet",
-                                           "--config-dir",
-                                           std::string(VELMORA_SOURCE_DIR) + "/examples",
-                                           "--root",
-                                           gScratch + "/device",
-                                           "--timeline",
-                                           gScratch + "/timeline.json",
-                                           "--event-log",
-                                           gScratch + "/events.log",
-                                           trace};
+    std::vector<std::string> args = {replay,
+                                     "--fast",
+                                     "--quiet",
+                                     "--config-dir",
+                                     std::string(VELMORA_SOURCE_DIR) + "/examples",
+                                     "--root",
+                                     gScratch + "/device"};
+    if (files) {
+        args.insert(args.end(), {"--timeline", gScratch + "/timeline.json", "--event-log",
+                                 gScratch + "/events.log"});
+    }
+    args.push_back(trace);
     std::vector<char*> argv;
     for (const std::string& arg : args) {
         argv.push_back(const_cast<char*>(arg.c_str()));
@@ -197,19 +200,22 @@ int main(int argc, char** argv) {
 
     std::vector<Case> cases = {{"idle", "probes", {}},
                                {"idle", "no-probes", {}},
+                               {"idle", "probes+files", {}},
                                {"loaded", "probes", {}},
                                {"loaded", "no-probes", {}}};
+    const size_t blockEnd[] = {3, 5};
     bool ok = true;
     for (size_t block = 0; block < 2 && ok; ++block) {
         const pid_t busy = block == 1 ? startBusyLoop() : -1;
-        // Alternately, so that a change of machine load meets both traces.
+        // Alternately, so that a change of machine load meets every case of the block.
         for (int rep = 0; rep < repetitions && ok; ++rep) {
-            for (size_t c = 2 * block; c < 2 * block + 2 && ok; ++c) {
+            for (size_t c = block == 0 ? 0 : blockEnd[0]; c < blockEnd[block] && ok; ++c) {
                 Run run;
-                ok = replayOnce(replay, cases[c].trace == "probes" ? probes : none, &run);
+                ok = replayOnce(replay, cases[c].trace == "no-probes" ? none : probes,
+                                cases[c].trace == "probes+files", &run);
                 cases[c].runs.push_back(run);
                 printf(
-                    "%-6s %-9s %7ld calls in %6.3f s: %8.0f calls/s, %6.2f us CPU per call, "
+                    "%-6s %-12s %7ld calls in %6.3f s: %8.0f calls/s, %6.2f us CPU per call, "
                     "%6.1f MB resident\n",
                     cases[c].load.c_str(), cases[c].trace.c_str(), run.calls, run.wallS,
                     run.calls / run.wallS, run.cpuS * 1e6 / std::max(1L, run.calls),

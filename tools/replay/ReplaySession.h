@@ -92,6 +92,9 @@ private:
     void echo(const TraceCall& call, const std::string& result);
     std::string commandName(int cmdId) const;
     int writeOutputs();
+    // The timeline file is asked for: only then are the server's tracks, the per-call instants
+    // and the analysis's spans recorded.
+    bool writesTimeline() const { return !mOptions.timelinePath.empty(); }
 
     ReplayOptions mOptions;
     FILE* mOut;
