@@ -46,6 +46,9 @@ struct SpanInsight {
     int64_t beginUs = 0;
     int64_t endUs = 0;
     bool open = false;  // still applied at the end of the trace
+    // The call that applied it, when known, and whether it ended by running out its duration.
+    CallRef call;
+    bool expired = false;
 };
 
 struct StuckWarning {
