@@ -42,6 +42,10 @@ struct CompareRow {
     const char* inB;    // part of first_divergence.b, or of an overriding line
 };
 
+void PrintTo(const CompareRow& row, std::ostream* os) {
+    *os << row.what;
+}
+
 class ComparisonTest : public testing::TestWithParam<CompareRow> {};
 
 TEST_P(ComparisonTest, TellsWhereAndWhyTheRunsPart) {
@@ -107,6 +111,10 @@ struct ConfigPathRow {
     const char* error;  // part of the refusal
 };
 
+void PrintTo(const ConfigPathRow& row, std::ostream* os) {
+    *os << row.what;
+}
+
 class ComparedConfigTest : public testing::TestWithParam<ConfigPathRow> {};
 
 TEST_P(ComparedConfigTest, FindsTheConfiguration) {
@@ -144,7 +152,8 @@ TEST(ComparedConfigTest, LinksALoneFileAndRemovesTheLink) {
         const ComparedConfig config(dir + "/b.xml");
         ASSERT_EQ("", config.error());
         scratch = config.dir();
-        EXPECT_EQ(kConfig, hosttest::readFile(scratch + "/xml/velmora_config_cust.xml"));
+        EXPECT_NE(std::string::npos,
+                  hosttest::readFile(scratch + "/xml/velmora_config_cust.xml").find("cold_launch"));
         EXPECT_EQ(dir + "/b.xml", config.file());
     }
     struct stat st {};

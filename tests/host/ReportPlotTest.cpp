@@ -48,6 +48,10 @@ struct RowsRow {
     const char* rows;
 };
 
+void PrintTo(const RowsRow& row, std::ostream* os) {
+    *os << row.what;
+}
+
 class ReportRowsTest : public testing::TestWithParam<RowsRow> {};
 
 TEST_P(ReportRowsTest, WritesOneRowPerInstant) {
@@ -74,6 +78,10 @@ struct RangeRow {
     std::vector<double> values;
     double lo, hi;
 };
+
+void PrintTo(const RangeRow& row, std::ostream* os) {
+    *os << row.what;
+}
 
 class ReportRangeTest : public testing::TestWithParam<RangeRow> {};
 

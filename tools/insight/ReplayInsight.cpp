@@ -217,8 +217,10 @@ void ReplayInsight::onNodeResolved(const std::string& key, const std::string& va
     track.value = value;
     track.holder = holder;
     // Every change gets a segment, also several in one instant: they match the timeline's
-    // samples one to one.
-    track.segments.push_back({now, value, holder, mInCall ? mCallRef.index : -1});
+    // samples one to one. A change that falls due while the clock moves on to the call's time
+    // (a timer running out on the way) is the timer's, not the call's.
+    const bool byCall = mInCall && now >= mCallRef.us;
+    track.segments.push_back({now, value, holder, byCall ? mCallRef.index : -1});
 }
 
 void ReplayInsight::closeSpanLocked(const std::string& category, const std::string& name,

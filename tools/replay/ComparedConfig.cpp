@@ -155,8 +155,10 @@ std::vector<std::string> ComparedConfig::overridingLines(const std::string& trac
             const int command = call.text == kColdPolicyName        ? kCmdColdStart
                                 : call.text == kWinSwitchPolicyName ? kCmdWinSwitch
                                                                     : -1;
+            const size_t text = call.source.find_first_not_of(" \t");
             if (commands.count(command) != 0)
-                out.push_back(call.file + ":" + std::to_string(call.line) + ": " + call.source +
+                out.push_back(call.file + ":" + std::to_string(call.line) + ": " +
+                              call.source.substr(text == std::string::npos ? 0 : text) +
                               " (the launch policy prescribes the duration of command " +
                               std::to_string(command) + ")");
         }

@@ -4,6 +4,7 @@
 #include <unistd.h>
 
 #include <set>
+#include <vector>
 
 #include "tools/insight/InsightJson.h"
 #include "tools/insight/ReplayComparison.h"
@@ -150,7 +151,12 @@ int ComparisonRun::run() {
 }
 
 std::string ComparisonRun::configFileA() const {
-    for (const auto& dir : mOptions.configDirs) {
+    std::vector<std::string> dirs = mOptions.configDirs;
+    if (dirs.empty()) {  // the session's default: the trace's directory
+        const size_t slash = mOptions.tracePath.find_last_of('/');
+        dirs.push_back(slash == std::string::npos ? "." : mOptions.tracePath.substr(0, slash));
+    }
+    for (const auto& dir : dirs) {
         const std::string file = dir + "/" + ComparedConfig::kConfigFile;
         if (access(file.c_str(), R_OK) == 0)
             return file;
