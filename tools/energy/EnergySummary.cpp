@@ -49,7 +49,7 @@ std::string EnergySummary::text(const std::vector<DomainEnergy>& energy, int64_t
         std::string holders;
         for (size_t i = 0; i < domain.floorHoldersMJ.size() && i < kTopHolders; ++i) {
             char entry[256];
-            snprintf(entry, sizeof(entry), "%s%s %.1f mJ", i == 0 ? "" : ", ",
+            snprintf(entry, sizeof(entry), "%s%s (%.1f mJ)", i == 0 ? "" : ", ",
                      domain.floorHoldersMJ[i].first.c_str(), domain.floorHoldersMJ[i].second);
             holders += entry;
         }
