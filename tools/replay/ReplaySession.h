@@ -82,6 +82,8 @@ public:
 
 private:
     int performCall(const TraceCall& call);
+    // A load line: what the energy model reads, at the time it names.
+    int performLoad(const TraceCall& call);
     int replayFile();
     // Reads the device profile into mProfile once (the example device's without --device).
     int loadProfile();
