@@ -131,13 +131,17 @@ void InsightJson::comparison(const ReplayComparison& comparison, JsonStreamWrite
     }
     nlohmann::json divergence = nullptr;
     if (comparison.diverges()) {
-        divergence = {{"call", callJson(comparison.firstDivergentCall())},
+        divergence = {{"ms", ms(comparison.divergenceUs())},
+                      {"cause", comparison.timedFirst() ? "timed" : "call"},
+                      {"node", comparison.timedFirst() ? comparison.timedDivergence().node() : ""},
+                      {"call", callJson(comparison.firstDivergentCall())},
                       {"a", comparison.divergenceA()},
                       {"b", comparison.divergenceB()}};
     }
     const nlohmann::json members = {{"config_a", comparison.labelA()},
                                     {"config_b", comparison.labelB()},
                                     {"first_divergence", divergence},
+                                    {"overridden_by", comparison.overrides()},
                                     {"nodes", nodes}};
     out.object(members, {{"a", [&] { summary(comparison.a(), out); }},
                          {"b", [&] { summary(comparison.b(), out); }}});

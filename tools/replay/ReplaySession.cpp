@@ -383,6 +383,7 @@ int ReplaySession::replayInteractive() {
 }
 
 void ReplaySession::warnAboutCalls(const TraceSurvey& survey) {
+    warnAboutPlaceholders(survey);
     std::set<int> configured;
     VelmoraParser* parser = mServer->mPlatPtr != nullptr ? mServer->mPlatPtr->mParserPtr : nullptr;
     if (parser == nullptr) {
@@ -416,6 +417,23 @@ void ReplaySession::warnAboutCalls(const TraceSurvey& survey) {
                     guess.empty() ? "" : ("; did you mean '" + guess + "'?").c_str());
         }
     }
+}
+
+void ReplaySession::warnAboutPlaceholders(const TraceSurvey& survey) {
+    for (const auto& placeholder : survey.placeholders()) {
+        const bool probe = placeholder.cmdId == kCmdProbe;
+        fprintf(mErr,
+                "velmora-replay: %s: warning: unedited placeholder from the import, msg=\"%s\": "
+                "%s; fill in %s\n",
+                placeholder.where.c_str(), TraceSurvey::kPlaceholderMsg,
+                probe ? "the probe boosts no thread" : "the memory-latency event fails (status 3)",
+                probe ? "the pid and tid of the thread to probe"
+                      : "the pid and tid of the thread and its ratio_b= and ratio_l=");
+    }
+    const size_t more = survey.placeholderCount() - survey.placeholders().size();
+    if (more > 0)
+        fprintf(mErr, "velmora-replay: %s: warning: %zu more unedited placeholders\n",
+                mOptions.tracePath.c_str(), more);
 }
 
 void ReplaySession::waitForProbeBoosts() {

@@ -92,6 +92,9 @@ private:
     // configuration lacks, launch-policy names the server never asks for; once per command or
     // name, where it is first used.
     void warnAboutCalls(const TraceSurvey& survey);
+    // Warns once per placeholder the importer left unedited (the first few, then how many more),
+    // naming the line and what to fill in.
+    void warnAboutPlaceholders(const TraceSurvey& survey);
     void waitForProbeBoosts();
     // Removes the simulated device root when this session made it.
     void removeOwnedRoot();
