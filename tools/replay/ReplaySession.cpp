@@ -16,6 +16,7 @@
 #include "tools/common/InputFile.h"
 #include "tools/common/Spelling.h"
 #include "tools/energy/EnergyModel.h"
+#include "tools/energy/EnergyPlots.h"
 #include "tools/energy/EnergySummary.h"
 #include "tools/energy/LoadDomains.h"
 #include "tools/insight/HtmlReport.h"
@@ -499,6 +500,13 @@ bool ReplaySession::checkWritable(const std::string& path, std::string* error) {
     return true;
 }
 
+bool ReplaySession::writeReport(std::string* error) const {
+    std::vector<ReportPlot> plots = HtmlReport::plots(mResult);
+    for (auto& plot : EnergyPlots::plots(mResult.energy))
+        plots.push_back(std::move(plot));
+    return HtmlReport::write(mResult, plots, mOptions.reportPath, error);
+}
+
 int ReplaySession::writeOutputs() {
     if (!mOptions.writeFiles)
         return kOk;
@@ -508,8 +516,7 @@ int ReplaySession::writeOutputs() {
          !env.timeline().writeChromeJson(mOptions.timelinePath, &error)) ||
         (!mOptions.summaryJsonPath.empty() &&
          !InsightJson::writeSummary(mResult, mOptions.summaryJsonPath, &error)) ||
-        (!mOptions.reportPath.empty() &&
-         !HtmlReport::write(mResult, mOptions.reportPath, &error))) {
+        (!mOptions.reportPath.empty() && !writeReport(&error))) {
         fprintf(mErr, "velmora-replay: %s\n", error.c_str());
         return kSetupFailed;
     }

@@ -101,6 +101,8 @@ private:
     void echo(const TraceCall& call, const std::string& result);
     std::string commandName(int cmdId) const;
     int writeOutputs();
+    // The HTML report: the node plots, then the energy model's.
+    bool writeReport(std::string* error) const;
 
     ReplayOptions mOptions;
     FILE* mOut;
