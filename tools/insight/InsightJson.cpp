@@ -2,6 +2,8 @@
 
 #include <fstream>
 
+#include "tools/energy/EnergyComparison.h"
+
 namespace velmora {
 
 namespace {
@@ -48,6 +50,27 @@ bool writeFile(const std::string& path, std::string* error,
     return true;
 }
 
+// "energy": {"<id>": {"mJ", "saturated_ms", "limits_mJ", "limits_saturated_ms", "residency":
+// {"<freq>": ms}, "floor_holders": {"<holder>": mJ}}}
+nlohmann::json energyJson(const std::vector<DomainEnergy>& energy) {
+    nlohmann::json out = nlohmann::json::object();
+    for (const auto& domain : energy) {
+        nlohmann::json residency = nlohmann::json::object();
+        for (const auto& entry : domain.residencyUs)
+            residency[std::to_string(entry.first)] = ms(entry.second);
+        nlohmann::json holders = nlohmann::json::object();
+        for (const auto& entry : domain.floorHoldersMJ)
+            holders[entry.first] = entry.second;
+        out[domain.id] = {{"mJ", domain.mJ},
+                          {"saturated_ms", ms(domain.saturatedUs)},
+                          {"limits_mJ", domain.limitsMJ},
+                          {"limits_saturated_ms", ms(domain.limitsSaturatedUs)},
+                          {"residency", residency},
+                          {"floor_holders", holders}};
+    }
+    return out;
+}
+
 }  // namespace
 
 void InsightJson::summary(const InsightResult& result, JsonStreamWriter& out) {
@@ -57,8 +80,10 @@ void InsightJson::summary(const InsightResult& result, JsonStreamWriter& out) {
                             {"message", warning.message},
                             {"call", callJson(warning.call)}});
     }
-    const nlohmann::json members = {
+    nlohmann::json members = {
         {"trace_ms", ms(result.endUs)}, {"calls", result.callCount}, {"warnings", warnings}};
+    if (!result.energy.empty())
+        members["energy"] = energyJson(result.energy);
     auto holders = [&](const NodeInsight& node) {
         out.beginArray();
         for (const auto& segment : node.segments) {
@@ -115,11 +140,26 @@ void InsightJson::comparison(const ReplayComparison& comparison, JsonStreamWrite
                       {"a", comparison.divergenceA()},
                       {"b", comparison.divergenceB()}};
     }
-    const nlohmann::json members = {{"config_a", comparison.labelA()},
-                                    {"config_b", comparison.labelB()},
-                                    {"first_divergence", divergence},
-                                    {"overridden_by", comparison.overrides()},
-                                    {"nodes", nodes}};
+    nlohmann::json members = {{"config_a", comparison.labelA()},
+                              {"config_b", comparison.labelB()},
+                              {"first_divergence", divergence},
+                              {"overridden_by", comparison.overrides()},
+                              {"nodes", nodes}};
+    // Per domain, what B costs against A; both runs replay one trace, so one has a domain when
+    // the other has.
+    if (!comparison.a().energy.empty()) {
+        nlohmann::json energy = nlohmann::json::object();
+        for (const auto& d :
+             EnergyComparison::deltas(comparison.a().energy, comparison.b().energy)) {
+            energy[d.id] = {{"a_mJ", d.aMJ},
+                            {"b_mJ", d.bMJ},
+                            {"delta_mJ", d.bMJ - d.aMJ},
+                            {"a_saturated_ms", ms(d.aSaturatedUs)},
+                            {"b_saturated_ms", ms(d.bSaturatedUs)},
+                            {"delta_saturated_ms", ms(d.bSaturatedUs - d.aSaturatedUs)}};
+        }
+        members["energy"] = energy;
+    }
     out.object(members, {{"a", [&] { summary(comparison.a(), out); }},
                          {"b", [&] { summary(comparison.b(), out); }}});
 }

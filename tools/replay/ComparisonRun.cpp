@@ -6,6 +6,7 @@
 #include <set>
 #include <vector>
 
+#include "tools/energy/EnergyComparison.h"
 #include "tools/insight/InsightJson.h"
 #include "tools/insight/ReplayComparison.h"
 #include "tools/replay/ComparedConfig.h"
@@ -135,7 +136,12 @@ int ComparisonRun::run() {
         if (!differing.empty())
             comparison.setOverrides(ComparedConfig::overridingLines(mOptions.tracePath, differing));
     }
-    fprintf(mOut, "%s", comparison.text().c_str());
+    // The cost first: what the change does to the energy and the starved time per domain.
+    fprintf(mOut, "%s",
+            (comparison.headline() +
+             EnergyComparison::text(comparison.a().energy, comparison.b().energy) +
+             comparison.divergenceText() + comparison.nodesText())
+                .c_str());
     int status = ReplaySession::kOk;
     if (!mOptions.summaryJsonPath.empty()) {
         std::string why;

@@ -15,6 +15,10 @@
 #include "server/VelmoraServer.h"
 #include "tools/common/InputFile.h"
 #include "tools/common/Spelling.h"
+#include "tools/energy/EnergyModel.h"
+#include "tools/energy/EnergyPlots.h"
+#include "tools/energy/EnergySummary.h"
+#include "tools/energy/LoadDomains.h"
 #include "tools/insight/HtmlReport.h"
 #include "tools/insight/InsightJson.h"
 #include "tools/insight/InsightSummary.h"
@@ -74,14 +78,10 @@ int ReplaySession::setUp() {
         env.clock().setPaced(mOptions.speed);
     }
     std::string error;
-    if (!mOptions.devicePath.empty()) {
-        DeviceProfile profile;
-        if (profile.load(mOptions.devicePath, &error) != 0) {
-            fprintf(mErr, "velmora-replay: %s\n", error.c_str());
-            return kBadInput;
-        }
-        env.nodeMap().useProfile(profile);
-    }
+    if (loadProfile() != kOk)
+        return kBadInput;
+    if (!mOptions.devicePath.empty())
+        env.nodeMap().useProfile(mProfile);
     if (!mOptions.nodeMapPath.empty() && env.nodeMap().load(mOptions.nodeMapPath, &error) != 0) {
         fprintf(mErr, "velmora-replay: %s\n", error.c_str());
         return kBadInput;
@@ -143,6 +143,20 @@ int ReplaySession::setUp() {
     return kOk;
 }
 
+int ReplaySession::loadProfile() {
+    if (mProfileLoaded)
+        return kOk;
+    std::string error;
+    if (mOptions.devicePath.empty()) {
+        mProfile = DeviceProfile::builtIn();
+    } else if (mProfile.load(mOptions.devicePath, &error) != 0) {
+        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+        return kBadInput;
+    }
+    mProfileLoaded = true;
+    return kOk;
+}
+
 void ReplaySession::echo(const TraceCall& call, const std::string& result) {
     if (mOptions.quiet)
         return;
@@ -170,6 +184,8 @@ std::string ReplaySession::commandName(int cmdId) const {
 }
 
 int ReplaySession::perform(const TraceCall& call) {
+    if (call.kind == TraceCall::Kind::Load)
+        return performLoad(call);
     CallRecord record;
     record.kind = call.kind == TraceCall::Kind::Event       ? CallRecord::Kind::Event
                   : call.kind == TraceCall::Kind::SetConfig ? CallRecord::Kind::SetConfig
@@ -194,6 +210,28 @@ int ReplaySession::perform(const TraceCall& call) {
     if (mInsight != nullptr)
         mInsight->endCall(status);
     return status;
+}
+
+int ReplaySession::performLoad(const TraceCall& call) {
+    // Not a host call: the server never sees it and the analysis need not. A load stamped at or
+    // before the time reached holds from there, without the hand-over to the probe worker that
+    // moving the clock costs; one ahead of it moves the clock like any "@".
+    HostClock& clock = HostEnvironment::get().clock();
+    if (call.atMs >= 0 && call.atMs < clock.nowMs()) {
+        fprintf(mErr,
+                "velmora-replay: %s:%d: warning: @%lld is before the time already reached "
+                "(%lld ms); the load holds from %lld ms\n",
+                call.file.c_str(), call.line, static_cast<long long>(call.atMs),
+                static_cast<long long>(clock.nowMs()), static_cast<long long>(clock.nowMs()));
+    }
+    if (call.atMs > clock.nowMs())
+        clock.advanceTo(call.atMs);
+    if (clock.interrupted())
+        return 0;
+    for (const auto& share : call.loads)
+        mLoads.set(clock.nowUs(), share.domain, share.u);
+    echo(call, "ok");
+    return 0;
 }
 
 int ReplaySession::performCall(const TraceCall& call) {
@@ -223,6 +261,8 @@ int ReplaySession::performCall(const TraceCall& call) {
             env.launchPolicies().set(call.text, call.id);
             echo(call, "ok");
             return 0;
+        case TraceCall::Kind::Load:
+            return performLoad(call);
         case TraceCall::Kind::Event:
             status = mServer->velmoraEvent(call.id, call.hasMsg ? call.text.c_str() : nullptr,
                                            static_cast<unsigned int>(call.payload.size()),
@@ -272,7 +312,11 @@ int ReplaySession::replayFile() {
             return kBadInput;
         }
     }
+    if (loadProfile() != kOk)
+        return kBadInput;
+    const LoadDomains domains(mProfile);
     TraceSurvey survey;
+    survey.checkLoadsWith(&domains);
     const int errors = survey.read(mOptions.tracePath, [this](const std::string& message) {
         fprintf(mErr, "velmora-replay: %s\n", message.c_str());
     });
@@ -330,7 +374,8 @@ int ReplaySession::replayInteractive() {
         }
         std::vector<TraceCall> calls;
         std::string error;
-        if (TraceParser::parseLine(line, "<stdin>", ++lineNo, &calls, &error) != 0) {
+        if (TraceParser::parseLine(line, "<stdin>", ++lineNo, &calls, &error) != 0 ||
+            (!calls.empty() && !LoadDomains(mProfile).check(calls[0], &error))) {
             fprintf(mErr, "velmora-replay: %s\n", error.c_str());
             result = kBadInput;  // keep going: a typo should not end the session
             continue;
@@ -432,6 +477,7 @@ void ReplaySession::finishInsight() {
     if (mInsight == nullptr)
         return;
     mResult = mInsight->finish();
+    mResult.energy = EnergyModel::run(mProfile, mResult, mLoads);
     if (auto* plat = mServer != nullptr ? dynamic_cast<HostPlatform*>(mServer->mPlatPtr) : nullptr)
         plat->executor()->setObserver(nullptr);
     mInsight.reset();
@@ -459,6 +505,13 @@ bool ReplaySession::checkWritable(const std::string& path, std::string* error) {
     return true;
 }
 
+bool ReplaySession::writeReport(std::string* error) const {
+    std::vector<ReportPlot> plots = HtmlReport::plots(mResult);
+    for (auto& plot : EnergyPlots::plots(mResult.energy))
+        plots.push_back(std::move(plot));
+    return HtmlReport::write(mResult, plots, mOptions.reportPath, error);
+}
+
 int ReplaySession::writeOutputs() {
     if (!mOptions.writeFiles)
         return kOk;
@@ -468,8 +521,7 @@ int ReplaySession::writeOutputs() {
          !env.timeline().writeChromeJson(mOptions.timelinePath, &error)) ||
         (!mOptions.summaryJsonPath.empty() &&
          !InsightJson::writeSummary(mResult, mOptions.summaryJsonPath, &error)) ||
-        (!mOptions.reportPath.empty() &&
-         !HtmlReport::write(mResult, mOptions.reportPath, &error))) {
+        (!mOptions.reportPath.empty() && !writeReport(&error))) {
         fprintf(mErr, "velmora-replay: %s\n", error.c_str());
         return kSetupFailed;
     }
@@ -543,6 +595,7 @@ int ReplaySession::run() {
     if (!mResult.nodes.empty()) {
         fputs(("\n" + InsightSummary::residency(mResult)).c_str(), mOut);
         fputs(("\n" + InsightSummary::warnings(mResult)).c_str(), mOut);
+        fputs(("\n" + EnergySummary::text(mResult.energy, mResult.endUs)).c_str(), mOut);
     }
     const int written = writeOutputs();
     if (mOptions.keepRoot && mOptions.deviceRoot.empty())

@@ -15,6 +15,8 @@
 #include <utility>
 #include <vector>
 
+#include "host/device/profile/DeviceProfile.h"
+#include "tools/energy/LoadTimeline.h"
 #include "tools/insight/InsightResult.h"
 #include "tools/replay/TraceParser.h"
 
@@ -80,7 +82,11 @@ public:
 
 private:
     int performCall(const TraceCall& call);
+    // A load line: what the energy model reads, at the time it names.
+    int performLoad(const TraceCall& call);
     int replayFile();
+    // Reads the device profile into mProfile once (the example device's without --device).
+    int loadProfile();
     int replayInteractive();
     // Warns (on `err`) about calls that are valid but surely not meant: events of commands the
     // configuration lacks, launch-policy names the server never asks for; once per command or
@@ -98,6 +104,8 @@ private:
     // The timeline file is asked for: only then are the server's tracks, the per-call instants
     // and the analysis's spans recorded.
     bool writesTimeline() const { return !mOptions.timelinePath.empty(); }
+    // The HTML report: the node plots, then the energy model's.
+    bool writeReport(std::string* error) const;
 
     ReplayOptions mOptions;
     FILE* mOut;
@@ -109,6 +117,9 @@ private:
     std::unique_ptr<VelmoraServer> mServer;
     std::unique_ptr<ReplayInsight> mInsight;  // watches the executor while the server runs
     InsightResult mResult;
+    DeviceProfile mProfile;  // of the simulated device, for its energy tables
+    bool mProfileLoaded = false;
+    LoadTimeline mLoads;                        // what the trace's load lines said
     mutable std::map<int, std::string> mNames;  // commandName() cache, dropped on reload
     int mCalls = 0;
     int mFailed = 0;  // host calls with a nonzero status

@@ -1,10 +1,11 @@
 // The first pass over a trace before it is replayed: every bad line is reported, and of the good
 // lines only what the warnings about calls that are surely not meant need is kept: the distinct
 // event command ids and launch-policy names, each with where it is first used and how many calls
-// use it; and the placeholders velmora-import-logcat left for the user to fill in (a probe or a
+// use it; the placeholders velmora-import-logcat left for the user to fill in (a probe or a
 // memory-latency event whose message the log lacked, msg="pid=0|tid=0"), which a replay would
-// otherwise run without a word: the probe boosts nothing, the memory-latency event fails. It
-// holds no call, so a long trace costs what it has distinct, not what it has lines.
+// otherwise run without a word: the probe boosts nothing, the memory-latency event fails. Load
+// lines are checked against the device's energy tables. It holds no call, so a long trace costs
+// what it has distinct, not what it has lines.
 #pragma once
 
 #include <functional>
@@ -15,6 +16,8 @@
 #include "tools/replay/TraceParser.h"
 
 namespace velmora {
+
+class LoadDomains;
 
 class TraceSurvey {
 public:
@@ -39,6 +42,8 @@ public:
     // saying the trace cannot be opened). The number of such messages.
     int read(const std::string& path, const ErrorSink& onError);
     void add(const TraceCall& call);
+    // From now on a load line naming a domain without an energy table is a bad line too.
+    void checkLoadsWith(const LoadDomains* domains) { mLoadDomains = domains; }
 
     // Event command ids and policy names, in order of first use.
     const std::vector<Use>& uses() const { return mUses; }
@@ -47,6 +52,7 @@ public:
     size_t placeholderCount() const { return mPlaceholderCount; }
 
 private:
+    const LoadDomains* mLoadDomains = nullptr;
     std::vector<Use> mUses;
     std::vector<Placeholder> mPlaceholders;
     size_t mPlaceholderCount = 0;

@@ -26,6 +26,8 @@ void usage(FILE* to) {
         "  --odd-share F         share of calls the server refuses (default 0.005)\n"
         "  --margin-ms MS        keep every call this far from the deadlines the generator\n"
         "                        foresees, and end past the last (default 0: no margin)\n"
+        "  --load-every-ms MS    a load line for the clusters and the GPU this often, at the\n"
+        "                        time reached (default 0: none)\n"
         "  -o FILE               write the trace there (default: standard output)\n"
         "  --version             print the version and exit\n"
         "A summary goes to standard error. Exit status: 0 written, 1 the trace could not be\n"
@@ -113,6 +115,8 @@ int main(int argc, char** argv) {
             options.oddPpm = ppm(v);
         } else if (arg == "--margin-ms") {
             options.marginMs = static_cast<int64_t>(v);
+        } else if (arg == "--load-every-ms") {
+            options.loadEveryMs = static_cast<int64_t>(v);
         } else {
             fprintf(stderr, "velmora-gen-trace: unknown option %s\n", arg.c_str());
             usage(stderr);
