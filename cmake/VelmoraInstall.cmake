@@ -32,11 +32,19 @@ function(velmora_install_rules)
             LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
             ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR}
             RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
-    foreach(tool velmora-replay velmora-lint velmora-import-logcat)
+    foreach(tool velmora-replay velmora-lint velmora-import-logcat velmora-synth)
         if(TARGET ${tool})
             install(TARGETS ${tool} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
         endif()
     endforeach()
+    # velmora-fleet runs the velmora-replay beside it; its Python package goes under share/.
+    if(TARGET velmora-replay)
+        install(PROGRAMS "${PROJECT_BINARY_DIR}/tools/velmora-fleet"
+                DESTINATION ${CMAKE_INSTALL_BINDIR})
+        install(DIRECTORY "${PROJECT_BINARY_DIR}/tools/velmora_fleet"
+                DESTINATION "${VELMORA_INSTALL_DATADIR}/python"
+                FILES_MATCHING PATTERN "*.py" PATTERN "__pycache__" EXCLUDE)
+    endif()
     install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" "${PROJECT_SOURCE_DIR}/docs"
             DESTINATION "${VELMORA_INSTALL_DATADIR}")
     foreach(dir IN LISTS VELMORA_PUBLIC_HEADER_DIRS)

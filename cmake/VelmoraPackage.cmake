@@ -14,6 +14,7 @@ set(CPACK_PACKAGE_DESCRIPTION
     "libvelmora, the performance server of a mobile device's vendor layer, built for a Linux host
 with its host platform layer (a simulated device), velmora-replay (event trace replay),
 velmora-lint (configuration checker), velmora-import-logcat (device logs into traces),
+velmora-fleet (many sessions under two configurations), velmora-synth (generated sessions),
 headers, pkg-config and CMake files, the example
 configuration and traces, and the documentation.")
 set(CPACK_PACKAGING_INSTALL_PREFIX "/usr")
@@ -21,6 +22,9 @@ set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 set(CPACK_DEBIAN_PACKAGE_SECTION "devel")
 set(CPACK_STRIP_FILES ON)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON)
-set(CPACK_DEBIAN_PACKAGE_DEPENDS "android-libutils-dev, android-liblog-dev, android-libcutils-dev")
+# python3 for velmora-fleet; python3-distributed only for its --scheduler, so only suggested.
+set(CPACK_DEBIAN_PACKAGE_DEPENDS
+    "android-libutils-dev, android-liblog-dev, android-libcutils-dev, python3")
+set(CPACK_DEBIAN_PACKAGE_SUGGESTS "python3-distributed")
 set(CPACK_GENERATOR "DEB")
 include(CPack)

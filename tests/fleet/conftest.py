@@ -1,0 +1,57 @@
+"""Where the tools under test are: the build tree's tools/ (VELMORA_TOOLS) and the source tree
+(VELMORA_SOURCE_DIR), both set by the CTest entries (tests/fleet/CMakeLists.txt)."""
+import os
+import subprocess
+import tempfile
+
+import pytest
+
+TOOLS = os.environ.get("VELMORA_TOOLS", "")
+SOURCE = os.environ.get("VELMORA_SOURCE_DIR",
+                        os.path.dirname(os.path.dirname(os.path.dirname(__file__))))
+EXAMPLES = os.path.join(SOURCE, "examples")
+# A what-if configuration: the game scene asks for higher big-cluster and GPU floors.
+GAME_A = "<big_min>1804800</big_min><gpu_min>500000000</gpu_min></act>"
+GAME_B = "<big_min>2419200</big_min><gpu_min>700000000</gpu_min></act>"
+
+
+def tool(name):
+    path = os.path.join(TOOLS, name)
+    if not os.access(path, os.X_OK):
+        pytest.fail("%s not built (VELMORA_TOOLS=%s)" % (name, TOOLS))
+    return path
+
+
+def run(args, **kwargs):
+    return subprocess.run(args, capture_output=True, text=True, timeout=300, **kwargs)
+
+
+def config_b(directory):
+    """A copy of the example configuration with the game scene's floors raised."""
+    text = open(os.path.join(EXAMPLES, "xml", "velmora_config_cust.xml")).read()
+    assert GAME_A in text
+    os.makedirs(os.path.join(directory, "xml"), exist_ok=True)
+    with open(os.path.join(directory, "xml", "velmora_config_cust.xml"), "w") as out:
+        out.write(text.replace(GAME_A, GAME_B))
+    return str(directory)
+
+
+def replay_takes_load():
+    """True when this velmora-replay reads load lines (the energy model)."""
+    with tempfile.TemporaryDirectory() as scratch:
+        trace = os.path.join(scratch, "load.trace")
+        with open(trace, "w") as out:
+            out.write("@0 load cpu.big=0.5\n@10 event 20225 0\n")
+        return run([tool("velmora-replay"), "--fast", "--quiet", "--config-dir", EXAMPLES,
+                    trace]).returncode == 0
+
+
+def synth(directory, count, duration_ms, seed=1, load=None):
+    """velmora-synth sessions in `directory`; load lines when the replay reads them."""
+    if load is None:
+        load = replay_takes_load()
+    args = [tool("velmora-synth"), "--seed", str(seed), "--count", str(count),
+            "--duration-ms", str(duration_ms), "-o", str(directory)]
+    subprocess.run(args + (["--load"] if load else []), check=True, capture_output=True)
+    return sorted(os.path.join(str(directory), f) for f in os.listdir(str(directory))
+                  if f.startswith("session-"))
