@@ -48,6 +48,27 @@ bool writeFile(const std::string& path, std::string* error,
     return true;
 }
 
+// "energy": {"<id>": {"mJ", "saturated_ms", "limits_mJ", "limits_saturated_ms", "residency":
+// {"<freq>": ms}, "floor_holders": {"<holder>": mJ}}}
+nlohmann::json energyJson(const std::vector<DomainEnergy>& energy) {
+    nlohmann::json out = nlohmann::json::object();
+    for (const auto& domain : energy) {
+        nlohmann::json residency = nlohmann::json::object();
+        for (const auto& entry : domain.residencyUs)
+            residency[std::to_string(entry.first)] = ms(entry.second);
+        nlohmann::json holders = nlohmann::json::object();
+        for (const auto& entry : domain.floorHoldersMJ)
+            holders[entry.first] = entry.second;
+        out[domain.id] = {{"mJ", domain.mJ},
+                          {"saturated_ms", ms(domain.saturatedUs)},
+                          {"limits_mJ", domain.limitsMJ},
+                          {"limits_saturated_ms", ms(domain.limitsSaturatedUs)},
+                          {"residency", residency},
+                          {"floor_holders", holders}};
+    }
+    return out;
+}
+
 }  // namespace
 
 void InsightJson::summary(const InsightResult& result, JsonStreamWriter& out) {
@@ -57,8 +78,10 @@ void InsightJson::summary(const InsightResult& result, JsonStreamWriter& out) {
                             {"message", warning.message},
                             {"call", callJson(warning.call)}});
     }
-    const nlohmann::json members = {
+    nlohmann::json members = {
         {"trace_ms", ms(result.endUs)}, {"calls", result.callCount}, {"warnings", warnings}};
+    if (!result.energy.empty())
+        members["energy"] = energyJson(result.energy);
     auto holders = [&](const NodeInsight& node) {
         out.beginArray();
         for (const auto& segment : node.segments) {

@@ -10,6 +10,8 @@
 #include <utility>
 #include <vector>
 
+#include "tools/energy/DomainEnergy.h"
+
 namespace velmora {
 
 // The host call that caused something: where it is in the trace and how it reads.
@@ -61,6 +63,8 @@ struct InsightResult {
     std::vector<SpanInsight> spans;
     std::vector<StuckWarning> warnings;
     int callCount = 0;  // calls replayed
+    // Per domain with an energy table, when the trace had load lines (EnergyModel); else empty.
+    std::vector<DomainEnergy> energy;
     // Only when the analysis was asked to keep them (the first run of a comparison): per call its
     // status, and a digest of its status and of every node change it caused.
     std::vector<int> callStatus;

@@ -15,6 +15,9 @@
 #include "server/VelmoraServer.h"
 #include "tools/common/InputFile.h"
 #include "tools/common/Spelling.h"
+#include "tools/energy/EnergyModel.h"
+#include "tools/energy/EnergySummary.h"
+#include "tools/energy/LoadDomains.h"
 #include "tools/insight/HtmlReport.h"
 #include "tools/insight/InsightJson.h"
 #include "tools/insight/InsightSummary.h"
@@ -72,14 +75,10 @@ int ReplaySession::setUp() {
         env.clock().setPaced(mOptions.speed);
     }
     std::string error;
-    if (!mOptions.devicePath.empty()) {
-        DeviceProfile profile;
-        if (profile.load(mOptions.devicePath, &error) != 0) {
-            fprintf(mErr, "velmora-replay: %s\n", error.c_str());
-            return kBadInput;
-        }
-        env.nodeMap().useProfile(profile);
-    }
+    if (loadProfile() != kOk)
+        return kBadInput;
+    if (!mOptions.devicePath.empty())
+        env.nodeMap().useProfile(mProfile);
     if (!mOptions.nodeMapPath.empty() && env.nodeMap().load(mOptions.nodeMapPath, &error) != 0) {
         fprintf(mErr, "velmora-replay: %s\n", error.c_str());
         return kBadInput;
@@ -138,6 +137,20 @@ int ReplaySession::setUp() {
         mSameCpu.reset();
         return kSetupFailed;
     }
+    return kOk;
+}
+
+int ReplaySession::loadProfile() {
+    if (mProfileLoaded)
+        return kOk;
+    std::string error;
+    if (mOptions.devicePath.empty()) {
+        mProfile = DeviceProfile::builtIn();
+    } else if (mProfile.load(mOptions.devicePath, &error) != 0) {
+        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
+        return kBadInput;
+    }
+    mProfileLoaded = true;
     return kOk;
 }
 
@@ -221,6 +234,11 @@ int ReplaySession::performCall(const TraceCall& call) {
             env.launchPolicies().set(call.text, call.id);
             echo(call, "ok");
             return 0;
+        case TraceCall::Kind::Load:
+            for (const auto& share : call.loads)
+                mLoads.set(env.clock().nowUs(), share.domain, share.u);
+            echo(call, "ok");
+            return 0;
         case TraceCall::Kind::Event:
             status = mServer->velmoraEvent(call.id, call.hasMsg ? call.text.c_str() : nullptr,
                                            static_cast<unsigned int>(call.payload.size()),
@@ -269,7 +287,11 @@ int ReplaySession::replayFile() {
             return kBadInput;
         }
     }
+    if (loadProfile() != kOk)
+        return kBadInput;
+    const LoadDomains domains(mProfile);
     TraceSurvey survey;
+    survey.checkLoadsWith(&domains);
     const int errors = survey.read(mOptions.tracePath, [this](const std::string& message) {
         fprintf(mErr, "velmora-replay: %s\n", message.c_str());
     });
@@ -327,7 +349,8 @@ int ReplaySession::replayInteractive() {
         }
         std::vector<TraceCall> calls;
         std::string error;
-        if (TraceParser::parseLine(line, "<stdin>", ++lineNo, &calls, &error) != 0) {
+        if (TraceParser::parseLine(line, "<stdin>", ++lineNo, &calls, &error) != 0 ||
+            (!calls.empty() && !LoadDomains(mProfile).check(calls[0], &error))) {
             fprintf(mErr, "velmora-replay: %s\n", error.c_str());
             result = kBadInput;  // keep going: a typo should not end the session
             continue;
@@ -411,6 +434,7 @@ void ReplaySession::finishInsight() {
     if (mInsight == nullptr)
         return;
     mResult = mInsight->finish();
+    mResult.energy = EnergyModel::run(mProfile, mResult, mLoads);
     if (auto* plat = mServer != nullptr ? dynamic_cast<HostPlatform*>(mServer->mPlatPtr) : nullptr)
         plat->executor()->setObserver(nullptr);
     mInsight.reset();
@@ -520,6 +544,7 @@ int ReplaySession::run() {
     if (!mResult.nodes.empty()) {
         fputs(("\n" + InsightSummary::residency(mResult)).c_str(), mOut);
         fputs(("\n" + InsightSummary::warnings(mResult)).c_str(), mOut);
+        fputs(("\n" + EnergySummary::text(mResult.energy, mResult.endUs)).c_str(), mOut);
     }
     const int written = writeOutputs();
     if (mOptions.keepRoot && mOptions.deviceRoot.empty())

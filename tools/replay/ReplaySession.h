@@ -15,6 +15,8 @@
 #include <utility>
 #include <vector>
 
+#include "host/device/profile/DeviceProfile.h"
+#include "tools/energy/LoadTimeline.h"
 #include "tools/insight/InsightResult.h"
 #include "tools/replay/TraceParser.h"
 
@@ -81,6 +83,8 @@ public:
 private:
     int performCall(const TraceCall& call);
     int replayFile();
+    // Reads the device profile into mProfile once (the example device's without --device).
+    int loadProfile();
     int replayInteractive();
     // Warns (on `err`) about calls that are valid but surely not meant: events of commands the
     // configuration lacks, launch-policy names the server never asks for; once per command or
@@ -103,6 +107,9 @@ private:
     std::unique_ptr<VelmoraServer> mServer;
     std::unique_ptr<ReplayInsight> mInsight;  // watches the executor while the server runs
     InsightResult mResult;
+    DeviceProfile mProfile;  // of the simulated device, for its energy tables
+    bool mProfileLoaded = false;
+    LoadTimeline mLoads;                        // what the trace's load lines said
     mutable std::map<int, std::string> mNames;  // commandName() cache, dropped on reload
     int mCalls = 0;
     int mFailed = 0;  // host calls with a nonzero status

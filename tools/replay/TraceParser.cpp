@@ -15,7 +15,7 @@ namespace velmora {
 namespace {
 
 const std::vector<std::string> kCalls = {"sleep",     "event", "reload", "setconfig",
-                                         "getconfig", "dump",  "policy"};
+                                         "getconfig", "dump",  "policy", "load"};
 
 // The words of one line, kept from line to line so that parsing a long trace allocates nothing
 // once they have grown: the characters of every word (quotes removed) one after the other, and
@@ -125,6 +125,31 @@ bool parseNumber(std::string_view text, int64_t min, int64_t max, int64_t* value
     return true;
 }
 
+// A load as written: digits with at most one decimal point ("0.35", "1", ".5", "1.0"). No sign,
+// exponent, hexadecimal, inf or nan: a load is a share, and strtod alone takes all of those.
+bool parseShare(std::string_view text, double* value) {
+    if (text.empty() || text.size() > 32)
+        return false;
+    bool digit = false;
+    bool point = false;
+    for (char c : text) {
+        if (c >= '0' && c <= '9') {
+            digit = true;
+        } else if (c == '.' && !point) {
+            point = true;
+        } else {
+            return false;
+        }
+    }
+    if (!digit)
+        return false;
+    char buf[40];
+    memcpy(buf, text.data(), text.size());
+    buf[text.size()] = '\0';
+    *value = strtod(buf, nullptr);
+    return true;
+}
+
 class LineParser {
 public:
     LineParser(const std::string& file, int lineNo, std::string* error)
@@ -169,6 +194,7 @@ void reset(TraceCall* call, const std::string& file, int lineNo) {
     call->text.clear();
     call->tags.clear();
     call->values.clear();
+    call->loads.clear();
     call->source.clear();
 }
 
@@ -291,6 +317,32 @@ int TraceParser::parseInto(const std::string& line, const std::string& file, int
         if (!argc(2, 2) || !p.intArg(args[1], "policy duration", &call.id))
             return -1;
         call.text.assign(args[0]);
+    } else if (verb == "load") {
+        call.kind = TraceCall::Kind::Load;
+        if (!argc(1, TraceParser::kMaxLoads))
+            return -1;
+        for (size_t k = 0; k < argCount; ++k) {
+            const size_t eq = args[k].find('=');
+            if (eq == std::string_view::npos || eq == 0) {
+                p.fail("expected <domain>=<load>, got '" + std::string(args[k]) + "'");
+                return -1;
+            }
+            LoadShare share;
+            share.domain.assign(args[k].substr(0, eq));
+            const std::string_view value = args[k].substr(eq + 1);
+            if (!parseShare(value, &share.u) || share.u > 1) {
+                p.fail("load '" + std::string(value) + "' of " + share.domain +
+                       " is not a number in [0, 1]");
+                return -1;
+            }
+            for (const auto& earlier : call.loads) {
+                if (earlier.domain == share.domain) {
+                    p.fail("load line names " + share.domain + " twice");
+                    return -1;
+                }
+            }
+            call.loads.push_back(std::move(share));
+        }
     } else {
         const std::string guess = Spelling::closest(std::string(verb), kCalls);
         p.fail("unknown call '" + std::string(verb) + "'" +

@@ -10,13 +10,15 @@
 //     getconfig <tag> [<tag>...]
 //     dump <option>                   --help --logon --logoff --freqlist --easgrouplist
 //     policy <name> <duration>        launch-policy answer (cold, winswitch); -1 clears it
+//     load <domain>=<u> [...]         the load of performance domains from now on, u in [0, 1]
 //
 // An event takes up to 63 payload ints, a request up to kMaxTags pairs and a query up to kMaxTags
 // tags (velmora-import-logcat writes a longer request of a device's log as a note).
 // Numbers are decimal or 0x hexadecimal, with an optional minus sign; times (the "@" stamp and
 // sleep) are not negative. Errors name the file and line: "trace.txt:12: malformed number 'x1'
 // for payload"; an unknown call name gets a did-you-mean ("unknown call 'evnt'; did you mean
-// 'event'?").
+// 'event'?"). Whether a load line's domains have energy tables is the device profile's
+// business (LoadDomains).
 #pragma once
 
 #include <cstdint>
@@ -25,26 +27,36 @@
 
 namespace velmora {
 
+// One domain's share of a `load` line: its average utilisation relative to the capacity of its
+// top frequency.
+struct LoadShare {
+    std::string domain;  // a <frequencies> id of the device profile, e.g. "cpu.big"
+    double u = 0;        // 0..1
+};
+
 struct TraceCall {
-    enum class Kind { Stamp, Sleep, Event, Reload, SetConfig, GetConfig, Dump, Policy };
+    enum class Kind { Stamp, Sleep, Event, Reload, SetConfig, GetConfig, Dump, Policy, Load };
 
     Kind kind = Kind::Stamp;
     std::string file;
     int line = 0;
-    int64_t atMs = -1;         // "@<ms>" prefix, -1 when absent
-    int64_t sleepMs = 0;       // sleep
-    int id = 0;                // event: cmdId; setconfig: clientId; policy: duration
-    std::vector<int> payload;  // event
-    bool hasMsg = false;       // event: msg= given (null message otherwise)
-    std::string text;          // event: msg; dump: option; policy: name
-    std::vector<int> tags;     // setconfig, getconfig
-    std::vector<int> values;   // setconfig
-    std::string source;        // the line as written, for the echo
+    int64_t atMs = -1;             // "@<ms>" prefix, -1 when absent
+    int64_t sleepMs = 0;           // sleep
+    int id = 0;                    // event: cmdId; setconfig: clientId; policy: duration
+    std::vector<int> payload;      // event
+    bool hasMsg = false;           // event: msg= given (null message otherwise)
+    std::string text;              // event: msg; dump: option; policy: name
+    std::vector<int> tags;         // setconfig, getconfig
+    std::vector<int> values;       // setconfig
+    std::vector<LoadShare> loads;  // load
+    std::string source;            // the line as written, for the echo
 };
 
 class TraceParser {
 public:
     static constexpr int kMaxTags = 1024;
+    // The most domains one load line names.
+    static constexpr int kMaxLoads = 64;
 
     // Parses one line; appends a call unless the line is blank or a comment. 0, or -1 with
     // `error` naming file:line.

@@ -1,5 +1,6 @@
 #include "tools/replay/TraceSurvey.h"
 
+#include "tools/energy/LoadDomains.h"
 #include "tools/replay/TraceReader.h"
 
 namespace velmora {
@@ -14,7 +15,8 @@ int TraceSurvey::read(const std::string& path, const ErrorSink& onError) {
     TraceCall call;
     std::string error;
     for (TraceReader::Step step; (step = reader.next(&call, &error)) != TraceReader::Step::End;) {
-        if (step == TraceReader::Step::BadLine) {
+        if (step == TraceReader::Step::BadLine ||
+            (mLoadDomains != nullptr && !mLoadDomains->check(call, &error))) {
             onError(error);
             ++errors;
         } else {

@@ -1,7 +1,8 @@
 // The first pass over a trace before it is replayed: every bad line is reported, and of the good
 // lines only what the warnings about calls that are surely not meant need is kept: the distinct
 // event command ids and launch-policy names, each with where it is first used and how many calls
-// use it. It holds no call, so a long trace costs what it has distinct, not what it has lines.
+// use it; load lines are checked against the device's energy tables. It holds no call, so a long
+// trace costs what it has distinct, not what it has lines.
 #pragma once
 
 #include <functional>
@@ -12,6 +13,8 @@
 #include "tools/replay/TraceParser.h"
 
 namespace velmora {
+
+class LoadDomains;
 
 class TraceSurvey {
 public:
@@ -28,11 +31,14 @@ public:
     // saying the trace cannot be opened). The number of such messages.
     int read(const std::string& path, const ErrorSink& onError);
     void add(const TraceCall& call);
+    // From now on a load line naming a domain without an energy table is a bad line too.
+    void checkLoadsWith(const LoadDomains* domains) { mLoadDomains = domains; }
 
     // Event command ids and policy names, in order of first use.
     const std::vector<Use>& uses() const { return mUses; }
 
 private:
+    const LoadDomains* mLoadDomains = nullptr;
     std::vector<Use> mUses;
     std::map<int, size_t> mEvents;            // cmdId -> index in mUses
     std::map<std::string, size_t> mPolicies;  // name -> index in mUses

@@ -9,6 +9,7 @@
 #include <map>
 #include <sstream>
 
+#include "host/device/profile/EnergyTableReader.h"
 #include "host/device/profile/XmlErrorText.h"
 
 namespace velmora {
@@ -100,6 +101,11 @@ public:
                 const char* unit = e->Attribute("unit");
                 rule.unit = unit != nullptr ? unit : "";
                 mTables[what + ":" + id] = rule;
+                if (what == "frequencies") {
+                    if (mSteps.count(id) == 0)
+                        mDomains.push_back(id);
+                    mSteps[id] = rule.steps;
+                }
             } else if (what == "levels") {
                 if (!e->Attribute("min") || !e->Attribute("max") ||
                     !toNumber(e->Attribute("min"), &mLevels.min) ||
@@ -109,10 +115,10 @@ public:
                 }
                 mLevels.type = ValueRule::Type::kRange;
                 mLevels.table = "levels";
-            } else if (what != "node") {
+            } else if (what != "node" && what != "energy") {
                 return fail(e->GetLineNum(), "unknown element <" + what +
                                                  "> (expected <frequencies>, <governors>, "
-                                                 "<levels> or <node>)");
+                                                 "<levels>, <energy> or <node>)");
             }
         }
         return true;
@@ -192,13 +198,28 @@ public:
         return true;
     }
 
+    // The energy tables, after readTables().
+    bool readEnergy(const tinyxml2::XMLElement& root, std::vector<EnergyTable>* tables) {
+        EnergyTableReader reader(mSteps);
+        for (auto* e = root.FirstChildElement("energy"); e != nullptr;
+             e = e->NextSiblingElement("energy")) {
+            EnergyTable table;
+            if (!reader.read(*e, &table))
+                return fail(reader.line(), reader.problem());
+            tables->push_back(std::move(table));
+        }
+        return true;
+    }
+
     int mLine = 0;
     std::string mProblem;
     ValueRule mLevels;
+    std::vector<std::string> mDomains;  // <frequencies> ids in order
 
 private:
     std::map<std::string, ValueRule> mTables;  // "frequencies:ID" or "governors:ID"
     std::map<std::string, int> mKeyLines;      // node key -> its line, for a second definition
+    std::map<std::string, std::vector<long long>> mSteps;  // frequencies id -> ascending
 };
 
 }  // namespace
@@ -217,11 +238,15 @@ const DeviceProfile& DeviceProfile::builtIn() {
 int DeviceProfile::parse(const std::string& text, const std::string& origin, std::string* error) {
     mName.clear();
     mNodes.clear();
+    mDomains.clear();
+    mEnergy.clear();
     mOrigin = origin;
     auto report = [&](int line, const std::string& message) {
         if (error != nullptr)
             *error = origin + ":" + std::to_string(line) + ": " + message;
         mNodes.clear();
+        mDomains.clear();
+        mEnergy.clear();
         return -1;
     };
     tinyxml2::XMLDocument doc;
@@ -237,13 +262,17 @@ int DeviceProfile::parse(const std::string& text, const std::string& origin, std
     mName = name != nullptr ? name : "";
     ProfileReader reader;
     std::vector<NodeSpec> nodes;
-    if (!reader.readTables(*root) || !reader.readNodes(*root, &nodes)) {
+    std::vector<EnergyTable> energy;
+    if (!reader.readTables(*root) || !reader.readEnergy(*root, &energy) ||
+        !reader.readNodes(*root, &nodes)) {
         return report(reader.mLine, reader.mProblem);
     }
     if (nodes.empty()) {
         return report(root->GetLineNum(), "<device> has no <node>");
     }
     mNodes = std::move(nodes);
+    mDomains = std::move(reader.mDomains);
+    mEnergy = std::move(energy);
     mLevelMin = reader.mLevels.min;
     mLevelMax = reader.mLevels.max;
     return 0;
@@ -266,6 +295,14 @@ const NodeSpec* DeviceProfile::find(const std::string& key) const {
         if (node.key == key) {
             return &node;
         }
+    }
+    return nullptr;
+}
+
+const EnergyTable* DeviceProfile::energyTable(const std::string& id) const {
+    for (const auto& table : mEnergy) {
+        if (table.id == id)
+            return &table;
     }
     return nullptr;
 }

@@ -6,6 +6,7 @@
 //         <frequencies id="cpu.little" unit="kHz">300000 ... 1804800</frequencies>
 //         <governors id="cpu">schedutil performance powersave</governors>
 //         <levels min="-20" max="40"/>
+//         <energy id="cpu.little" cpus="4"><opp freq="300000" mw="6"/> ...</energy>
 //         <node key="cpu.little.min" kind="floor" allowed="frequencies:cpu.little"
 //               seed="300000" path="sys/devices/system/cpu/cpufreq/policy0/scaling_min_freq"/>
 //     </device>
@@ -19,6 +20,7 @@
 #include <vector>
 
 #include "host/device/NodeKind.h"
+#include "host/device/profile/EnergyTable.h"
 
 namespace velmora {
 
@@ -41,6 +43,12 @@ public:
     const std::vector<NodeSpec>& nodes() const { return mNodes; }
     // Null when `key` is not a node of the device.
     const NodeSpec* find(const std::string& key) const;
+    // The ids of the <frequencies> tables (the cpufreq and devfreq domains), in profile order.
+    const std::vector<std::string>& frequencyDomains() const { return mDomains; }
+    // The energy tables, in profile order; a domain need not have one.
+    const std::vector<EnergyTable>& energyTables() const { return mEnergy; }
+    // Null when domain `id` has no energy table.
+    const EnergyTable* energyTable(const std::string& id) const;
     long long lowestLevel() const { return mLevelMin; }
     long long highestLevel() const { return mLevelMax; }
 
@@ -48,6 +56,8 @@ private:
     std::string mName;
     std::string mOrigin;
     std::vector<NodeSpec> mNodes;
+    std::vector<std::string> mDomains;
+    std::vector<EnergyTable> mEnergy;
     long long mLevelMin = 0;
     long long mLevelMax = 0;
 };
