@@ -2,7 +2,6 @@
 (VELMORA_SOURCE_DIR), both set by the CTest entries (tests/fleet/CMakeLists.txt)."""
 import os
 import subprocess
-import tempfile
 
 import pytest
 
@@ -36,22 +35,10 @@ def config_b(directory):
     return str(directory)
 
 
-def replay_takes_load():
-    """True when this velmora-replay reads load lines (the energy model)."""
-    with tempfile.TemporaryDirectory() as scratch:
-        trace = os.path.join(scratch, "load.trace")
-        with open(trace, "w") as out:
-            out.write("@0 load cpu.big=0.5\n@10 event 20225 0\n")
-        return run([tool("velmora-replay"), "--fast", "--quiet", "--config-dir", EXAMPLES,
-                    trace]).returncode == 0
-
-
-def synth(directory, count, duration_ms, seed=1, load=None):
-    """velmora-synth sessions in `directory`; load lines when the replay reads them."""
-    if load is None:
-        load = replay_takes_load()
+def synth(directory, count, duration_ms, seed=1):
+    """velmora-synth sessions (with load lines) in `directory`."""
     args = [tool("velmora-synth"), "--seed", str(seed), "--count", str(count),
             "--duration-ms", str(duration_ms), "-o", str(directory)]
-    subprocess.run(args + (["--load"] if load else []), check=True, capture_output=True)
+    subprocess.run(args, check=True, capture_output=True)
     return sorted(os.path.join(str(directory), f) for f in os.listdir(str(directory))
                   if f.startswith("session-"))

@@ -7,15 +7,15 @@ namespace velmora {
 
 namespace {
 
-// Typical utilisation in hundredths per activity and domain (cpu.little, cpu.big, gpu, ddr).
+// Typical utilisation in hundredths per activity and domain (cpu.little, cpu.big, gpu).
 // A game keeps the big cluster and the GPU near their top; scrolling mostly the little
 // cluster and the GPU's composition; a launch the big cluster for a second or two.
 const std::array<std::array<int, LoadModel::kDomains>, LoadModel::kActivityCount> kTypical = {{
-    {{8, 2, 1, 5}},      // idle, screen off
-    {{30, 15, 15, 20}},  // an app in the foreground
-    {{55, 35, 45, 35}},  // scrolling
-    {{70, 85, 30, 45}},  // launching
-    {{60, 85, 90, 60}},  // a game
+    {{8, 2, 1}},     // idle, screen off
+    {{30, 15, 15}},  // an app in the foreground
+    {{55, 35, 45}},  // scrolling
+    {{70, 85, 30}},  // launching
+    {{60, 85, 90}},  // a game
 }};
 // Share of the way towards the typical level one sample goes, in percent.
 constexpr int kFollowPercent = 60;
@@ -25,7 +25,7 @@ constexpr int kNoise = 12;
 }  // namespace
 
 const std::array<const char*, LoadModel::kDomains> LoadModel::kDomainIds = {"cpu.little", "cpu.big",
-                                                                            "gpu", "ddr"};
+                                                                            "gpu"};
 
 LoadModel::LoadModel(SplitMix64& random) : mRandom(random) {
     mPercent = kTypical[kIdle];

@@ -31,7 +31,7 @@ std::string SessionSynth::generate(const SessionOptions& options, SessionStats* 
 std::string SessionSynth::run() {
     mText = "# Generated: velmora-synth --seed " + std::to_string(mOptions.seed) +
             " --duration-ms " + std::to_string(mOptions.durationMs) +
-            (mOptions.load ? " --load" : "") + "\n";
+            (mOptions.load ? "" : " --no-load") + "\n";
     write(mModel.notification());
     while (mNow < mOptions.durationMs) {
         const uint64_t next = mRandom.below(10);

@@ -23,7 +23,7 @@ namespace velmora {
 struct SessionOptions {
     uint64_t seed = 1;
     int64_t durationMs = 600000;  // no call starts after this trace time
-    bool load = false;            // write load lines
+    bool load = true;             // write load lines
     int64_t loadPeriodMs = 1000;  // time between two load lines
 };
 

@@ -20,8 +20,7 @@ void usage(FILE* to) {
         "  --count N             number of sessions (default 1)\n"
         "  --duration-ms MS      length of each session (default 600000, ten minutes)\n"
         "  --load-period-ms MS   time between two load lines (default 1000)\n"
-        "  --load                with load lines (how busy each frequency domain is)\n"
-        "  --no-load             without load lines (the default)\n"
+        "  --no-load             without load lines (how busy each frequency domain is)\n"
         "  -o DIR                write DIR/session-0001.trace, ... (made if missing)\n"
         "  --version             print the version\n",
         to);
@@ -56,8 +55,8 @@ int main(int argc, char** argv) {
             printf("velmora-synth %s\n", VELMORA_VERSION);
             return 0;
         }
-        if (arg == "--load" || arg == "--no-load") {
-            options.load = arg == "--load";
+        if (arg == "--no-load") {
+            options.load = false;
             continue;
         }
         if (i + 1 >= argc) {

@@ -77,12 +77,8 @@ def report_name(session):
     return "%s-%s" % (stem, hashlib.sha1(session.encode("utf-8")).hexdigest()[:8])
 
 
-def make_jobs(args, sessions, replay, out):
-    configs = {"a": config_dir(args.config_dir),
-               "b": config_dir(args.against) if args.against else None}
+def make_jobs(args, sessions, configs, replay, out):
     device = os.path.abspath(args.device) if args.device else None
-    if device and not os.path.isfile(device):
-        raise UsageError("%s: no such device profile" % args.device)
     jobs = []
     for session in sessions:
         reports = None
@@ -91,7 +87,7 @@ def make_jobs(args, sessions, replay, out):
             reports = {"a": stem + ".a.html", "b": stem + ".b.html"}
         jobs.append({"session": session, "replay": replay, "config": configs,
                      "device": device, "reports": reports})
-    return jobs, configs
+    return jobs
 
 
 def write_atomically(path, text):
@@ -107,12 +103,16 @@ def run(args, replay):
         raise UsageError("-j needs a count of 1 or more")
     if not os.access(replay, os.X_OK):
         raise UsageError("%s: velmora-replay not found (--replay PATH)" % replay)
+    configs = {"a": config_dir(args.config_dir),
+               "b": config_dir(args.against) if args.against else None}
+    if args.device and not os.path.isfile(args.device):
+        raise UsageError("%s: no such device profile" % args.device)
     out = os.path.abspath(args.out)
     try:
         os.makedirs(os.path.join(out, "sessions") if args.reports else out, exist_ok=True)
     except OSError as err:
         raise UsageError("cannot make %s: %s" % (args.out, err.strerror))
-    jobs, configs = make_jobs(args, sessions, replay, out)
+    jobs = make_jobs(args, sessions, configs, replay, out)
 
     started = time.monotonic()
     progress = ProgressLine(len(jobs), sys.stderr)
@@ -131,7 +131,8 @@ def run(args, replay):
     results.sort(key=lambda r: r["session"])
     fleet = {"config_a": configs["a"], "config_b": configs["b"],
              "sessions": results,
-             "totals": {"a": FleetTotals.of(results, "a"), "b": FleetTotals.of(results, "b")}}
+             "totals": {"a": FleetTotals.of(results, "a"),
+                        "b": FleetTotals.of(results, "b") if configs["b"] else None}}
     write_atomically(os.path.join(out, "fleet.json"), json.dumps(fleet, indent=1) + "\n")
     links = {}
     if args.reports:

@@ -39,12 +39,9 @@ class FleetTotals:
 
     @staticmethod
     def of(results, side):
-        """Totals of one side over the sessions that ran (None when the side was not run)."""
+        """Totals of one side over the sessions that ran without failing."""
         totals = FleetTotals()
-        ran = False
         for result in results:
-            if result.get(side) is not None:
-                ran = True
-                if result["status"] == "ok":
-                    totals.add(result[side])
-        return totals.to_json() if ran or side == "a" else None
+            if result["status"] == "ok" and result.get(side) is not None:
+                totals.add(result[side])
+        return totals.to_json()
