@@ -9,9 +9,9 @@ TOOLS = os.environ.get("VELMORA_TOOLS", "")
 SOURCE = os.environ.get("VELMORA_SOURCE_DIR",
                         os.path.dirname(os.path.dirname(os.path.dirname(__file__))))
 EXAMPLES = os.path.join(SOURCE, "examples")
-# A what-if configuration: the game scene asks for higher big-cluster and GPU floors.
-GAME_A = "<big_min>1804800</big_min><gpu_min>500000000</gpu_min></act>"
-GAME_B = "<big_min>2419200</big_min><gpu_min>700000000</gpu_min></act>"
+# A what-if configuration: a probed thread's boost asks for a higher big-cluster floor.
+PROBE_A = "<big_min>1497600</big_min>"
+PROBE_B = "<big_min>2419200</big_min>"
 
 
 def tool(name):
@@ -26,12 +26,13 @@ def run(args, **kwargs):
 
 
 def config_b(directory):
-    """A copy of the example configuration with the game scene's floors raised."""
+    """A copy of the example configuration whose probe boost raises the big cluster's floor
+    to 2419200 kHz (1497600 in the example)."""
     text = open(os.path.join(EXAMPLES, "xml", "velmora_config_cust.xml")).read()
-    assert GAME_A in text
+    assert PROBE_A in text
     os.makedirs(os.path.join(directory, "xml"), exist_ok=True)
     with open(os.path.join(directory, "xml", "velmora_config_cust.xml"), "w") as out:
-        out.write(text.replace(GAME_A, GAME_B))
+        out.write(text.replace(PROBE_A, PROBE_B))
     return str(directory)
 
 

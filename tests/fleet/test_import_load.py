@@ -40,6 +40,7 @@ def test_load_lines_go_between_the_calls_by_time(tmp_path):
     assert result.returncode == 0, result.stderr
     assert calls(trace) == [
         ["@0", "load", "cpu.little=0.20", "cpu.big=0.05"],
+        ["@0", "dump", "--logon"],
         ["@0", "event", "4099", "0"],
         ["@900", "load", "cpu.little=0.30", "cpu.big=0.40"],
         ["@2000", "load", "cpu.little=0.50", "cpu.big=0.60"],
@@ -54,7 +55,7 @@ def test_monotonic_log_and_file(tmp_path):
     load = LOAD.replace("clock=epoch", "clock=monotonic").replace("@1795457", "@")
     result, trace = import_log(tmp_path, load, log)
     assert result.returncode == 0, result.stderr
-    assert calls(trace)[2] == ["@900", "load", "cpu.little=0.30", "cpu.big=0.40"]
+    assert calls(trace)[3] == ["@900", "load", "cpu.little=0.30", "cpu.big=0.40"]
 
 
 @pytest.mark.parametrize("load, log, message", [

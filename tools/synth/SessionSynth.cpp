@@ -32,6 +32,7 @@ std::string SessionSynth::run() {
     mText = "# Generated: velmora-synth --seed " + std::to_string(mOptions.seed) +
             " --duration-ms " + std::to_string(mOptions.durationMs) +
             (mOptions.load ? "" : " --no-load") + "\n";
+    advance(0);  // the load from the start, before the first call
     write(mModel.notification());
     while (mNow < mOptions.durationMs) {
         const uint64_t next = mRandom.below(10);
@@ -132,7 +133,9 @@ void SessionSynth::game(int64_t until) {
 }
 
 void SessionSynth::advance(int64_t meanMs) {
-    mNow += mRandom.range(1, 2 * meanMs - 1);
+    if (meanMs > 0) {
+        mNow += mRandom.range(1, 2 * meanMs - 1);
+    }
     if (!mOptions.load) {
         return;
     }

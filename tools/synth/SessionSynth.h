@@ -46,7 +46,8 @@ private:
     void idle(int64_t until);
     void app(int64_t until);
     void game(int64_t until);
-    // Moves the time on by a random gap around `meanMs`, writing the load lines that fall due.
+    // Moves the time on by a random gap around `meanMs` (0: not at all), writing the load lines
+    // that fall due.
     void advance(int64_t meanMs);
     // A call at the time reached.
     void write(const GeneratedCall& call);

@@ -67,6 +67,10 @@ int main(int argc, char** argv) {
             outDir = text;
             continue;
         }
+        if (arg != "--seed" && arg != "--count" && arg != "--duration-ms" &&
+            arg != "--load-period-ms") {
+            return usageError("unknown option " + arg);
+        }
         long long v = 0;
         if (!count(text, &v)) {
             return usageError(arg + ": not a count: '" + text + "'");
@@ -80,7 +84,7 @@ int main(int argc, char** argv) {
         } else if (arg == "--load-period-ms" && v > 0) {
             options.loadPeriodMs = v;
         } else {
-            return usageError("unknown option or bad value: " + arg + " " + text);
+            return usageError(arg + ": must be positive");
         }
     }
     if (outDir.empty()) {
@@ -96,7 +100,7 @@ int main(int argc, char** argv) {
         options.seed = first + static_cast<uint64_t>(i);
         velmora::SessionStats stats;
         const std::string text = velmora::SessionSynth::generate(options, &stats);
-        char name[32];
+        char name[48];
         snprintf(name, sizeof(name), "/session-%04lld.trace", i + 1);
         const std::string path = outDir + name;
         FILE* out = fopen(path.c_str(), "w");
