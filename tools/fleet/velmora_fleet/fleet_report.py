@@ -14,7 +14,8 @@ STYLE = (
     "svg rect.bin{fill:#1f6fb4}svg line.zero{stroke:#b00;stroke-dasharray:3 2}"
     "svg text{font-size:11px;fill:#555}table{border-collapse:collapse}"
     "td,th{border-bottom:1px solid #eee;padding:2px 8px;text-align:left;vertical-align:top}"
-    "td.num{text-align:right}.warn{color:#b00}.better{color:#070}")
+    "td.num{text-align:right}.warn{color:#b00}.better{color:#070}"
+    ".row{display:flex;gap:24px}.same{color:#777;width:440px}")
 # Counts the drawn histograms and their bars once laid out, for the browser check.
 SELF_CHECK = (
     "window.addEventListener('load',function(){var out=[];"
@@ -23,7 +24,7 @@ SELF_CHECK = (
     "bars:s.querySelectorAll('rect.bin').length});});"
     "document.body.setAttribute('data-hists',JSON.stringify(out));});")
 BINS = 20
-WIDTH, HEIGHT, LEFT, BOTTOM = 520, 140, 40, 18
+WIDTH, HEIGHT, LEFT, BOTTOM = 440, 120, 40, 18
 MOST_REGRESSED = 15
 
 
@@ -46,14 +47,20 @@ class FleetReport:
         self.fleet = fleet
         self.links = report_links
         self.deltas = SessionDelta.of(fleet["sessions"])
+        # Sessions are named relative to the directory they share.
+        paths = [s["session"] for s in fleet["sessions"]]
+        self.base = os.path.commonpath([os.path.dirname(p) for p in paths]) if paths else ""
+
+    def name(self, session):
+        return os.path.relpath(session, self.base) if self.base else session
 
     def html(self):
         sessions = self.fleet["sessions"]
         failed = [s for s in sessions if s["status"] != "ok"]
         out = ['<!DOCTYPE html>\n<html><head><meta charset="utf-8"><title>Fleet report</title>'
                "<style>%s</style></head>\n<body>\n<h1>Fleet report</h1>\n" % STYLE,
-               "<p>%d sessions, %d failed. A: %s%s</p>\n" % (
-                   len(sessions), len(failed), esc(self.fleet.get("config_a", "")),
+               "<p>%d sessions in %s, %d failed. A: %s%s</p>\n" % (
+                   len(sessions), esc(self.base), len(failed), esc(self.fleet.get("config_a", "")),
                    ("; B: " + esc(self.fleet["config_b"])) if self.fleet.get("config_b") else "")]
         out.append(self._totals())
         if self.deltas:
@@ -96,9 +103,16 @@ class FleetReport:
             return "<h2>Energy and saturation per session</h2>\n<p>No load lines.</p>\n"
         out = ["<h2>Energy and saturation per session (B &minus; A)</h2>\n"]
         for domain in domains:
-            for index, label in ((0, "energy delta (mJ)"), (1, "saturated time delta (ms)")):
+            out.append('<div class="row">')
+            for index, label in ((0, "energy (mJ)"), (1, "saturated time (ms)")):
                 values = [delta.energy.get(domain, (0.0, 0.0))[index] for delta in self.deltas]
-                out.append("<h3>%s %s</h3>\n%s" % (esc(domain), label, histogram(values)))
+                out.append("<div><h3>%s %s</h3>\n" % (esc(domain), label))
+                if any(values):
+                    out.append(histogram(values))
+                else:
+                    out.append('<p class="same">the same in every session</p>\n')
+                out.append("</div>")
+            out.append("</div>\n")
         return "".join(out)
 
     def _regressions(self):
@@ -109,7 +123,8 @@ class FleetReport:
         out += ["<th>%s &Delta; mJ</th>" % esc(d) for d in domains]
         out.append("<th>new warnings</th><th>reports</th></tr>\n")
         for delta in worst:
-            out.append("<tr><td>%s</td>%s%s" % (esc(delta.session), signed(delta.energy_mj()),
+            out.append("<tr><td>%s</td>%s%s" % (esc(self.name(delta.session)),
+                                                signed(delta.energy_mj()),
                                                 signed(delta.saturated_ms())))
             out += [signed(delta.energy.get(d, (0.0, 0.0))[0]) for d in domains]
             out.append('<td class="num">%d</td><td>%s</td></tr>\n' % (
@@ -129,16 +144,15 @@ class FleetReport:
         out.append("<table>\n<tr><th>session</th><th>kind</th><th>warning</th></tr>\n")
         for session, warning in rows:
             out.append('<tr><td>%s</td><td>%s</td><td class="warn">%s</td></tr>\n' % (
-                esc(os.path.basename(session)), esc(warning.get("kind", "")),
+                esc(self.name(session)), esc(warning.get("kind", "")),
                 esc(warning.get("message", ""))))
         return "".join(out) + "</table>\n"
 
-    @staticmethod
-    def _failed(failed):
+    def _failed(self, failed):
         if not failed:
             return ""
         out = ["<h2>Failed sessions</h2>\n<ul>\n"]
-        out += ['<li>%s: <span class="warn">%s</span></li>\n' % (esc(s["session"]),
+        out += ['<li>%s: <span class="warn">%s</span></li>\n' % (esc(self.name(s["session"])),
                                                                   esc(s["error"]))
                 for s in failed]
         return "".join(out) + "</ul>\n"
