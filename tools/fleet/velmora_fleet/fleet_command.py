@@ -15,6 +15,7 @@ import time
 from velmora_fleet.fleet_report import FleetReport
 from velmora_fleet.fleet_totals import FleetTotals
 from velmora_fleet.progress_line import ProgressLine
+from velmora_fleet.session_pool import ClusterError, SessionPool
 
 CONFIG_FILE = os.path.join("xml", "velmora_config_cust.xml")
 
@@ -116,15 +117,14 @@ def run(args, replay):
 
     started = time.monotonic()
     progress = ProgressLine(len(jobs), sys.stderr)
-    if args.scheduler:
-        from velmora_fleet.dask_pool import ClusterError, run_dask
-        try:
-            results = run_dask(jobs, args.scheduler, progress.step)
-        except ClusterError as err:
-            raise UsageError(str(err))
-    else:
-        from velmora_fleet.local_pool import run_local
-        results = run_local(jobs, args.jobs or len(os.sched_getaffinity(0)), progress.step)
+    try:
+        if args.scheduler:
+            results = SessionPool.dask(jobs, args.scheduler, progress.step)
+        else:
+            workers = args.jobs or len(os.sched_getaffinity(0))
+            results = SessionPool.local(jobs, workers, progress.step)
+    except ClusterError as err:
+        raise UsageError(str(err))
     progress.finish()
     elapsed = time.monotonic() - started
 
