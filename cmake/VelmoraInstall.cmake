@@ -37,14 +37,7 @@ function(velmora_install_rules)
             install(TARGETS ${tool} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
         endif()
     endforeach()
-    # velmora-fleet runs the velmora-replay beside it; its Python package goes under share/.
-    if(TARGET velmora-replay)
-        install(PROGRAMS "${PROJECT_BINARY_DIR}/tools/velmora-fleet"
-                DESTINATION ${CMAKE_INSTALL_BINDIR})
-        install(DIRECTORY "${PROJECT_BINARY_DIR}/tools/velmora_fleet"
-                DESTINATION "${VELMORA_INSTALL_DATADIR}/python"
-                FILES_MATCHING PATTERN "*.py" PATTERN "__pycache__" EXCLUDE)
-    endif()
+    # velmora-fleet and its Python package: tools/CMakeLists.txt, which lists the files.
     install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" "${PROJECT_SOURCE_DIR}/docs"
             DESTINATION "${VELMORA_INSTALL_DATADIR}")
     foreach(dir IN LISTS VELMORA_PUBLIC_HEADER_DIRS)
