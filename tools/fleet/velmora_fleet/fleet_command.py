@@ -98,6 +98,21 @@ def write_atomically(path, text):
     os.replace(scratch, path)
 
 
+def print_totals(totals):
+    """One line per domain: energy and saturated time under A, B and the change."""
+    a, b = totals["a"], totals["b"]
+    for domain, fa in a["energy"].items():
+        line = "  %-11s A: %11.1f mJ, %9.0f ms saturated" % (domain, fa["mJ"], fa["saturated_ms"])
+        fb = b["energy"].get(domain) if b else None
+        if fb:
+            change = 100.0 * (fb["mJ"] - fa["mJ"]) / fa["mJ"] if fa["mJ"] else 0.0
+            line += "; B: %11.1f mJ (%+.2f %%), %9.0f ms saturated (%+.0f ms)" % (
+                fb["mJ"], change, fb["saturated_ms"], fb["saturated_ms"] - fa["saturated_ms"])
+        print(line)
+    left = "  left applied A: %d warnings" % a["left_applied"]
+    print(left + ("; B: %d" % b["left_applied"] if b else ""))
+
+
 def run(args, replay):
     sessions = find_sessions(args.sessions)
     if args.jobs is not None and args.jobs < 1:
@@ -146,6 +161,7 @@ def run(args, replay):
     print("velmora-fleet: %d sessions, %d failed, %.1f s; %s, %s" % (
         len(results), failed, elapsed, os.path.join(args.out, "fleet.json"),
         os.path.join(args.out, "fleet.html")))
+    print_totals(fleet["totals"])
     for r in results:
         if r["status"] != "ok":
             print("velmora-fleet: %s: %s" % (r["session"], r["error"]), file=sys.stderr)
