@@ -1,10 +1,11 @@
 // velmora-replay --fast as a user runs it: the real program in a child process on a generated
 // hour of device use (tools/tracegen, about 120,000 host calls), with 15 % probe events and with
 // none (the floor: no hand-over to the library's probe worker). Each trace is replayed on an
-// idle machine and with one CPU-bound process beside it. Measured per run: wall time from fork
-// to exit, host calls per second, the child's CPU time (user + system, from wait4) per call and
-// its largest resident set (ru_maxrss). Medians of the repetitions are printed and written as
-// JSON for scripts/bench, which sets them against the targets.
+// idle machine and with one CPU-bound process beside it; on the idle machine also the hour
+// with a load line every 100 ms ("probes+load"), which the energy model reads. Measured per run:
+// wall time from fork to exit, host calls per second, the child's CPU time (user + system, from
+// wait4) per call and its largest resident set (ru_maxrss). Medians of the repetitions are printed
+// and written as JSON for scripts/bench, which sets them against the targets.
 //
 //   velmora_bench_replay [--repetitions N] [--out FILE.json] [--replay PATH] [--seed N]
 //
@@ -37,7 +38,7 @@ struct Run {
 
 struct Case {
     std::string load;   // "idle" or "loaded"
-    std::string trace;  // "probes" or "no-probes"
+    std::string trace;  // "probes", "no-probes" or "probes+load"
     std::vector<Run> runs;
 };
 
@@ -122,13 +123,16 @@ pid_t startBusyLoop() {
     return pid;
 }
 
-std::string writeTrace(const std::string& name, uint64_t seed, uint32_t probePpm) {
+std::string writeTrace(const std::string& name, uint64_t seed, uint32_t probePpm,
+                       int64_t loadEveryMs = 0) {
     const std::string path = gScratch + "/" + name + ".trace";
     velmora::TraceGenStats stats;
-    std::ofstream(path) << velmora::TraceGenerator::generate(
-        velmora::TraceGenOptions::hour(seed, probePpm), &stats);
-    printf("%s: %lld host calls, %lld probe events, %.0f s of trace time\n", path.c_str(),
-           static_cast<long long>(stats.hostCalls), static_cast<long long>(stats.probeEvents),
+    velmora::TraceGenOptions options = velmora::TraceGenOptions::hour(seed, probePpm);
+    options.loadEveryMs = loadEveryMs;
+    std::ofstream(path) << velmora::TraceGenerator::generate(options, &stats);
+    printf("%s: %lld host calls, %lld probe events, %lld load lines, %.0f s of trace time\n",
+           path.c_str(), static_cast<long long>(stats.hostCalls),
+           static_cast<long long>(stats.probeEvents), static_cast<long long>(stats.loadLines),
            stats.endMs / 1000.0);
     return path;
 }
@@ -194,22 +198,28 @@ int main(int argc, char** argv) {
     gScratch = dir;
     const std::string probes = writeTrace("hour-probes", seed, 150000);
     const std::string none = writeTrace("hour-no-probes", seed, 0);
+    const std::string withLoad = writeTrace("hour-probes-load", seed, 150000, 100);
+    auto traceOf = [&](const std::string& trace) {
+        return trace == "probes" ? probes : trace == "no-probes" ? none : withLoad;
+    };
 
     std::vector<Case> cases = {{"idle", "probes", {}},
                                {"idle", "no-probes", {}},
+                               {"idle", "probes+load", {}},
                                {"loaded", "probes", {}},
                                {"loaded", "no-probes", {}}};
+    const size_t blockStart[] = {0, 3, 5};
     bool ok = true;
     for (size_t block = 0; block < 2 && ok; ++block) {
         const pid_t busy = block == 1 ? startBusyLoop() : -1;
         // Alternately, so that a change of machine load meets both traces.
         for (int rep = 0; rep < repetitions && ok; ++rep) {
-            for (size_t c = 2 * block; c < 2 * block + 2 && ok; ++c) {
+            for (size_t c = blockStart[block]; c < blockStart[block + 1] && ok; ++c) {
                 Run run;
-                ok = replayOnce(replay, cases[c].trace == "probes" ? probes : none, &run);
+                ok = replayOnce(replay, traceOf(cases[c].trace), &run);
                 cases[c].runs.push_back(run);
                 printf(
-                    "%-6s %-9s %7ld calls in %6.3f s: %8.0f calls/s, %6.2f us CPU per call, "
+                    "%-6s %-11s %7ld calls in %6.3f s: %8.0f calls/s, %6.2f us CPU per call, "
                     "%6.1f MB resident\n",
                     cases[c].load.c_str(), cases[c].trace.c_str(), run.calls, run.wallS,
                     run.calls / run.wallS, run.cpuS * 1e6 / std::max(1L, run.calls),

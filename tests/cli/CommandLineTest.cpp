@@ -3,7 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-
+#include <fstream>
 #include <string>
 #include <vector>
 
@@ -96,13 +96,47 @@ TEST(ReplayTerminalTest, ServerLogThatCannotBeWrittenIsASetUpFailure) {
     EXPECT_EQ("velmora-replay: cannot write " + cwd + "/none/server.log\n", result.err);
 }
 
+// Placeholders an import left unedited: one warning each, with its line and what to fill in;
+// past ten, one line counting the rest. The replay still runs.
+TEST(ReplayPlaceholderTest, WarnsOncePerUneditedPlaceholder) {
+    const std::string cwd = scratchDir("placeholders");
+    std::string trace =
+        "@100 event 4116 0 msg=\"pid=0|tid=0\"  # EDIT\n"
+        "@200 event 20480 0 msg=\"pid=0|tid=0\"  # EDIT\n"
+        "@300 event 4116 0 msg=\"pid=2100|tid=2100\"\n";
+    for (int i = 0; i < 10; ++i)
+        trace += "@400 event 4116 0 msg=\"pid=0|tid=0\"\n";
+    std::ofstream(cwd + "/t.trace") << trace;
+    const ToolResult result = ToolRun::run(
+        {replayTool(), "--fast", "--quiet", "--config-dir", examplesDir(), cwd + "/t.trace"}, cwd,
+        {"TMPDIR=" + cwd});
+    EXPECT_EQ(0, result.status) << result.err;
+    const std::string prefix = "velmora-replay: " + cwd + "/t.trace:";
+    EXPECT_NE(std::string::npos,
+              result.err.find(prefix + "1: warning: unedited placeholder from the import, "
+                                       "msg=\"pid=0|tid=0\": the probe boosts no thread; fill in "
+                                       "the pid and tid of the thread to probe\n"))
+        << result.err;
+    EXPECT_NE(std::string::npos,
+              result.err.find(prefix + "2: warning: unedited placeholder from the import, "
+                                       "msg=\"pid=0|tid=0\": the memory-latency event fails "
+                                       "(status 3)"))
+        << result.err;
+    EXPECT_EQ(std::string::npos, result.err.find(prefix + "3:")) << "an edited probe is fine";
+    EXPECT_NE(std::string::npos,
+              result.err.find("velmora-replay: " + cwd +
+                              "/t.trace: warning: 2 more unedited placeholders\n"))
+        << result.err;
+}
+
 // Every tool prints its name and the project's version, and nothing else.
 TEST(ToolVersionTest, EveryToolPrintsItsNameAndTheProjectVersion) {
     const std::string cwd = scratchDir("version");
     const std::vector<std::pair<std::string, std::string>> tools = {
         {replayTool(), "velmora-replay"},
         {lintTool(), "velmora-lint"},
-        {logcatTool(), "velmora-import-logcat"}};
+        {logcatTool(), "velmora-import-logcat"},
+        {tracegenTool(), "velmora-gen-trace"}};
     for (const auto& tool : tools) {
         const ToolResult result = ToolRun::run({tool.first, "--version"}, cwd);
         EXPECT_EQ(0, result.status) << tool.second;
@@ -171,7 +205,19 @@ INSTANTIATE_TEST_SUITE_P(
                  logcatTool(),
                  {"--in", "a.log", "-o", "t.trace"},
                  "unexpected argument '--in'"},
-        UsageRow{"LogcatNoOutput", logcatTool(), {"a.log"}, "usage: velmora-import-logcat"}),
+        UsageRow{"LogcatNoOutput", logcatTool(), {"a.log"}, "usage: velmora-import-logcat"},
+        UsageRow{"ReplayCompareOnlyAlone",
+                 replayTool(),
+                 {"--compare-only", "t.trace"},
+                 "--compare-only needs --compare"},
+        UsageRow{
+            "TracegenUnknownOption", tracegenTool(), {"--seeed", "4"}, "unknown option --seeed"},
+        UsageRow{"TracegenNotANumber", tracegenTool(), {"--seed", "x"}, "not a number: 'x'"},
+        UsageRow{"TracegenNoValue", tracegenTool(), {"--seed"}, "--seed needs a value"},
+        UsageRow{"TracegenGapBelowOne",
+                 tracegenTool(),
+                 {"--mean-gap-ms", "0"},
+                 "--mean-gap-ms is at least 1"}),
     [](const ::testing::TestParamInfo<UsageRow>& info) { return std::string(info.param.name); });
 
 }  // namespace

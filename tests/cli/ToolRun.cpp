@@ -109,6 +109,10 @@ std::string logcatTool() {
     return VELMORA_LOGCAT_TOOL;
 }
 
+std::string tracegenTool() {
+    return VELMORA_TRACEGEN_TOOL;
+}
+
 std::string examplesDir() {
     return std::string(VELMORA_SOURCE_DIR) + "/examples";
 }

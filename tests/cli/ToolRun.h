@@ -35,6 +35,7 @@ std::string readFile(const std::string& path);
 std::string replayTool();
 std::string lintTool();
 std::string logcatTool();
+std::string tracegenTool();
 std::string examplesDir();
 
 }  // namespace clitest

@@ -32,6 +32,12 @@ std::string manyNodesAndATwin(int count) {
     return text + "<node key=\"k0\" kind=\"value\" path=\"x\"/>\n</device>\n";
 }
 
+// A device of one domain with three frequencies and `energy` as its energy table, from line 3.
+std::string withEnergy(const std::string& energy) {
+    return "<device>\n<frequencies id=\"cpu\" unit=\"kHz\">100 200 300</frequencies>\n" + energy +
+           "<node key=\"cpu.min\" kind=\"floor\" path=\"x\"/>\n</device>\n";
+}
+
 struct BadProfile {
     const char* name;
     std::string text;
@@ -45,6 +51,46 @@ const BadProfile kBadProfiles[] = {
      "P:2: node 'a' has kind \"max\" (expected floor, cap, value or text)"},
     {"AbsolutePath", "<device>\n<node key=\"a\" kind=\"value\" path=\"/sys/x\"/>\n</device>\n",
      "P:2: node 'a' needs a path relative to the device root"},
+    // Energy tables: one <opp> per available frequency, by increasing frequency, with a power
+    // that is not negative and does not fall.
+    {"OppMissing",
+     withEnergy("<energy id=\"cpu\" cpus=\"2\">\n<opp freq=\"100\" mw=\"1\"/>\n"
+                "<opp freq=\"300\" mw=\"3\"/>\n</energy>\n"),
+     "P:3: energy table 'cpu' has no OPP for 200 (every available frequency of the domain needs "
+     "one)"},
+    {"OppTwice",
+     withEnergy("<energy id=\"cpu\" cpus=\"2\">\n<opp freq=\"100\" mw=\"1\"/>\n"
+                "<opp freq=\"100\" mw=\"1\"/>\n</energy>\n"),
+     "P:5: OPP 100 of energy table 'cpu' is listed twice (first on line 4)"},
+    {"OppsNotIncreasing",
+     withEnergy("<energy id=\"cpu\" cpus=\"2\">\n<opp freq=\"200\" mw=\"2\"/>\n"
+                "<opp freq=\"100\" mw=\"2\"/>\n</energy>\n"),
+     "P:5: OPP 100 of energy table 'cpu' comes after 200: list the OPPs by increasing "
+     "frequency"},
+    {"PowerFalls",
+     withEnergy("<energy id=\"cpu\" cpus=\"2\">\n<opp freq=\"100\" mw=\"2\"/>\n"
+                "<opp freq=\"200\" mw=\"1.5\"/>\n</energy>\n"),
+     "P:5: OPP 200 of energy table 'cpu' draws 1.5 mW, less than the 2 mW of the OPP below it: "
+     "power must not fall as frequency rises"},
+    {"OppNotAvailable",
+     withEnergy("<energy id=\"cpu\" cpus=\"2\">\n<opp freq=\"150\" mw=\"1\"/>\n</energy>\n"),
+     "P:4: OPP 150 of energy table 'cpu' is not an available frequency of 'cpu'"},
+    {"NegativePower",
+     withEnergy("<energy id=\"cpu\" cpus=\"2\">\n<opp freq=\"100\" mw=\"-1\"/>\n</energy>\n"),
+     "P:4: OPP 100 of energy table 'cpu' has a negative power (-1 mW)"},
+    {"PowerNotANumber",
+     withEnergy("<energy id=\"cpu\" cpus=\"2\">\n<opp freq=\"100\" mw=\"inf\"/>\n</energy>\n"),
+     "P:4: <opp> of energy table 'cpu' needs freq=\"...\" (a whole number) and mw=\"...\" (a "
+     "number of milliwatts)"},
+    {"EnergyOfNoDomain", withEnergy("<energy id=\"gpu\" cpus=\"1\"/>\n"),
+     "P:3: <energy id=\"gpu\"> names no <frequencies> table"},
+    {"EnergyTwice",
+     withEnergy("<energy id=\"cpu\" cpus=\"1\"><opp freq=\"100\" mw=\"1\"/><opp freq=\"200\" "
+                "mw=\"2\"/><opp freq=\"300\" mw=\"3\"/></energy>\n<energy id=\"cpu\" "
+                "cpus=\"1\"/>\n"),
+     "P:4: energy table 'cpu' is defined twice (first on line 3)"},
+    {"EnergyWithoutCpus", withEnergy("<energy id=\"cpu\">\n</energy>\n"),
+     "P:3: energy table 'cpu' needs cpus=\"N\", the number of CPUs of the domain (1..1024)"},
     // Each node was compared with every node before it: half a minute for 50,000.
     {"TwinAmongFiftyThousandNodes", manyNodesAndATwin(50000),
      "P:50002: node 'k0' is defined twice (first on line 2)"},
@@ -64,6 +110,21 @@ INSTANTIATE_TEST_SUITE_P(Rows, BadProfileTest, testing::ValuesIn(kBadProfiles),
                              return info.param.name;
                          });
 
+// The example device's energy tables: one per CPU cluster and the GPU, an OPP per frequency.
+TEST(DeviceProfileTest, ExampleDeviceHasAnEnergyTablePerClusterAndTheGpu) {
+    const DeviceProfile& device = DeviceProfile::builtIn();
+    EXPECT_EQ((std::vector<std::string>{"cpu.little", "cpu.big", "gpu", "ddr"}),
+              device.frequencyDomains());
+    ASSERT_EQ(3u, device.energyTables().size());
+    for (const char* id : {"cpu.little", "cpu.big", "gpu"}) {
+        const EnergyTable* table = device.energyTable(id);
+        ASSERT_NE(nullptr, table) << id;
+        EXPECT_EQ(device.find(std::string(id) + ".min")->rule.steps.size(), table->opps.size());
+    }
+    EXPECT_EQ(nullptr, device.energyTable("ddr"));
+    EXPECT_EQ(4, device.energyTable("cpu.big")->cpus);
+}
+
 // Seconds of parse() of `text`; the best of `tries`.
 double parseSeconds(const std::string& text, int tries) {
     double best = 1e9;
@@ -72,8 +133,8 @@ double parseSeconds(const std::string& text, int tries) {
         DeviceProfile profile;
         std::string error;
         profile.parse(text, "P", &error);
-        best = std::min(best, std::chrono::duration<double>(std::chrono::steady_clock::now() -
-                                                            start).count());
+        best = std::min(
+            best, std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count());
     }
     return best;
 }

@@ -27,6 +27,24 @@ TEST(TraceParserTest, CallsTheExampleMinuteLacksParse) {
     EXPECT_EQ(250, calls[2].sleepMs);
 }
 
+// A load line: the domains it names with their loads, at its time.
+TEST(TraceParserTest, LoadLineNamesDomainsAndShares) {
+    std::vector<TraceCall> calls;
+    std::string error;
+    ASSERT_EQ(0, TraceParser::parseText("@4000 load cpu.little=0.35 cpu.big=1 gpu=.5 ddr=0\n",
+                                        "t.trace", &calls, &error))
+        << error;
+    ASSERT_EQ(1u, calls.size());
+    EXPECT_EQ(TraceCall::Kind::Load, calls[0].kind);
+    EXPECT_EQ(4000, calls[0].atMs);
+    ASSERT_EQ(4u, calls[0].loads.size());
+    EXPECT_EQ("cpu.little", calls[0].loads[0].domain);
+    EXPECT_DOUBLE_EQ(0.35, calls[0].loads[0].u);
+    EXPECT_DOUBLE_EQ(1, calls[0].loads[1].u);
+    EXPECT_DOUBLE_EQ(0.5, calls[0].loads[2].u);
+    EXPECT_DOUBLE_EQ(0, calls[0].loads[3].u);
+}
+
 // A call with `n` pairs, tags or payload ints: "setconfig 1 2=1 2=1 ...", "getconfig 22 22 ...",
 // "event 4099 0 0 ...".
 std::string longCall(const std::string& verb, int n) {
@@ -92,6 +110,17 @@ TEST(TraceParserTest, BadLineNamesFileAndLine) {
         {longCall("getconfig", 1025),
          "minute.trace:2: 'getconfig' takes 1..1024 argument(s), got 1025"},
         {longCall("event", 64), "minute.trace:2: 'event' takes 1..64 argument(s), got 65"},
+        // Loads: a share of the domain's top capacity, written as a plain decimal.
+        {"load cpu.big=1.5", "minute.trace:2: load '1.5' of cpu.big is not a number in [0, 1]"},
+        {"load cpu.big=-0.1", "minute.trace:2: load '-0.1' of cpu.big is not a number in [0, 1]"},
+        {"load cpu.big=nan", "minute.trace:2: load 'nan' of cpu.big is not a number in [0, 1]"},
+        {"load cpu.big=1e-3", "minute.trace:2: load '1e-3' of cpu.big is not a number in [0, 1]"},
+        {"load cpu.big=.", "minute.trace:2: load '.' of cpu.big is not a number in [0, 1]"},
+        {"load cpu.big", "minute.trace:2: expected <domain>=<load>, got 'cpu.big'"},
+        {"load =0.5", "minute.trace:2: expected <domain>=<load>, got '=0.5'"},
+        {"load", "minute.trace:2: 'load' takes 1..64 argument(s), got 0"},
+        {"load gpu=0.1 gpu=0.2", "minute.trace:2: load line names gpu twice"},
+        {"lod gpu=0.1", "minute.trace:2: unknown call 'lod'; did you mean 'load'?"},
     };
     for (const auto& row : rows) {
         std::vector<TraceCall> calls;

@@ -1,8 +1,10 @@
 #!/usr/bin/env python3
 """The replay's HTML report as a person sees it: replays the example minute with --report, loads
-the report in headless chromium, and checks that every plot was drawn: the expected number of
-plots and step lines, each plot area holding drawn pixels in the screenshot, and nothing on the
-browser console. Exits 77 (skipped) when chromium is not installed.
+the report in headless chromium, and checks that every plot was drawn by the inlined plotting
+library: the expected number of plots and step lines, each with its unit on the value axis,
+ticks in seconds on the time axis and no colour twice, each plot area holding drawn pixels in the
+screenshot, and nothing on the browser console. Exits 77 (skipped) when chromium is not
+installed.
 
     report_in_browser.py VELMORA_REPLAY TRACE OUT_DIR [SCREENSHOT_COPY]
 """
@@ -16,8 +18,13 @@ import subprocess
 import sys
 import zlib
 
-# Plots of the report and their step lines for the default node map (HtmlReport::groups()).
-EXPECTED_SERIES = [2, 2, 2, 1, 2, 1, 9, 1]
+# Plots of the report, their step lines and units for the default node map (HtmlReport::groups()),
+# then the energy model's: per domain with an energy table (the example device's clusters and
+# GPU) its effective and needed frequency, and its power with and without limits.
+EXPECTED_SERIES = [2, 2, 2, 1, 2, 1, 9, 1] + [2, 2] * 3
+EXPECTED_UNITS = (["MHz", "MHz", "MHz", "MHz", "\u00b0C", "mW", "level", "boosted threads"] +
+                  ["MHz", "mW"] * 3)
+MIN_TIME_TICKS = 4
 MIN_DRAWN_PIXELS = 150  # saturated pixels per plot: a step line across the plot has far more
 WIDTH = 1100
 
@@ -109,8 +116,11 @@ def main():
     plots = json.loads(html.unescape(found.group(1)))
     series = [plot["series"] for plot in plots]
     assert series == EXPECTED_SERIES, "plots and lines: %s" % series
+    assert [plot["ylabel"] for plot in plots] == EXPECTED_UNITS, plots
     for plot in plots:
-        assert plot["w"] > 500 and plot["h"] > 100 and plot["length"] > 0, plot
+        assert plot["w"] > 500 and plot["h"] > 100 and plot["rows"] >= 2, plot
+        assert plot["colours"] == plot["series"], "a colour repeats: %s" % plot
+        assert plot["xticks"] >= MIN_TIME_TICKS, "too few time ticks: %s" % plot
 
     height = int(max(p["y"] + p["h"] for p in plots)) + 40
     shot = os.path.join(out_dir, "report.png")

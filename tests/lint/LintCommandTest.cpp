@@ -2,6 +2,7 @@
 // findings in line order, and usage errors.
 #include <gtest/gtest.h>
 
+#include <fstream>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -121,7 +122,16 @@ TEST(LintCommandTest, UsageErrorsFailWithAMessage) {
         // A configuration given as the device profile.
         {{"--device", config, config},
          "velmora-lint: " + config + ":1: the top-level element must be <device>"},
+        // A profile whose energy table lists an OPP twice.
+        {{"--device", dir + "/twin-opp.xml", config},
+         "velmora-lint: " + dir +
+             "/twin-opp.xml:4: OPP 200 of energy table 'cpu' is listed twice (first on line 3)"},
     };
+    std::ofstream(dir + "/twin-opp.xml")
+        << "<device>\n<frequencies id=\"cpu\">100 200</frequencies>\n"
+           "<energy id=\"cpu\" cpus=\"1\"><opp freq=\"100\" mw=\"1\"/><opp freq=\"200\" "
+           "mw=\"2\"/>\n<opp freq=\"200\" mw=\"2\"/></energy>\n"
+           "<node key=\"cpu.min\" kind=\"floor\" path=\"x\"/>\n</device>\n";
     for (const auto& row : rows) {
         std::ostringstream out;
         std::ostringstream err;

@@ -181,5 +181,30 @@ TEST(ImportCommandTest, RejectsBadInput) {
     }
 }
 
+// A trace that is there may hold the user's edits: kept unless --force, replaced whole with it.
+TEST(ImportCommandTest, KeepsAnExistingTraceUnlessForced) {
+    const std::string dir = hosttest::makeScratchDir("logcat-force");
+    hosttest::writeFile(dir + "/device.log", threadtimeLog({{7, kEvent}}));
+    hosttest::writeFile(dir + "/out.trace", "@0 event 4116 0 msg=\"pid=42|tid=43\"  # edited\n");
+    const std::vector<std::pair<std::vector<std::string>, int>> rows = {
+        {{dir + "/device.log", "-o", dir + "/out.trace"}, LogcatImportCommand::kBadInput},
+        {{"--force", dir + "/device.log", "-o", dir + "/out.trace"}, LogcatImportCommand::kOk}};
+    for (const auto& row : rows) {
+        std::ostringstream out, err;
+        EXPECT_EQ(row.second, LogcatImportCommand::run(row.first, out, err)) << err.str();
+        const std::string trace = hosttest::readFile(dir + "/out.trace");
+        if (row.second == LogcatImportCommand::kBadInput) {
+            EXPECT_EQ("velmora-import-logcat: " + dir +
+                          "/out.trace exists and is kept (it may hold your edits); --force "
+                          "overwrites it\n",
+                      err.str());
+            EXPECT_NE(std::string::npos, trace.find("pid=42|tid=43"));
+        } else {
+            EXPECT_NE(std::string::npos, trace.find("event 4099 0")) << trace;
+            EXPECT_EQ("<missing>", hosttest::readFile(dir + "/out.trace.partial"));
+        }
+    }
+}
+
 }  // namespace
 }  // namespace velmora

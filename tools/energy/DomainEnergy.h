@@ -15,8 +15,10 @@ namespace velmora {
 // The effective frequency and power of a domain from `us` on, until the next point.
 struct EnergyPoint {
     int64_t us = 0;
-    long long freq = 0;
+    long long freq = 0;     // the effective OPP
+    double neededFreq = 0;  // u x top: what the load needs; above `freq` while starved
     double mw = 0;
+    double unlimitedMw = 0;  // the power with no floor and no cap
 };
 
 struct DomainEnergy {

@@ -106,15 +106,18 @@ DomainEnergy EnergyModel::runDomain(const EnergyTable& table, const InsightResul
         if (OppChoice::saturated(table, opp, limits.top, u))
             out.saturatedUs += dt;
         residency[opp] += dt;
-        if (out.series.empty() || out.series.back().freq != table.opps[opp].freq ||
-            out.series.back().mw != mw)
-            out.series.push_back({t, table.opps[opp].freq, mw});
 
         const OppChoice::Limits unlimited{lowest, highest, limits.top, limits.governor};
         const size_t freeOpp = OppChoice::resolve(table, unlimited, u);
-        freeMJ += mJ(OppChoice::powerMw(table, freeOpp, limits.top, u), dt);
+        const double freeMw = OppChoice::powerMw(table, freeOpp, limits.top, u);
+        freeMJ += mJ(freeMw, dt);
         if (OppChoice::saturated(table, freeOpp, limits.top, u))
             freeSaturatedUs += dt;
+        const EnergyPoint point{t, table.opps[opp].freq, u * limits.top, mw, freeMw};
+        if (out.series.empty() || out.series.back().freq != point.freq ||
+            out.series.back().neededFreq != point.neededFreq || out.series.back().mw != mw ||
+            out.series.back().unlimitedMw != freeMw)
+            out.series.push_back(point);
 
         if (floorHolder != "initial" && limits.floor > lowest) {
             const OppChoice::Limits floorless{lowest, limits.cap, limits.top, limits.governor};

@@ -27,8 +27,8 @@ std::string EnergySummary::text(const std::vector<DomainEnergy>& energy, int64_t
     if (energy.empty())
         return "no load in the trace: no energy estimate\n";
     std::string out =
-        "energy estimate (the device profile's energy tables, the trace's load; limits: what "
-        "the floors and caps added)\n";
+        "energy estimate (energy tables x the trace's load; limits: what floors and caps "
+        "changed)\n";
     char line[512];
     snprintf(line, sizeof(line), "%-14s %12s %12s %12s %12s  %s\n", "domain", "mJ", "saturated ms",
              "limits mJ", "limits sat ms", "effective frequency (most time)");
@@ -49,7 +49,7 @@ std::string EnergySummary::text(const std::vector<DomainEnergy>& energy, int64_t
         std::string holders;
         for (size_t i = 0; i < domain.floorHoldersMJ.size() && i < kTopHolders; ++i) {
             char entry[256];
-            snprintf(entry, sizeof(entry), "%s%s %.1f mJ", i == 0 ? "" : ", ",
+            snprintf(entry, sizeof(entry), "%s%s (%.1f mJ)", i == 0 ? "" : ", ",
                      domain.floorHoldersMJ[i].first.c_str(), domain.floorHoldersMJ[i].second);
             holders += entry;
         }

@@ -1,23 +1,15 @@
 #include "tools/insight/HtmlReport.h"
 
-#include <algorithm>
 #include <cstdio>
 #include <fstream>
 #include <sstream>
 
-#include "host/record/Timeline.h"
 #include "tools/insight/InsightSummary.h"
+#include "tools/insight/ReportScripts.h"
 
 namespace velmora {
 
 namespace {
-
-constexpr double kPlotWidth = 960;
-constexpr double kPlotHeight = 150;
-constexpr double kLeft = 90;  // room for the value labels
-constexpr double kTop = 8;
-constexpr const char* kColours[] = {"#1f6fb4", "#d9480f", "#2b8a3e", "#862e9c",
-                                    "#e67700", "#0b7285", "#c2255c", "#5c940d"};
 
 std::string esc(const std::string& in) {
     std::string out;
@@ -42,13 +34,31 @@ std::string esc(const std::string& in) {
     return out;
 }
 
+// A JavaScript string literal that is safe inside a <script> element.
+std::string jsString(const std::string& in) {
+    std::string out = "\"";
+    for (unsigned char c : in) {
+        if (c == '"' || c == '\\') {
+            out += '\\';
+            out += static_cast<char>(c);
+        } else if (c < 0x20 || c == '<' || c == '>' || c == '&') {
+            char buf[8];
+            snprintf(buf, sizeof(buf), "\\u%04x", c);
+            out += buf;
+        } else {
+            out += static_cast<char>(c);
+        }
+    }
+    return out + "\"";
+}
+
 std::string num(double v) {
     char buf[32];
     snprintf(buf, sizeof(buf), "%.1f", v);
     return buf;
 }
 
-std::string label(double v) {
+std::string exact(double v) {
     char buf[32];
     snprintf(buf, sizeof(buf), "%.10g", v);
     return buf;
@@ -62,69 +72,40 @@ std::string spanFill(const std::string& category) {
     return "rgba(11,114,133,0.10)";  // timed actions
 }
 
-// One group's step plot: a path per node, spans shaded behind, the value range on the left.
-void plot(std::ostream& out, const HtmlReport::Group& group, const InsightResult& result) {
-    std::vector<const NodeInsight*> nodes;
-    double lo = 0, hi = 0;
+// The shaded spans, for the page's script: [begin s, end s, fill, name].
+void spans(std::ostream& out, const InsightResult& result) {
+    out << "<script>velmoraReport.spans=[";
     bool first = true;
-    for (const auto& key : group.keys) {
-        const NodeInsight* node = result.node(key);
-        if (node == nullptr || !node->numeric)
-            continue;
-        nodes.push_back(node);
-        for (const auto& segment : node->segments) {
-            double v = 0;
-            parseNodeNumber(segment.value, &v);
-            lo = first || v < lo ? v : lo;
-            hi = first || v > hi ? v : hi;
-            first = false;
-        }
-    }
-    if (nodes.empty())
-        return;
-    if (hi == lo) {
-        hi += 1;
-        lo -= 1;
-    }
-    const double end = std::max<double>(1.0, static_cast<double>(result.endUs));
-    auto x = [&](int64_t us) { return kLeft + (kPlotWidth - kLeft - 10) * (us / end); };
-    auto y = [&](double v) { return kTop + (kPlotHeight - 2 * kTop) * (1 - (v - lo) / (hi - lo)); };
-    out << "<h3>" + esc(group.title) + "</h3>\n<svg class=\"plot\" width=\"" + num(kPlotWidth) +
-               "\" height=\"" + num(kPlotHeight) + "\" data-series=\"" +
-               std::to_string(nodes.size()) + "\">\n";
-    out << "<rect class=\"frame\" x=\"" + num(kLeft) + "\" y=\"" + num(kTop) + "\" width=\"" +
-               num(kPlotWidth - kLeft - 10) + "\" height=\"" + num(kPlotHeight - 2 * kTop) +
-               "\"/>\n";
     for (const auto& span : result.spans) {
         if (span.category == "probe" || span.category == "memlat")
             continue;  // too many and too short to shade; the probe plot shows them
-        out << "<rect x=\"" + num(x(span.beginUs)) + "\" y=\"" + num(kTop) + "\" width=\"" +
-                   num(std::max(1.0, x(span.endUs) - x(span.beginUs))) + "\" height=\"" +
-                   num(kPlotHeight - 2 * kTop) + "\" fill=\"" + spanFill(span.category) +
-                   "\"><title>" + esc(span.name) + "</title></rect>\n";
+        out << (first ? "" : ",") << "[" << exact(span.beginUs / 1e6) << ","
+            << exact(span.endUs / 1e6) << "," << jsString(spanFill(span.category)) << ","
+            << jsString(span.name) << "]";
+        first = false;
     }
-    out << "<text x=\"4\" y=\"" + num(y(hi) + 4) + "\">" + label(hi) + "</text><text x=\"4\" y=\"" +
-               num(y(lo)) + "\">" + label(lo) + "</text><text x=\"" + num(kPlotWidth - 60) +
-               "\" y=\"" + num(kPlotHeight) + "\">" + label(result.endUs / 1e6) + " s</text>\n";
-    for (size_t i = 0; i < nodes.size(); ++i) {
-        // One step per change: written as it goes, a long replay's path is never one string.
-        out << "<path class=\"series\" stroke=\"" << kColours[i % 8] << "\" d=\"";
-        const auto& segments = nodes[i]->segments;
-        for (size_t s = 0; s < segments.size(); ++s) {
-            double v = 0;
-            parseNodeNumber(segments[s].value, &v);
-            const double from = x(std::min(segments[s].fromUs, result.endUs));
-            const double to = x(s + 1 < segments.size() ? segments[s + 1].fromUs : result.endUs);
-            out << (s == 0 ? "M" : "L") << num(from) << " " << num(y(v)) << "H" << num(to);
-        }
-        out << "\"><title>" + esc(nodes[i]->key) + "</title></path>\n";
+    out << "];</script>\n";
+}
+
+// One plot: its title, the box the script draws into, its legend line, and its data.
+void plot(std::ostream& out, size_t index, const ReportPlot& plot, const InsightResult& result) {
+    const std::string id = std::to_string(index);
+    out << "<h3>" + esc(plot.title()) + " (" + esc(plot.unit()) +
+               ")</h3>\n<div class=\"plot\" id=\"plot" + id + "\" data-series=\"" +
+               std::to_string(plot.series().size()) + "\"></div><div class=\"legend\" id=\"legend" +
+               id + "\"></div>\n";
+    out << "<script>velmoraReport.plot(" + id + ",{unit:" + jsString(plot.unit()) + ",labels:[";
+    for (size_t i = 0; i < plot.series().size(); ++i) {
+        out << (i ? "," : "") << jsString(plot.series()[i].name);
     }
-    out << "</svg>\n<p class=\"legend\">";
-    for (size_t i = 0; i < nodes.size(); ++i) {
-        out << "<span style=\"color:" + std::string(kColours[i % 8]) + "\">&#9632; " +
-                   esc(nodes[i]->key) + "</span> ";
+    out << "],colors:[";
+    for (size_t i = 0; i < plot.series().size(); ++i) {
+        out << (i ? "," : "") << jsString(ReportPlot::colour(i));
     }
-    out << "</p>\n";
+    const auto range = plot.valueRange();
+    out << "],range:[" << exact(range.first) << "," << exact(range.second) << "]},";
+    plot.writeRows(out, result.endUs);
+    out << ");</script>\n";
 }
 
 std::string residencyBars(const InsightResult& result) {
@@ -146,40 +127,46 @@ std::string residencyBars(const InsightResult& result) {
 
 const char* kStyle =
     "body{font:13px sans-serif;margin:16px;color:#222;background:#fff}"
-    "h1{font-size:20px}h2{font-size:16px;margin-top:24px}h3{font-size:13px;margin:10px 0 2px}"
-    "svg.plot{display:block;background:#fff}svg .frame{fill:none;stroke:#bbb}"
-    "svg .series{fill:none;stroke-width:2}svg text{font-size:11px;fill:#555}"
-    ".legend{margin:2px 0 0 90px}table{border-collapse:collapse}"
+    "h1{font-size:20px}h2{font-size:16px;margin-top:24px}h3{font-size:13px;margin:14px 0 2px}"
+    ".plot{width:980px;height:190px}.legend{min-height:16px;margin:2px 0 0 70px;font-size:12px}"
+    ".legend span{margin-right:6px}.dygraph-axis-label{font-size:11px;color:#555}"
+    ".dygraph-label{font-size:11px;color:#333}table{border-collapse:collapse}"
     "td,th{border-bottom:1px solid #eee;padding:2px 8px;text-align:left;vertical-align:top}"
-    ".bar{white-space:nowrap}.bar span{display:inline-block;height:9px;background:#1f6fb4;"
+    ".bar{white-space:nowrap}.bar span{display:inline-block;height:9px;background:#1f77b4;"
     "margin-right:6px}.warn{color:#b00}";
-
-// Measures the plots once laid out, for the browser check: count, size, drawn length.
-const char* kSelfCheck =
-    "window.addEventListener('load',function(){var out=[];"
-    "document.querySelectorAll('svg.plot').forEach(function(s){var r=s.getBoundingClientRect();"
-    "var len=0;s.querySelectorAll('path.series').forEach(function(p){len+=p.getTotalLength();});"
-    "out.push({x:r.left+window.scrollX,y:r.top+window.scrollY,w:r.width,h:r.height,"
-    "series:s.querySelectorAll('path.series').length,length:len});});"
-    "document.body.setAttribute('data-plots',JSON.stringify(out));});";
 
 }  // namespace
 
 const std::vector<HtmlReport::Group>& HtmlReport::groups() {
     static const std::vector<Group> kGroups = {
-        {"CPU little cluster (kHz)", {"cpu.little.min", "cpu.little.max"}},
-        {"CPU big cluster (kHz)", {"cpu.big.min", "cpu.big.max"}},
-        {"GPU (Hz)", {"gpu.min", "gpu.max"}},
-        {"DDR floor (Hz)", {"ddr.min"}},
-        {"Thermal trip points (m\u00b0C)", {"ipa.switch_temp", "ipa.control_temp"}},
-        {"Thermal sustainable power (mW)", {"ipa.sustainable_power"}},
-        {"Scheduler groups (level)",
+        // The device writes CPU frequencies in kHz, GPU and DDR ones in Hz, temperatures in
+        // millidegrees.
+        {"CPU little cluster", "MHz", 1e3, {"cpu.little.min", "cpu.little.max"}},
+        {"CPU big cluster", "MHz", 1e3, {"cpu.big.min", "cpu.big.max"}},
+        {"GPU", "MHz", 1e6, {"gpu.min", "gpu.max"}},
+        {"DDR floor", "MHz", 1e6, {"ddr.min"}},
+        {"Thermal trip points", "\u00b0C", 1e3, {"ipa.switch_temp", "ipa.control_temp"}},
+        {"Thermal sustainable power", "mW", 1, {"ipa.sustainable_power"}},
+        {"Scheduler groups",
+         "level",
+         1,
          {"sched.group.hmp", "sched.group.boost", "sched.group.vip", "sched.group.top_app",
           "sched.group.root", "sched.group.foreground", "sched.group.system_background",
           "sched.group.key_background", "sched.group.background"}},
-        {"Probe (boosted threads)", {"probe.threads"}},
+        {"Probe", "boosted threads", 1, {"probe.threads"}},
     };
     return kGroups;
+}
+
+std::vector<ReportPlot> HtmlReport::plots(const InsightResult& result) {
+    std::vector<ReportPlot> out;
+    for (const auto& group : groups()) {
+        ReportPlot plot =
+            ReportPlot::fromNodes(group.title, group.unit, group.divisor, group.keys, result);
+        if (!plot.empty())
+            out.push_back(std::move(plot));
+    }
+    return out;
 }
 
 std::string HtmlReport::html(const InsightResult& result) {
@@ -189,22 +176,33 @@ std::string HtmlReport::html(const InsightResult& result) {
 }
 
 void HtmlReport::write(const InsightResult& result, std::ostream& out) {
+    write(result, plots(result), out);
+}
+
+void HtmlReport::write(const InsightResult& result, const std::vector<ReportPlot>& plots,
+                       std::ostream& out) {
     out << "<!DOCTYPE html>\n<html><head><meta charset=\"utf-8\"><title>velmora replay "
-           "report</title>\n<style>" +
-               std::string(kStyle) + "</style></head>\n<body>\n<h1>Replay report</h1>\n<p>" +
-               num(result.endUs / 1000.0) + " ms of trace, " + std::to_string(result.callCount) +
+           "report</title>\n<style>"
+        << ReportScripts::plottingStyle() << kStyle << "</style>\n<script>"
+        << ReportScripts::plotting() << "</script>\n<script>" << ReportScripts::page()
+        << "</script>\n</head>\n<body>\n<h1>Replay report</h1>\n<p>" + num(result.endUs / 1000.0) +
+               " ms of trace, " + std::to_string(result.callCount) +
                " calls. Shaded: <span style=\"background:" + spanFill("scene") +
                "\">scenes</span> <span style=\"background:" + spanFill("onoff") +
                "\">on/off commands</span> <span style=\"background:" + spanFill("action") +
-               "\">timed actions</span>.</p>\n<h2>Left applied</h2>\n<ul>\n";
+               "\">timed actions</span>. Drag across a plot to zoom into a stretch of the trace "
+               "(every "
+               "plot follows), double-click to zoom out; the line under a plot shows the values "
+               "under the pointer.</p>\n<h2>Left applied</h2>\n<ul>\n";
     for (const auto& warning : result.warnings) {
         out << "<li class=\"warn\">" + esc(warning.message) + "</li>\n";
     }
     if (result.warnings.empty())
         out << "<li>nothing</li>\n";
     out << "</ul>\n<h2>Nodes over time</h2>\n";
-    for (const auto& group : groups()) {
-        plot(out, group, result);
+    spans(out, result);
+    for (size_t i = 0; i < plots.size(); ++i) {
+        plot(out, i, plots[i], result);
     }
     out << "<h2>Final values and who holds them</h2>\n<table class=\"held\">\n"
            "<tr><th>node</th><th>final</th><th>held by</th><th>time at value</th></tr>\n";
@@ -214,16 +212,21 @@ void HtmlReport::write(const InsightResult& result, std::ostream& out) {
                    esc(InsightSummary::topResidency(node, result.endUs, 3)) + "</td></tr>\n";
     }
     out << "</table>\n<h2>Time at each value</h2>\n" + residencyBars(result);
-    out << "<script>" + std::string(kSelfCheck) + "</script>\n</body></html>\n";
+    out << "</body></html>\n";
 }
 
 bool HtmlReport::write(const InsightResult& result, const std::string& path, std::string* error) {
+    return write(result, plots(result), path, error);
+}
+
+bool HtmlReport::write(const InsightResult& result, const std::vector<ReportPlot>& plots,
+                       const std::string& path, std::string* error) {
     std::ofstream file(path, std::ios::trunc);
     if (!file) {
         *error = "cannot write " + path;
         return false;
     }
-    write(result, file);
+    write(result, plots, file);
     file.close();
     if (!file) {
         *error = "write failed: " + path;

@@ -2,6 +2,8 @@
 
 #include <fstream>
 
+#include "tools/energy/EnergyComparison.h"
+
 namespace velmora {
 
 namespace {
@@ -131,14 +133,33 @@ void InsightJson::comparison(const ReplayComparison& comparison, JsonStreamWrite
     }
     nlohmann::json divergence = nullptr;
     if (comparison.diverges()) {
-        divergence = {{"call", callJson(comparison.firstDivergentCall())},
+        divergence = {{"ms", ms(comparison.divergenceUs())},
+                      {"cause", comparison.timedFirst() ? "timed" : "call"},
+                      {"node", comparison.timedFirst() ? comparison.timedDivergence().node() : ""},
+                      {"call", callJson(comparison.firstDivergentCall())},
                       {"a", comparison.divergenceA()},
                       {"b", comparison.divergenceB()}};
     }
-    const nlohmann::json members = {{"config_a", comparison.labelA()},
-                                    {"config_b", comparison.labelB()},
-                                    {"first_divergence", divergence},
-                                    {"nodes", nodes}};
+    nlohmann::json members = {{"config_a", comparison.labelA()},
+                              {"config_b", comparison.labelB()},
+                              {"first_divergence", divergence},
+                              {"overridden_by", comparison.overrides()},
+                              {"nodes", nodes}};
+    // Per domain, what B costs against A; both runs replay one trace, so one has a domain when
+    // the other has.
+    if (!comparison.a().energy.empty()) {
+        nlohmann::json energy = nlohmann::json::object();
+        for (const auto& d :
+             EnergyComparison::deltas(comparison.a().energy, comparison.b().energy)) {
+            energy[d.id] = {{"a_mJ", d.aMJ},
+                            {"b_mJ", d.bMJ},
+                            {"delta_mJ", d.bMJ - d.aMJ},
+                            {"a_saturated_ms", ms(d.aSaturatedUs)},
+                            {"b_saturated_ms", ms(d.bSaturatedUs)},
+                            {"delta_saturated_ms", ms(d.bSaturatedUs - d.aSaturatedUs)}};
+        }
+        members["energy"] = energy;
+    }
     out.object(members, {{"a", [&] { summary(comparison.a(), out); }},
                          {"b", [&] { summary(comparison.b(), out); }}});
 }

@@ -26,7 +26,9 @@ struct HolderSegment {
     int64_t fromUs = 0;
     std::string value;
     std::string heldBy;  // "initial" when no request beats the node's initial value
-    int call = -1;       // index of the call during which it began, -1 for none
+    // Index of the call that made it, -1 for none: also for a change that fell due before the
+    // call's own time (a timer running out while the clock moved on to the call).
+    int call = -1;
 };
 
 struct NodeInsight {
@@ -48,6 +50,9 @@ struct SpanInsight {
     int64_t beginUs = 0;
     int64_t endUs = 0;
     bool open = false;  // still applied at the end of the trace
+    // The call that applied it, when known, and whether it ended by running out its duration.
+    CallRef call;
+    bool expired = false;
 };
 
 struct StuckWarning {

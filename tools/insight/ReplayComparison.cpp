@@ -19,7 +19,11 @@ std::string msText(int64_t us) {
 
 ReplayComparison::ReplayComparison(std::string labelA, InsightResult a, std::string labelB,
                                    InsightResult b)
-    : mLabelA(std::move(labelA)), mLabelB(std::move(labelB)), mA(std::move(a)), mB(std::move(b)) {
+    : mLabelA(std::move(labelA)),
+      mLabelB(std::move(labelB)),
+      mA(std::move(a)),
+      mB(std::move(b)),
+      mTimed(mA, mB) {
     for (const auto& nodeA : mA.nodes) {
         const NodeInsight* nodeB = mB.node(nodeA.key);
         if (nodeB == nullptr)
@@ -48,16 +52,30 @@ ReplayComparison::ReplayComparison(std::string labelA, InsightResult a, std::str
         mFirst = mB.divergentCall.index;
 }
 
+bool ReplayComparison::timedFirst() const {
+    return mTimed.found() && mTimed.timed() && (mFirst < 0 || mTimed.us() < mB.divergentCall.us);
+}
+
+int64_t ReplayComparison::divergenceUs() const {
+    if (timedFirst())
+        return mTimed.us();
+    return mFirst >= 0 ? mB.divergentCall.us : -1;
+}
+
 const CallRef& ReplayComparison::firstDivergentCall() const {
     static const CallRef kNone;
-    return mFirst >= 0 ? mB.divergentCall : kNone;
+    return mFirst >= 0 && !timedFirst() ? mB.divergentCall : kNone;
 }
 
 std::string ReplayComparison::divergenceA() const {
+    if (timedFirst())
+        return mTimed.node() + " " + mTimed.a();
     return mFirst >= 0 ? whatCallDid(mA, mA.callStatus[mFirst]) : "";
 }
 
 std::string ReplayComparison::divergenceB() const {
+    if (timedFirst())
+        return mTimed.node() + " " + mTimed.b();
     return mFirst >= 0 ? whatCallDid(mB, mB.divergentStatus) : "";
 }
 
@@ -74,19 +92,39 @@ std::string ReplayComparison::whatCallDid(const InsightResult& run, int status) 
 }
 
 std::string ReplayComparison::text() const {
-    std::string out = "comparison: A = " + mLabelA + ", B = " + mLabelB + "\n";
-    if (mFirst < 0) {
-        out += "the runs never diverge: every call had the same status and node changes\n";
-    } else {
+    return headline() + divergenceText() + nodesText();
+}
+
+std::string ReplayComparison::headline() const {
+    return "comparison: A = " + mLabelA + ", B = " + mLabelB + "\n";
+}
+
+std::string ReplayComparison::divergenceText() const {
+    std::string out;
+    if (timedFirst()) {
+        out += "first divergence at " + msText(mTimed.us()) + " ms, a timed change of " +
+               mTimed.node() + "\n";
+        out += "  A: " + mTimed.a() + "\n  B: " + mTimed.b() + "\n";
+    } else if (mFirst >= 0) {
         const CallRef& call = firstDivergentCall();
         out += "first divergence at call " + std::to_string(call.index + 1) + " [" +
                msText(call.us) + " ms] " + call.where + ": " + call.text + "\n";
         out += "  A: status " + divergenceA() + "\n  B: status " + divergenceB() + "\n";
+    } else {
+        out += "the runs never diverge: every call had the same status and node changes\n";
+        if (!mOverrides.empty()) {
+            out += "the configurations differ, but these trace lines override the difference:\n";
+            for (const auto& line : mOverrides)
+                out += "  " + line + "\n";
+        }
     }
-    if (mNodes.empty()) {
-        out += "no node differs\n";
-        return out;
-    }
+    return out;
+}
+
+std::string ReplayComparison::nodesText() const {
+    if (mNodes.empty())
+        return "no node differs\n";
+    std::string out;
     char line[512];
     snprintf(line, sizeof(line), "%-26s %14s %14s  %s\n", "node", "final A", "final B",
              "held by A / B; time at value (ms) A -> B");

@@ -109,7 +109,7 @@ void ReplayInsight::endCall(int status) {
         } else if (isOnOff(cmdId) && off && mOnOff.count(cmdId) != 0) {
             const Applied applied = mOnOff[cmdId];
             mOnOff.erase(cmdId);
-            closeSpanLocked("onoff", applied.name, applied.beginUs, now, false);
+            closeSpanLocked("onoff", applied.name, applied.beginUs, now, applied.call, false);
         }
         if (on)
             mSwitchedOff.erase(cmdId);
@@ -144,7 +144,7 @@ void ReplayInsight::onCommandApplied(int cmdId, const std::string& category,
         if (durationMs <= 0)
             return;  // applied again while applied: one span
         // A timed action re-armed: the span so far ends, a new one starts.
-        closeSpanLocked(category, it->second.name, it->second.beginUs, now, false);
+        closeSpanLocked(category, it->second.name, it->second.beginUs, now, it->second.call, false);
         mApplied.erase(it);
     }
     const std::string spanName = std::to_string(cmdId) + (name.empty() ? "" : " " + name);
@@ -152,13 +152,13 @@ void ReplayInsight::onCommandApplied(int cmdId, const std::string& category,
 }
 
 void ReplayInsight::onCommandWithdrawn(int cmdId, bool expired) {
-    (void)expired;
     const int64_t now = mClock.nowUs();
     std::lock_guard<std::mutex> lock(mLock);
     auto it = mApplied.find(cmdId);
     if (it == mApplied.end())
         return;
-    closeSpanLocked(it->second.category, it->second.name, it->second.beginUs, now, false);
+    closeSpanLocked(it->second.category, it->second.name, it->second.beginUs, now, it->second.call,
+                    expired);
     mApplied.erase(it);
 }
 
@@ -173,7 +173,7 @@ void ReplayInsight::onProbeBoost(unsigned int tid, bool boosted) {
     }
     auto it = mBoosts.find(tid);
     if (it != mBoosts.end()) {
-        closeSpanLocked("probe", it->second.name, it->second.beginUs, now, false);
+        closeSpanLocked("probe", it->second.name, it->second.beginUs, now, it->second.call, false);
         mBoosts.erase(it);
     }
 }
@@ -217,13 +217,16 @@ void ReplayInsight::onNodeResolved(const std::string& key, const std::string& va
     track.value = value;
     track.holder = holder;
     // Every change gets a segment, also several in one instant: they match the timeline's
-    // samples one to one.
-    track.segments.push_back({now, value, holder, mInCall ? mCallRef.index : -1});
+    // samples one to one. A change that falls due while the clock moves on to the call's time
+    // (a timer running out on the way) is the timer's, not the call's.
+    const bool byCall = mInCall && now >= mCallRef.us;
+    track.segments.push_back({now, value, holder, byCall ? mCallRef.index : -1});
 }
 
 void ReplayInsight::closeSpanLocked(const std::string& category, const std::string& name,
-                                    int64_t beginUs, int64_t endUs, bool open) {
-    mSpans.push_back({"", category, name, beginUs, endUs, open});  // track: at the end
+                                    int64_t beginUs, int64_t endUs, const CallRef& call,
+                                    bool expired) {
+    mSpans.push_back({"", category, name, beginUs, endUs, false, call, expired});  // track: later
 }
 
 }  // namespace velmora

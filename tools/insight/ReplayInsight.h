@@ -92,7 +92,7 @@ private:
 
     CallRef currentCallLocked() const;  // REQUIRES: mLock held
     void closeSpanLocked(const std::string& category, const std::string& name, int64_t beginUs,
-                         int64_t endUs, bool open);
+                         int64_t endUs, const CallRef& call, bool expired);
     void stuckWarningsLocked(InsightResult* result) const;
 
     HostClock& mClock;

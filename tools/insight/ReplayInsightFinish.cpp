@@ -95,14 +95,16 @@ InsightResult ReplayInsight::finish() {
     }
     result.spans = std::move(mSpans);
     for (const auto& entry : mApplied) {
-        result.spans.push_back(
-            {"", entry.second.category, entry.second.name, entry.second.beginUs, end, true});
+        result.spans.push_back({"", entry.second.category, entry.second.name, entry.second.beginUs,
+                                end, true, entry.second.call});
     }
     for (const auto& entry : mOnOff) {
-        result.spans.push_back({"", "onoff", entry.second.name, entry.second.beginUs, end, true});
+        result.spans.push_back(
+            {"", "onoff", entry.second.name, entry.second.beginUs, end, true, entry.second.call});
     }
     for (const auto& entry : mBoosts) {
-        result.spans.push_back({"", "probe", entry.second.name, entry.second.beginUs, end, true});
+        result.spans.push_back(
+            {"", "probe", entry.second.name, entry.second.beginUs, end, true, entry.second.call});
     }
     for (auto& span : result.spans) {
         if (span.track.empty())

@@ -1,5 +1,8 @@
 #include "tools/logcat/LogcatImportCommand.h"
 
+#include <sys/stat.h>
+
+#include <cstdio>
 #include <fstream>
 #include <sstream>
 
@@ -15,7 +18,9 @@ constexpr const char* kUsage =
     "usage: velmora-import-logcat LOG -o TRACE [--load FILE]\n"
     "  LOG        text of adb logcat (threadtime or time; year, epoch, monotonic, uid), at\n"
     "             most 256 MiB\n"
-    "  -o TRACE   the event trace to write, for velmora-replay\n"
+    "  -o TRACE   the event trace to write, for velmora-replay; an existing one is\n"
+    "             kept (it may hold your edits) unless --force is given\n"
+    "  --force    overwrite an existing TRACE\n"
     "  --load FILE  merge the load lines of scripts/record-load into the trace by time (the\n"
     "             log captured with -v epoch or -v monotonic, the clock the file names)\n"
     "  --version  print the version and exit\n"
@@ -62,6 +67,7 @@ int LogcatImportCommand::run(const std::vector<std::string>& args, std::ostream&
     std::string logPath;
     std::string tracePath;
     std::string loadPath;
+    bool force = false;
     for (size_t i = 0; i < args.size(); ++i) {
         if (args[i] == "-h" || args[i] == "--help") {
             out << kUsage;
@@ -71,7 +77,9 @@ int LogcatImportCommand::run(const std::vector<std::string>& args, std::ostream&
             out << "velmora-import-logcat " << VELMORA_VERSION << "\n";
             return kOk;
         }
-        if (args[i] == "-o" && i + 1 < args.size()) {
+        if (args[i] == "--force") {
+            force = true;
+        } else if (args[i] == "-o" && i + 1 < args.size()) {
             tracePath = args[++i];
         } else if (args[i] == "--load" && i + 1 < args.size()) {
             loadPath = args[++i];
@@ -85,6 +93,12 @@ int LogcatImportCommand::run(const std::vector<std::string>& args, std::ostream&
     if (logPath.empty() || tracePath.empty()) {
         err << kUsage;
         return kUsageError;
+    }
+    struct stat st {};
+    if (!force && stat(tracePath.c_str(), &st) == 0) {
+        err << "velmora-import-logcat: " << tracePath
+            << " exists and is kept (it may hold your edits); --force overwrites it\n";
+        return kBadInput;
     }
     const std::string refusal = InputFile::refusal(logPath);
     if (!refusal.empty()) {
@@ -109,10 +123,13 @@ int LogcatImportCommand::run(const std::vector<std::string>& args, std::ostream&
     if (!loadPath.empty() && !mergeLoad(loadPath, logPath, importer, &traceText, err)) {
         return kBadInput;
     }
-    std::ofstream trace(tracePath, std::ios::trunc);
+    // Written beside it and renamed: an existing trace is replaced whole or not at all.
+    const std::string partial = tracePath + ".partial";
+    std::ofstream trace(partial, std::ios::trunc);
     trace << traceText;
     trace.close();
-    if (!trace) {
+    if (!trace || rename(partial.c_str(), tracePath.c_str()) != 0) {
+        std::remove(partial.c_str());
         err << "velmora-import-logcat: " << tracePath << ": cannot be written\n";
         return kBadInput;
     }

@@ -3,22 +3,21 @@
 #include <tinyxml2.h>
 #include <unistd.h>
 
+#include <set>
+#include <vector>
+
+#include "tools/energy/EnergyComparison.h"
 #include "tools/insight/InsightJson.h"
 #include "tools/insight/ReplayComparison.h"
+#include "tools/replay/ComparedConfig.h"
 
 namespace velmora {
-
-namespace {
-
-constexpr const char* kConfigFile = "/xml/velmora_config_cust.xml";
-
-}  // namespace
 
 ComparisonRun::ComparisonRun(ReplayOptions options, std::string compareDir, FILE* out, FILE* err)
     : mOptions(std::move(options)), mCompareDir(std::move(compareDir)), mOut(out), mErr(err) {}
 
 std::string ComparisonRun::loadError(const std::string& dir) {
-    const std::string path = dir + kConfigFile;
+    const std::string path = dir + "/" + ComparedConfig::kConfigFile;
     if (access(path.c_str(), R_OK) != 0)
         return "no readable " + path;
     tinyxml2::XMLDocument doc;
@@ -35,12 +34,13 @@ int ComparisonRun::run() {
         fprintf(mErr, "velmora-replay: --compare needs a trace file\n");
         return ReplaySession::kBadInput;
     }
-    std::string error = loadError(mCompareDir);
+    const ComparedConfig configB(mCompareDir);
+    std::string error = configB.error().empty() ? loadError(configB.dir()) : configB.error();
     if (error.empty()) {
         // Well-formed XML can still fail the server's start-up (no start-up command 5376, say):
         // find that out now, not after run A has written its files.
         ReplayOptions trial = mOptions;
-        trial.configDirs = {mCompareDir};
+        trial.configDirs = {configB.dir()};
         trial.eventLogPath = "/dev/null";
         FILE* sink = fopen("/dev/null", "w");
         FILE* why = tmpfile();
@@ -83,16 +83,34 @@ int ComparisonRun::run() {
     a.fast = true;
     a.summaryJsonPath.clear();
     a.keepCallDigests = true;
-    ReplaySession sessionA(a, mOut, mErr);
+    // Run A's own output comes after the comparison (or not at all): it waits in a file.
+    FILE* outA = mCompareOnly ? fopen("/dev/null", "w") : tmpfile();
+    ReplaySession sessionA(a, outA != nullptr ? outA : mOut, mErr);
     const int resultA = sessionA.run();
-    if (resultA != ReplaySession::kOk)
+    auto printRunA = [&] {
+        if (outA == nullptr)
+            return;
+        if (!mCompareOnly) {
+            fprintf(mOut, "\nrun A:\n");
+            rewind(outA);
+            char buf[4096];
+            size_t n;
+            while ((n = fread(buf, 1, sizeof(buf), outA)) > 0)
+                fwrite(buf, 1, n, mOut);
+        }
+        fclose(outA);
+        outA = nullptr;
+    };
+    if (resultA != ReplaySession::kOk) {
+        printRunA();
         return resultA;
+    }
     const InsightResult insightA = sessionA.insight();
 
     ReplayOptions b = a;
     b.keepCallDigests = false;
     b.compareWithDigests = insightA.callDigests;
-    b.configDirs = {mCompareDir};
+    b.configDirs = {configB.dir()};
     b.writeFiles = false;
     b.eventLogPath = "/dev/null";
     b.quiet = true;
@@ -101,8 +119,10 @@ int ComparisonRun::run() {
     const int resultB = sessionB.run();
     if (quiet != nullptr)
         fclose(quiet);
-    if (resultB != ReplaySession::kOk)
+    if (resultB != ReplaySession::kOk) {
+        printRunA();
         return resultB;
+    }
 
     std::string labelA = mOptions.configDirs.empty() ? mOptions.tracePath : mOptions.configDirs[0];
     if (mOptions.configDirs.empty()) {
@@ -110,16 +130,44 @@ int ComparisonRun::run() {
         labelA = slash == std::string::npos ? "." : labelA.substr(0, slash);
     }
     ReplayComparison comparison(labelA, insightA, mCompareDir, sessionB.insight());
-    fprintf(mOut, "\n%s", comparison.text().c_str());
+    if (!comparison.diverges()) {
+        const std::set<int> differing =
+            ComparedConfig::differingCommands(configFileA(), configB.file());
+        if (!differing.empty())
+            comparison.setOverrides(ComparedConfig::overridingLines(mOptions.tracePath, differing));
+    }
+    // The cost first: what the change does to the energy and the starved time per domain.
+    fprintf(mOut, "%s",
+            (comparison.headline() +
+             EnergyComparison::text(comparison.a().energy, comparison.b().energy) +
+             comparison.divergenceText() + comparison.nodesText())
+                .c_str());
+    int status = ReplaySession::kOk;
     if (!mOptions.summaryJsonPath.empty()) {
         std::string why;
         if (!InsightJson::writeComparison(comparison, mOptions.summaryJsonPath, &why)) {
             fprintf(mErr, "velmora-replay: %s\n", why.c_str());
-            return ReplaySession::kSetupFailed;
+            status = ReplaySession::kSetupFailed;
+        } else {
+            fprintf(mOut, "comparison: %s\n", mOptions.summaryJsonPath.c_str());
         }
-        fprintf(mOut, "comparison: %s\n", mOptions.summaryJsonPath.c_str());
     }
-    return ReplaySession::kOk;
+    printRunA();
+    return status;
+}
+
+std::string ComparisonRun::configFileA() const {
+    std::vector<std::string> dirs = mOptions.configDirs;
+    if (dirs.empty()) {  // the session's default: the trace's directory
+        const size_t slash = mOptions.tracePath.find_last_of('/');
+        dirs.push_back(slash == std::string::npos ? "." : mOptions.tracePath.substr(0, slash));
+    }
+    for (const auto& dir : dirs) {
+        const std::string file = dir + "/" + ComparedConfig::kConfigFile;
+        if (access(file.c_str(), R_OK) == 0)
+            return file;
+    }
+    return "";
 }
 
 }  // namespace velmora

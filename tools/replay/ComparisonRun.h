@@ -1,8 +1,11 @@
-// velmora-replay --compare DIR_B: replays one trace twice in virtual time, under its own
-// configuration (A) and under the one in DIR_B (B), and reports what the change does: per node
-// the final value, its holder and the time at each value, and the first call after which the
-// device went different ways. The timeline and report are those of run A; --summary-json
-// receives the comparison.
+// velmora-replay --compare CONFIG_B: replays one trace twice in virtual time, under its own
+// configuration (A) and under CONFIG_B (a configuration file or a directory holding one,
+// ComparedConfig), and reports what the change does: first where the device went different ways
+// (a call, or a timed change such as an action expiring) and per node the final value, its holder
+// and the time at each value; then run A's own summary, unless only the comparison is asked for.
+// When the configurations differ and the runs do not, it names the trace lines that override the
+// difference. The timeline and report are those of run A; --summary-json receives the
+// comparison.
 //
 // Checks everything it will need before replaying: a configuration B that does not load, or an
 // output that cannot be written, ends the run with one message and exit status 2, with nothing
@@ -20,6 +23,9 @@ class ComparisonRun {
 public:
     ComparisonRun(ReplayOptions options, std::string compareDir, FILE* out, FILE* err);
 
+    // Print only the comparison, not run A's summary after it.
+    void setCompareOnly(bool only) { mCompareOnly = only; }
+
     // One of ReplaySession's exit codes.
     int run();
 
@@ -27,8 +33,12 @@ public:
     static std::string loadError(const std::string& dir);
 
 private:
+    // The configuration file run A uses: the first of its directories that has one.
+    std::string configFileA() const;
+
     ReplayOptions mOptions;
     std::string mCompareDir;
+    bool mCompareOnly = false;
     FILE* mOut;
     FILE* mErr;
 };

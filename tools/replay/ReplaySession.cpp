@@ -16,6 +16,7 @@
 #include "tools/common/InputFile.h"
 #include "tools/common/Spelling.h"
 #include "tools/energy/EnergyModel.h"
+#include "tools/energy/EnergyPlots.h"
 #include "tools/energy/EnergySummary.h"
 #include "tools/energy/LoadDomains.h"
 #include "tools/insight/HtmlReport.h"
@@ -181,6 +182,8 @@ std::string ReplaySession::commandName(int cmdId) const {
 }
 
 int ReplaySession::perform(const TraceCall& call) {
+    if (call.kind == TraceCall::Kind::Load)
+        return performLoad(call);
     CallRecord record;
     record.kind = call.kind == TraceCall::Kind::Event       ? CallRecord::Kind::Event
                   : call.kind == TraceCall::Kind::SetConfig ? CallRecord::Kind::SetConfig
@@ -205,6 +208,28 @@ int ReplaySession::perform(const TraceCall& call) {
     if (mInsight != nullptr)
         mInsight->endCall(status);
     return status;
+}
+
+int ReplaySession::performLoad(const TraceCall& call) {
+    // Not a host call: the server never sees it and the analysis need not. A load stamped at or
+    // before the time reached holds from there, without the hand-over to the probe worker that
+    // moving the clock costs; one ahead of it moves the clock like any "@".
+    HostClock& clock = HostEnvironment::get().clock();
+    if (call.atMs >= 0 && call.atMs < clock.nowMs()) {
+        fprintf(mErr,
+                "velmora-replay: %s:%d: warning: @%lld is before the time already reached "
+                "(%lld ms); the load holds from %lld ms\n",
+                call.file.c_str(), call.line, static_cast<long long>(call.atMs),
+                static_cast<long long>(clock.nowMs()), static_cast<long long>(clock.nowMs()));
+    }
+    if (call.atMs > clock.nowMs())
+        clock.advanceTo(call.atMs);
+    if (clock.interrupted())
+        return 0;
+    for (const auto& share : call.loads)
+        mLoads.set(clock.nowUs(), share.domain, share.u);
+    echo(call, "ok");
+    return 0;
 }
 
 int ReplaySession::performCall(const TraceCall& call) {
@@ -235,10 +260,7 @@ int ReplaySession::performCall(const TraceCall& call) {
             echo(call, "ok");
             return 0;
         case TraceCall::Kind::Load:
-            for (const auto& share : call.loads)
-                mLoads.set(env.clock().nowUs(), share.domain, share.u);
-            echo(call, "ok");
-            return 0;
+            return performLoad(call);
         case TraceCall::Kind::Event:
             status = mServer->velmoraEvent(call.id, call.hasMsg ? call.text.c_str() : nullptr,
                                            static_cast<unsigned int>(call.payload.size()),
@@ -362,6 +384,7 @@ int ReplaySession::replayInteractive() {
 }
 
 void ReplaySession::warnAboutCalls(const TraceSurvey& survey) {
+    warnAboutPlaceholders(survey);
     std::set<int> configured;
     VelmoraParser* parser = mServer->mPlatPtr != nullptr ? mServer->mPlatPtr->mParserPtr : nullptr;
     if (parser == nullptr) {
@@ -395,6 +418,23 @@ void ReplaySession::warnAboutCalls(const TraceSurvey& survey) {
                     guess.empty() ? "" : ("; did you mean '" + guess + "'?").c_str());
         }
     }
+}
+
+void ReplaySession::warnAboutPlaceholders(const TraceSurvey& survey) {
+    for (const auto& placeholder : survey.placeholders()) {
+        const bool probe = placeholder.cmdId == kCmdProbe;
+        fprintf(mErr,
+                "velmora-replay: %s: warning: unedited placeholder from the import, msg=\"%s\": "
+                "%s; fill in %s\n",
+                placeholder.where.c_str(), TraceSurvey::kPlaceholderMsg,
+                probe ? "the probe boosts no thread" : "the memory-latency event fails (status 3)",
+                probe ? "the pid and tid of the thread to probe"
+                      : "the pid and tid of the thread and its ratio_b= and ratio_l=");
+    }
+    const size_t more = survey.placeholderCount() - survey.placeholders().size();
+    if (more > 0)
+        fprintf(mErr, "velmora-replay: %s: warning: %zu more unedited placeholders\n",
+                mOptions.tracePath.c_str(), more);
 }
 
 void ReplaySession::waitForProbeBoosts() {
@@ -460,6 +500,13 @@ bool ReplaySession::checkWritable(const std::string& path, std::string* error) {
     return true;
 }
 
+bool ReplaySession::writeReport(std::string* error) const {
+    std::vector<ReportPlot> plots = HtmlReport::plots(mResult);
+    for (auto& plot : EnergyPlots::plots(mResult.energy))
+        plots.push_back(std::move(plot));
+    return HtmlReport::write(mResult, plots, mOptions.reportPath, error);
+}
+
 int ReplaySession::writeOutputs() {
     if (!mOptions.writeFiles)
         return kOk;
@@ -469,8 +516,7 @@ int ReplaySession::writeOutputs() {
          !env.timeline().writeChromeJson(mOptions.timelinePath, &error)) ||
         (!mOptions.summaryJsonPath.empty() &&
          !InsightJson::writeSummary(mResult, mOptions.summaryJsonPath, &error)) ||
-        (!mOptions.reportPath.empty() &&
-         !HtmlReport::write(mResult, mOptions.reportPath, &error))) {
+        (!mOptions.reportPath.empty() && !writeReport(&error))) {
         fprintf(mErr, "velmora-replay: %s\n", error.c_str());
         return kSetupFailed;
     }

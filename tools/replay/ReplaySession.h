@@ -82,6 +82,8 @@ public:
 
 private:
     int performCall(const TraceCall& call);
+    // A load line: what the energy model reads, at the time it names.
+    int performLoad(const TraceCall& call);
     int replayFile();
     // Reads the device profile into mProfile once (the example device's without --device).
     int loadProfile();
@@ -90,12 +92,17 @@ private:
     // configuration lacks, launch-policy names the server never asks for; once per command or
     // name, where it is first used.
     void warnAboutCalls(const TraceSurvey& survey);
+    // Warns once per placeholder the importer left unedited (the first few, then how many more),
+    // naming the line and what to fill in.
+    void warnAboutPlaceholders(const TraceSurvey& survey);
     void waitForProbeBoosts();
     // Removes the simulated device root when this session made it.
     void removeOwnedRoot();
     void echo(const TraceCall& call, const std::string& result);
     std::string commandName(int cmdId) const;
     int writeOutputs();
+    // The HTML report: the node plots, then the energy model's.
+    bool writeReport(std::string* error) const;
 
     ReplayOptions mOptions;
     FILE* mOut;

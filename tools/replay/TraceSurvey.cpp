@@ -1,5 +1,6 @@
 #include "tools/replay/TraceSurvey.h"
 
+#include "config/CommandIds.h"
 #include "tools/energy/LoadDomains.h"
 #include "tools/replay/TraceReader.h"
 
@@ -30,6 +31,12 @@ void TraceSurvey::add(const TraceCall& call) {
     const bool event = call.kind == TraceCall::Kind::Event;
     if (!event && call.kind != TraceCall::Kind::Policy)
         return;
+    if (event && (call.id == kCmdProbe || call.id == kCmdMemLatencyRatio) && call.hasMsg &&
+        call.text == kPlaceholderMsg) {
+        if (mPlaceholders.size() < kKeptPlaceholders)
+            mPlaceholders.push_back({call.file + ":" + std::to_string(call.line), call.id});
+        ++mPlaceholderCount;
+    }
     const size_t fresh = mUses.size();
     const size_t index = event ? mEvents.emplace(call.id, fresh).first->second
                                : mPolicies.emplace(call.text, fresh).first->second;

@@ -36,8 +36,11 @@ void usage(FILE* to) {
         "  --property KEY=VAL   system property seen by the server (repeatable)\n"
         "  --summary-json FILE  what the analysis found, as JSON (docs/replay-insight.md)\n"
         "  --report FILE.html   self-contained HTML report (plots, holders, warnings)\n"
-        "  --compare DIR_B      replay twice in virtual time, under the configuration and\n"
-        "                       under DIR_B's, and report the differences\n"
+        "  --compare CONFIG_B   replay twice in virtual time, under the configuration and\n"
+        "                       under CONFIG_B (an XML file, or a directory holding\n"
+        "                       xml/velmora_config_cust.xml), and report the differences\n"
+        "                       first, then run A's summary\n"
+        "  --compare-only       with --compare: print only the differences\n"
         "  --quiet              no line per call\n"
         "  --server-log FILE    write the server's own log to FILE (default: dropped)\n"
         "  --verbose            show the server's own log on stderr\n"
@@ -82,6 +85,7 @@ int main(int argc, char** argv) {
     std::string serverLogPath;  // --server-log
     bool verbose = false;       // the server's log on stderr
     bool speedGiven = false;
+    bool compareOnly = false;
     for (int i = 1; i < argc; ++i) {
         const std::string arg = argv[i];
         auto value = [&](const char* name) -> const char* {
@@ -129,6 +133,8 @@ int main(int argc, char** argv) {
             options.reportPath = value("--report");
         } else if (arg == "--compare") {
             compareDir = value("--compare");
+        } else if (arg == "--compare-only") {
+            compareOnly = true;
         } else if (arg == "--quiet") {
             options.quiet = true;
         } else if (arg == "--keep-root") {
@@ -172,6 +178,10 @@ int main(int argc, char** argv) {
                 "always kept\n");
         return kUsageError;
     }
+    if (compareOnly && compareDir.empty()) {
+        fprintf(stderr, "velmora-replay: --compare-only needs --compare CONFIG_B\n");
+        return kUsageError;
+    }
     std::string logError;
     if (!velmora::ServerLog::route(serverLogPath, verbose, &logError)) {
         fprintf(stderr, "velmora-replay: %s\n", logError.c_str());
@@ -182,6 +192,7 @@ int main(int argc, char** argv) {
     }
     if (!compareDir.empty()) {
         velmora::ComparisonRun comparison(options, compareDir, stdout, stderr);
+        comparison.setCompareOnly(compareOnly);
         return comparison.run();
     }
     catchInterrupts();

@@ -40,7 +40,8 @@ TraceGenerator::TraceGenerator(const TraceGenOptions& options)
       mRandom(options.seed),
       mModel(mRandom),
       mBook(options.marginMs),
-      mNow(options.startMs) {}
+      mNow(options.startMs),
+      mLoadRandom(options.seed ^ 0x10ad10ad10ad10adULL) {}
 
 std::string TraceGenerator::generate(const TraceGenOptions& options, TraceGenStats* stats) {
     TraceGenerator generator(options);
@@ -55,6 +56,7 @@ std::string TraceGenerator::run() {
     mText = "# Generated: velmora-gen-trace " + arguments(mOptions) + "\n";
     write("@" + std::to_string(mNow) + " ", mModel.notification());
     while (mNow < mOptions.durationMs) {
+        loads();
         mBook.forgetBefore(mNow);
         if (mRandom.chance(mOptions.sleepPpm)) {
             sleep();
@@ -151,6 +153,25 @@ void TraceGenerator::line(const std::string& text) {
     ++mStats.lines;
 }
 
+void TraceGenerator::loads() {
+    if (mOptions.loadEveryMs <= 0 || mNow < mNextLoadMs)
+        return;
+    static const char* const kDomains[] = {"cpu.little", "cpu.big", "gpu"};
+    std::string text = "@" + std::to_string(mNow) + " load";
+    for (int i = 0; i < 3; ++i) {
+        // A walk of at most 0.1 a step, held inside [0, 1].
+        const int step = static_cast<int>(mLoadRandom.range(0, 200)) - 100;
+        mLoadPermille[i] = std::min(1000, std::max(0, mLoadPermille[i] + step));
+        char share[32];
+        snprintf(share, sizeof(share), " %s=%d.%03d", kDomains[i], mLoadPermille[i] / 1000,
+                 mLoadPermille[i] % 1000);
+        text += share;
+    }
+    line(text);
+    ++mStats.loadLines;
+    mNextLoadMs = (mNow / mOptions.loadEveryMs + 1) * mOptions.loadEveryMs;
+}
+
 std::string TraceGenerator::arguments(const TraceGenOptions& o) {
     std::string args = "--seed " + std::to_string(o.seed);
     args += " --start-ms " + std::to_string(o.startMs);
@@ -162,6 +183,8 @@ std::string TraceGenerator::arguments(const TraceGenOptions& o) {
     args += " --reload-share " + share(o.reloadPpm);
     args += " --odd-share " + share(o.oddPpm);
     args += " --margin-ms " + std::to_string(o.marginMs);
+    if (o.loadEveryMs > 0)
+        args += " --load-every-ms " + std::to_string(o.loadEveryMs);
     return args;
 }
 

@@ -34,6 +34,9 @@ struct TraceGenOptions {
     uint32_t reloadPpm = 2000;
     uint32_t oddPpm = 5000;
     int64_t marginMs = 0;  // > 0: keep clear of foreseen deadlines by this much
+    // > 0: a load line for the example device's clusters and GPU this often (a random walk of
+    // its own, so the calls are those of the same trace without load lines).
+    int64_t loadEveryMs = 0;
 
     // An hour of device use, about 120,000 host calls, for the replay benchmark.
     static TraceGenOptions hour(uint64_t seed, uint32_t probePpm);
@@ -46,6 +49,7 @@ struct TraceGenStats {
     int64_t sleeps = 0;
     int64_t backwards = 0;  // calls stamped below the time reached
     int64_t endMs = 0;      // trace time at the end of the last line
+    int64_t loadLines = 0;  // of the lines
 };
 
 class TraceGenerator {
@@ -66,6 +70,8 @@ private:
     void sleep();
     void write(const std::string& at, const GeneratedCall& call);
     void line(const std::string& text);
+    // Load lines due by the time reached, stamped with it: they never move the replay's clock.
+    void loads();
 
     const TraceGenOptions& mOptions;
     SplitMix64 mRandom;
@@ -74,6 +80,9 @@ private:
     TraceGenStats mStats;
     int64_t mNow;  // the time reached
     int64_t mLastProbeDeadline = -1;
+    SplitMix64 mLoadRandom;
+    int64_t mNextLoadMs = 0;
+    int mLoadPermille[3] = {100, 50, 50};  // cpu.little, cpu.big, gpu
     std::string mText;
 };
 

@@ -26,8 +26,12 @@ void usage(FILE* to) {
         "  --odd-share F         share of calls the server refuses (default 0.005)\n"
         "  --margin-ms MS        keep every call this far from the deadlines the generator\n"
         "                        foresees, and end past the last (default 0: no margin)\n"
+        "  --load-every-ms MS    a load line for the clusters and the GPU this often, at the\n"
+        "                        time reached (default 0: none)\n"
         "  -o FILE               write the trace there (default: standard output)\n"
-        "A summary goes to standard error.\n",
+        "  --version             print the version and exit\n"
+        "A summary goes to standard error. Exit status: 0 written, 1 the trace could not be\n"
+        "written, 2 a usage error.\n",
         to);
 }
 
@@ -36,6 +40,9 @@ bool number(const char* text, double* value) {
     *value = strtod(text, &end);
     return end != text && *end == '\0' && std::isfinite(*value) && *value >= 0;
 }
+
+// Exit status of a command line that cannot be run (the same for every velmora tool).
+constexpr int kUsageError = 2;
 
 uint32_t ppm(double share) {
     return static_cast<uint32_t>(std::llround(std::min(share, 1.0) * 1e6));
@@ -58,6 +65,10 @@ int main(int argc, char** argv) {
             usage(stdout);
             return 0;
         }
+        if (arg == "--version") {
+            printf("velmora-gen-trace %s\n", VELMORA_VERSION);
+            return 0;
+        }
         if (arg == "--hour") {
             continue;
         }
@@ -68,7 +79,7 @@ int main(int argc, char** argv) {
         if (i + 1 >= argc) {
             fprintf(stderr, "velmora-gen-trace: %s needs a value (or is unknown)\n", arg.c_str());
             usage(stderr);
-            return 1;
+            return kUsageError;
         }
         const char* text = argv[++i];
         if (arg == "-o") {
@@ -78,7 +89,7 @@ int main(int argc, char** argv) {
         double v = 0;
         if (!number(text, &v)) {
             fprintf(stderr, "velmora-gen-trace: %s: not a number: '%s'\n", arg.c_str(), text);
-            return 1;
+            return kUsageError;
         }
         if (arg == "--seed") {
             options.seed = strtoull(text, nullptr, 0);
@@ -86,7 +97,11 @@ int main(int argc, char** argv) {
             options.startMs = static_cast<int64_t>(v);
         } else if (arg == "--duration-ms") {
             options.durationMs = static_cast<int64_t>(v);
-        } else if (arg == "--mean-gap-ms" && v >= 1) {
+        } else if (arg == "--mean-gap-ms") {
+            if (v < 1) {
+                fprintf(stderr, "velmora-gen-trace: --mean-gap-ms is at least 1, not '%s'\n", text);
+                return kUsageError;
+            }
             options.meanGapMs = static_cast<int64_t>(v);
         } else if (arg == "--probe-share") {
             options.probePpm = ppm(v);
@@ -100,10 +115,12 @@ int main(int argc, char** argv) {
             options.oddPpm = ppm(v);
         } else if (arg == "--margin-ms") {
             options.marginMs = static_cast<int64_t>(v);
+        } else if (arg == "--load-every-ms") {
+            options.loadEveryMs = static_cast<int64_t>(v);
         } else {
             fprintf(stderr, "velmora-gen-trace: unknown option %s\n", arg.c_str());
             usage(stderr);
-            return 1;
+            return kUsageError;
         }
     }
     velmora::TraceGenStats stats;
@@ -112,7 +129,7 @@ int main(int argc, char** argv) {
     if (out == nullptr || fwrite(trace.data(), 1, trace.size(), out) != trace.size() ||
         (out != stdout && fclose(out) != 0)) {
         fprintf(stderr, "velmora-gen-trace: cannot write %s\n", outPath.c_str());
-        return 2;
+        return 1;
     }
     fprintf(stderr,
             "velmora-gen-trace: %lld host calls (%lld probe events), %lld sleeps, %lld stamped "
