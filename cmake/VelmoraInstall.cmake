@@ -42,11 +42,12 @@ function(velmora_install_rules)
             LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT dev
             ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT dev
             RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT runtime)
-    foreach(tool velmora-replay velmora-lint velmora-import-logcat)
+    foreach(tool velmora-replay velmora-lint velmora-import-logcat velmora-synth)
         if(TARGET ${tool})
             install(TARGETS ${tool} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT runtime)
         endif()
     endforeach()
+    # velmora-fleet and its Python package: tools/CMakeLists.txt, which lists the files.
     install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" "${PROJECT_SOURCE_DIR}/docs"
             DESTINATION "${VELMORA_INSTALL_DATADIR}" COMPONENT runtime)
     foreach(dir IN LISTS VELMORA_PUBLIC_HEADER_DIRS)

@@ -30,13 +30,17 @@ set(CPACK_COMPONENTS_GROUPING IGNORE)
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_NAME "velmora")
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_SECTION "libs")
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_SHLIBDEPS ON)
+# python3 for velmora-fleet; python3-distributed only for its --scheduler, so only suggested.
+set(CPACK_DEBIAN_RUNTIME_PACKAGE_DEPENDS "python3")
+set(CPACK_DEBIAN_RUNTIME_PACKAGE_SUGGESTS "python3-distributed")
 set(CPACK_DEBIAN_RUNTIME_DESCRIPTION
     "performance server library with a Linux host layer
 libvelmora, the performance server of a mobile device's vendor layer, built
 for a Linux host with its host platform layer (a simulated device), and the
 tools: velmora-replay (event trace replay), velmora-lint (configuration
-checker), velmora-import-logcat (device logs into traces), with the example
-configuration, traces and the documentation.")
+checker), velmora-import-logcat (device logs into traces), velmora-fleet
+(many sessions under two configurations), velmora-synth (generated
+sessions), with the example configuration, traces and the documentation.")
 
 set(CPACK_DEBIAN_DEV_PACKAGE_NAME "velmora-dev")
 set(CPACK_DEBIAN_DEV_PACKAGE_SECTION "libdevel")

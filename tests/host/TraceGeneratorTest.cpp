@@ -54,6 +54,40 @@ std::vector<int64_t> runTimes(const std::vector<TraceCall>& calls, int* stampedI
     return times;
 }
 
+// Load lines come on top of the same calls, each at the time reached (so none moves the
+// replay's clock or is stamped in the past), about one per period, with loads in [0, 1].
+TEST(TraceGeneratorTest, LoadLinesLeaveTheCallsAsTheyWere) {
+    TraceGenOptions options;
+    options.seed = 3;
+    options.durationMs = 20000;
+    const std::vector<TraceCall> plain = parse(TraceGenerator::generate(options));
+    options.loadEveryMs = 100;
+    TraceGenStats stats;
+    const std::vector<TraceCall> loaded = parse(TraceGenerator::generate(options, &stats));
+    std::vector<TraceCall> calls;
+    int stampedInThePast = 0;
+    const std::vector<int64_t> times = runTimes(loaded, &stampedInThePast);
+    int64_t lastLoad = -1;  // period of the last load line
+    for (size_t i = 0; i < loaded.size(); ++i) {
+        if (loaded[i].kind != TraceCall::Kind::Load) {
+            calls.push_back(loaded[i]);
+            continue;
+        }
+        EXPECT_EQ(times[i], loaded[i].atMs);
+        EXPECT_GE(loaded[i].atMs, i > 0 ? times[i - 1] : 0);
+        EXPECT_GT(loaded[i].atMs / 100, lastLoad) << "at most one per period";
+        lastLoad = loaded[i].atMs / 100;
+        ASSERT_EQ(3u, loaded[i].loads.size());
+        for (const auto& share : loaded[i].loads)
+            EXPECT_TRUE(share.u >= 0 && share.u <= 1) << share.domain;
+    }
+    ASSERT_EQ(plain.size(), calls.size());
+    for (size_t i = 0; i < calls.size(); ++i)
+        EXPECT_EQ(plain[i].source, calls[i].source) << i;
+    EXPECT_GT(stats.loadLines, 150);  // 200 periods, a few without a call in them
+    EXPECT_EQ(static_cast<int64_t>(loaded.size() - calls.size()), stats.loadLines);
+}
+
 TEST(TraceGeneratorTest, SeedGivesTheSameTraceOnEveryMachine) {
     TraceGenOptions options;
     options.seed = 7;

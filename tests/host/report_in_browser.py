@@ -18,9 +18,12 @@ import subprocess
 import sys
 import zlib
 
-# Plots of the report, their step lines and units for the default node map (HtmlReport::groups()).
-EXPECTED_SERIES = [2, 2, 2, 1, 2, 1, 9, 1]
-EXPECTED_UNITS = ["MHz", "MHz", "MHz", "MHz", "\u00b0C", "mW", "level", "boosted threads"]
+# Plots of the report, their step lines and units for the default node map (HtmlReport::groups()),
+# then the energy model's: per domain with an energy table (the example device's clusters and
+# GPU) its effective and needed frequency, and its power with and without limits.
+EXPECTED_SERIES = [2, 2, 2, 1, 2, 1, 9, 1] + [2, 2] * 3
+EXPECTED_UNITS = (["MHz", "MHz", "MHz", "MHz", "\u00b0C", "mW", "level", "boosted threads"] +
+                  ["MHz", "mW"] * 3)
 MIN_TIME_TICKS = 4
 MIN_DRAWN_PIXELS = 150  # saturated pixels per plot: a step line across the plot has far more
 WIDTH = 1100

@@ -27,8 +27,8 @@ std::string EnergySummary::text(const std::vector<DomainEnergy>& energy, int64_t
     if (energy.empty())
         return "no load in the trace: no energy estimate\n";
     std::string out =
-        "energy estimate (the device profile's energy tables, the trace's load; limits: what "
-        "the floors and caps added)\n";
+        "energy estimate (energy tables x the trace's load; limits: what floors and caps "
+        "changed)\n";
     char line[512];
     snprintf(line, sizeof(line), "%-14s %12s %12s %12s %12s  %s\n", "domain", "mJ", "saturated ms",
              "limits mJ", "limits sat ms", "effective frequency (most time)");

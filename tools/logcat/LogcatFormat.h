@@ -46,6 +46,7 @@ public:
     bool lacksYear() const { return mClock == Clock::kDate && !mYear; }
 
     Layout layout() const { return mLayout; }
+    Clock clock() const { return mClock; }
 
 private:
     bool parseStamp(const char** cursor, int64_t* timeUs) const;

@@ -252,6 +252,7 @@ void LogcatImporter::writeTrace(const std::string& sourceName) {
             break;
         }
     }
+    mFirstCallUs = firstUs;
     mTrace = "# Imported by velmora-import-logcat from " + printable(sourceName) + " (logcat -v " +
              mFormat.name() + ", process " + std::to_string(mPid) + ").\n# " + mCounts.text() +
              ".\n# Times are milliseconds since the first call. The log holds the first payload "

@@ -53,6 +53,9 @@ public:
     const ImportCounts& counts() const { return mCounts; }
     // The format detected, as given to `logcat -v` ("threadtime,year").
     std::string formatName() const { return mFormat.name(); }
+    const LogcatFormat& format() const { return mFormat; }
+    // The log time of the trace's @0 (its first call), on the format's clock.
+    int64_t firstCallUs() const { return mFirstCallUs; }
 
 private:
     struct Entry {
@@ -74,6 +77,7 @@ private:
     bool mDetected = false;
     int64_t mYearShiftUs = 0;  // added to dates without year once the log has seen a new year
     int64_t mLastUs = 0;
+    int64_t mFirstCallUs = 0;
     int mPid = -1;  // the server's process
     bool mDebugSeen = false;
     std::map<int, bool> mRestartEventLast;  // by thread: its last line was event 20224

@@ -248,7 +248,11 @@ GeneratedCall DeviceUseModel::query() {
 }
 
 GeneratedCall DeviceUseModel::deviceCall() {
-    switch (mRandom.pick(kKindWeights)) {
+    return deviceCall(static_cast<Kind>(mRandom.pick(kKindWeights)));
+}
+
+GeneratedCall DeviceUseModel::deviceCall(Kind kind) {
+    switch (kind) {
         case kLaunch:
             return launch(4099, "cold", &mColdPolicy, kColdLaunchMs);
         case kWindowSwitch:

@@ -53,7 +53,7 @@ public:
     // action without payload, a level out of range.
     GeneratedCall oddCall(bool probes);
 
-private:
+    // The kinds of deviceCall(), for a caller that chooses what the user does next.
     enum Kind {
         kLaunch,
         kWindowSwitch,
@@ -74,7 +74,13 @@ private:
         kPolicy,
         kKindCount
     };
+    // One call of the given kind (kScene, kGovernorScene, kOnOff: one of that kind's commands).
+    GeneratedCall deviceCall(Kind kind);
+    // Switches a scene, governor scene or on/off command on when it is off, off when it is on.
+    GeneratedCall toggle(int cmdId) { return toggle(cmdId, &mOn); }
+    bool isOn(int cmdId) const { return mOn.count(cmdId) != 0; }
 
+private:
     GeneratedCall launch(int cmdId, const char* policyName, int* policy, int64_t configuredMs);
     std::string policyLine(const char* name, int* policy);
     GeneratedCall toggle(int cmdId, std::set<int>* on);

@@ -1,0 +1,1 @@
+"""velmora-fleet: many recorded sessions replayed under one or two configurations."""
