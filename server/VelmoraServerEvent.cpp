@@ -81,6 +81,9 @@ int VelmoraServer::doNotificationEvent(int cmdId, unsigned int payloadNum, const
             VLOGE("failed to update parser: mParserPtr is NULL!");
             return -1;
         }
+        // The slice is opened here, not in the parser: the configuration layer stays below
+        // the trace layer.
+        const TraceSlice reloadSlice("reload");
         parser->updateParser();
         return 0;
     }
