@@ -2,10 +2,10 @@
 
 #include <algorithm>
 #include <cstdio>
-#include <fstream>
 #include <sstream>
 
 #include "host/record/Timeline.h"
+#include "host/text/TextFile.h"
 #include "tools/insight/InsightSummary.h"
 
 namespace velmora {
@@ -218,18 +218,8 @@ void HtmlReport::write(const InsightResult& result, std::ostream& out) {
 }
 
 bool HtmlReport::write(const InsightResult& result, const std::string& path, std::string* error) {
-    std::ofstream file(path, std::ios::trunc);
-    if (!file) {
-        *error = "cannot write " + path;
-        return false;
-    }
-    write(result, file);
-    file.close();
-    if (!file) {
-        *error = "write failed: " + path;
-        return false;
-    }
-    return true;
+    return TextFile::write(
+        path, [&](std::ostream& file) { write(result, file); }, error);
 }
 
 }  // namespace velmora

@@ -1,6 +1,8 @@
 #include "tools/insight/InsightJson.h"
 
-#include <fstream>
+#include <ostream>
+
+#include "host/text/TextFile.h"
 
 namespace velmora {
 
@@ -32,20 +34,14 @@ nlohmann::json nodeJson(const NodeInsight& node, int64_t endUs) {
 
 bool writeFile(const std::string& path, std::string* error,
                const std::function<void(JsonStreamWriter&)>& write) {
-    std::ofstream file(path, std::ios::trunc);
-    if (!file) {
-        *error = "cannot write " + path;
-        return false;
-    }
-    JsonStreamWriter out(file);
-    write(out);
-    file << "\n";
-    file.close();
-    if (!file) {
-        *error = "write failed: " + path;
-        return false;
-    }
-    return true;
+    return TextFile::write(
+        path,
+        [&write](std::ostream& file) {
+            JsonStreamWriter out(file);
+            write(out);
+            file << "\n";
+        },
+        error);
 }
 
 }  // namespace
