@@ -129,13 +129,8 @@ int NodeMap::parse(const std::string& text, const std::string& origin, std::stri
 }
 
 int NodeMap::load(const std::string& path, std::string* error) {
-    std::string content;
-    if (!TextFile::read(path, &content)) {
-        if (error != nullptr)
-            *error = path + ": cannot open node map";
-        return -1;
-    }
-    return parse(content, path, error);
+    return TextFile::parseFile(
+        path, "node map", [&](const std::string& text) { return parse(text, path, error); }, error);
 }
 
 }  // namespace velmora

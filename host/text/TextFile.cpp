@@ -21,6 +21,18 @@ bool TextFile::read(const std::string& path, std::string* text) {
     return true;
 }
 
+int TextFile::parseFile(const std::string& path, const char* what,
+                        const std::function<int(const std::string& text)>& parse,
+                        std::string* error) {
+    std::string text;
+    if (!read(path, &text)) {
+        if (error != nullptr)
+            *error = path + ": cannot open " + what;
+        return -1;
+    }
+    return parse(text);
+}
+
 bool TextFile::write(const std::string& path, const std::function<void(std::ostream&)>& fill,
                      std::string* error) {
     std::ofstream file(path, std::ios::trunc);

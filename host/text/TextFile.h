@@ -17,6 +17,12 @@ public:
     // then left as it was).
     static bool read(const std::string& path, std::string* text);
 
+    // Reads `path` and returns what `parse` makes of its text; -1 with "PATH: cannot open WHAT"
+    // in `error` (may be null) when it cannot be read.
+    static int parseFile(const std::string& path, const char* what,
+                         const std::function<int(const std::string& text)>& parse,
+                         std::string* error);
+
     // Replaces `path` with what `fill` writes to the stream. False, with "cannot write PATH"
     // (not opened) or "write failed: PATH" (a write or the close failed) in `error`, which may
     // be null.

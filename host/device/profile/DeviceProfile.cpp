@@ -236,13 +236,9 @@ int DeviceProfile::parse(const std::string& text, const std::string& origin, std
 }
 
 int DeviceProfile::load(const std::string& path, std::string* error) {
-    std::string content;
-    if (!TextFile::read(path, &content)) {
-        if (error != nullptr)
-            *error = path + ": cannot open device profile";
-        return -1;
-    }
-    return parse(content, path, error);
+    return TextFile::parseFile(
+        path, "device profile", [&](const std::string& text) { return parse(text, path, error); },
+        error);
 }
 
 const NodeSpec* DeviceProfile::find(const std::string& key) const {
