@@ -81,24 +81,5 @@ TEST_F(TextFileTest, UnreadableFileIsNeverParsed) {
     EXPECT_EQ(error, path + ": cannot open device profile");
 }
 
-struct NumberRow {
-    const char* text;
-    bool ok;
-    long long value;
-};
-
-TEST(DecimalIntegerTest, TakesWholeDecimalNumbersOnly) {
-    const NumberRow rows[] = {
-        {"42", true, 42},   {"-7", true, -7},  {"", false, 0},
-        {"12x", false, 0},  {"1.5", false, 0}, {"99999999999999999999", false, 0},
-        {"0x10", false, 0},
-    };
-    for (const NumberRow& row : rows) {
-        long long value = -1;
-        EXPECT_EQ(parseDecimalInteger(row.text, &value), row.ok) << row.text;
-        EXPECT_EQ(value, row.ok ? row.value : -1) << row.text;
-    }
-}
-
 }  // namespace
 }  // namespace velmora
