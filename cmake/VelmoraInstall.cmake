@@ -1,6 +1,7 @@
-# Install rules: the two libraries, the tools, the public headers under include/velmora, a
-# pkg-config file per library, a CMake package (find_package(velmora) gives velmora::velmora and
-# velmora::velmora_host), and under share/velmora everything in examples/ and docs/.
+# Install rules: the two libraries, the tools, the public headers under include/velmora (the
+# list in VelmoraPublicHeaders.cmake), a pkg-config file per library, a CMake package
+# (find_package(velmora) gives velmora::velmora and velmora::velmora_host), and under
+# share/velmora everything in examples/ and docs/.
 #
 # Two components, which the Debian package makes two packages of (VelmoraPackage.cmake):
 # runtime (the libraries, the tools, examples and docs) and dev (headers, the libraries' link
@@ -18,7 +19,7 @@ include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)
 
 set(VELMORA_INSTALL_CMAKEDIR "${CMAKE_INSTALL_LIBDIR}/cmake/velmora")
-set(VELMORA_PUBLIC_HEADER_DIRS server config platform dump freq sched probe report trace compat host)
+include(${CMAKE_CURRENT_LIST_DIR}/VelmoraPublicHeaders.cmake)
 set(VELMORA_INSTALL_DATADIR "${CMAKE_INSTALL_DATADIR}/velmora")
 
 # Installed files find each other relative to their own place ($ORIGIN), so that an install
@@ -50,12 +51,10 @@ function(velmora_install_rules)
     # velmora-fleet and its Python package: tools/CMakeLists.txt, which lists the files.
     install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" "${PROJECT_SOURCE_DIR}/docs"
             DESTINATION "${VELMORA_INSTALL_DATADIR}" COMPONENT runtime)
-    foreach(dir IN LISTS VELMORA_PUBLIC_HEADER_DIRS)
-        if(EXISTS "${PROJECT_SOURCE_DIR}/${dir}")
-            install(DIRECTORY "${PROJECT_SOURCE_DIR}/${dir}/"
-                    DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/velmora/${dir}" COMPONENT dev
-                    FILES_MATCHING PATTERN "*.h")
-        endif()
+    foreach(header IN LISTS VELMORA_PUBLIC_HEADERS)
+        get_filename_component(dir "${header}" DIRECTORY)
+        install(FILES "${PROJECT_SOURCE_DIR}/${header}"
+                DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/velmora/${dir}" COMPONENT dev)
     endforeach()
 
     install(EXPORT velmoraTargets NAMESPACE velmora:: DESTINATION ${VELMORA_INSTALL_CMAKEDIR}
