@@ -113,6 +113,14 @@ std::string tracegenTool() {
     return VELMORA_TRACEGEN_TOOL;
 }
 
+std::string synthTool() {
+    return VELMORA_SYNTH_TOOL;
+}
+
+std::string fleetTool() {
+    return VELMORA_FLEET_TOOL;
+}
+
 std::string examplesDir() {
     return std::string(VELMORA_SOURCE_DIR) + "/examples";
 }

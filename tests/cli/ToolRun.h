@@ -36,6 +36,8 @@ std::string replayTool();
 std::string lintTool();
 std::string logcatTool();
 std::string tracegenTool();
+std::string synthTool();
+std::string fleetTool();  // a Python program beside the others
 std::string examplesDir();
 
 }  // namespace clitest
