@@ -209,7 +209,14 @@ std::vector<ConventionRow> conventionRows() {
     const std::string version = VELMORA_PROJECT_VERSION;
     std::vector<ConventionRow> rows;
     for (const Tool& tool : tools) {
-        const std::string name = tool.program.substr(std::string("velmora-").size());
+        // "import-logcat" shows as "ImportLogcat".
+        std::string name;
+        for (size_t i = std::string("velmora-").size(); i < tool.program.size(); ++i) {
+            const bool starts = name.empty() || tool.program[i - 1] == '-';
+            if (tool.program[i] != '-') {
+                name += starts ? static_cast<char>(toupper(tool.program[i])) : tool.program[i];
+            }
+        }
         rows.push_back(
             {name + "Help", tool.path, tool.program, {"--help"}, 0, "usage: " + tool.program, ""});
         rows.push_back({name + "Version",
