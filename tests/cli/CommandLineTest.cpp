@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <chrono>
 #include <fstream>
 #include <sstream>
 #include <string>
@@ -87,6 +88,22 @@ TEST(ReplayTerminalTest, VerboseShowsTheServerLogOnStderr) {
     CleanRun run({"--quiet", "--verbose"});
     EXPECT_EQ(0, run.result.status) << run.result.err;
     EXPECT_NE(std::string::npos, run.result.err.find("LoadFile error")) << run.result.err;
+}
+
+// Ctrl-C during a paced replay of the minute: it stops after the call in progress, reports what
+// ran, removes its device and exits 130, long before the minute is over.
+TEST(ReplayTerminalTest, CtrlCStopsAPacedReplayAndCleansUp) {
+    const std::string cwd = scratchDir("cwd");
+    const std::string tmp = scratchDir("tmp");
+    const auto started = std::chrono::steady_clock::now();
+    const ToolResult result =
+        ToolRun::run({replayTool(), "--quiet", minuteTrace()}, cwd, {"TMPDIR=" + tmp}, 60, 1500);
+    EXPECT_LT(std::chrono::steady_clock::now() - started, std::chrono::seconds(30));
+    EXPECT_EQ(130, result.status) << result.err;
+    EXPECT_NE(std::string::npos, result.out.find("interrupted at ")) << result.out;
+    EXPECT_NE(std::string::npos, result.out.find("cpu.big.max")) << result.out;
+    EXPECT_EQ(std::vector<std::string>{}, entries(tmp));
+    EXPECT_EQ(std::vector<std::string>{}, entries(cwd));
 }
 
 TEST(ReplayTerminalTest, ServerLogThatCannotBeWrittenIsASetUpFailure) {
