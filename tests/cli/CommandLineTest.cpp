@@ -3,7 +3,9 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <chrono>
 #include <fstream>
+#include <sstream>
 #include <string>
 #include <vector>
 
@@ -88,6 +90,22 @@ TEST(ReplayTerminalTest, VerboseShowsTheServerLogOnStderr) {
     EXPECT_NE(std::string::npos, run.result.err.find("LoadFile error")) << run.result.err;
 }
 
+// Ctrl-C during a paced replay of the minute: it stops after the call in progress, reports what
+// ran, removes its device and exits 130, long before the minute is over.
+TEST(ReplayTerminalTest, CtrlCStopsAPacedReplayAndCleansUp) {
+    const std::string cwd = scratchDir("cwd");
+    const std::string tmp = scratchDir("tmp");
+    const auto started = std::chrono::steady_clock::now();
+    const ToolResult result =
+        ToolRun::run({replayTool(), "--quiet", minuteTrace()}, cwd, {"TMPDIR=" + tmp}, 60, 1500);
+    EXPECT_LT(std::chrono::steady_clock::now() - started, std::chrono::seconds(30));
+    EXPECT_EQ(130, result.status) << result.err;
+    EXPECT_NE(std::string::npos, result.out.find("interrupted at ")) << result.out;
+    EXPECT_NE(std::string::npos, result.out.find("cpu.big.max")) << result.out;
+    EXPECT_EQ(std::vector<std::string>{}, entries(tmp));
+    EXPECT_EQ(std::vector<std::string>{}, entries(cwd));
+}
+
 TEST(ReplayTerminalTest, ServerLogThatCannotBeWrittenIsASetUpFailure) {
     const std::string cwd = scratchDir("cwd");
     const ToolResult result = ToolRun::run(
@@ -129,21 +147,153 @@ TEST(ReplayPlaceholderTest, WarnsOncePerUneditedPlaceholder) {
         << result.err;
 }
 
-// Every tool prints its name and the project's version, and nothing else.
-TEST(ToolVersionTest, EveryToolPrintsItsNameAndTheProjectVersion) {
-    const std::string cwd = scratchDir("version");
-    const std::vector<std::pair<std::string, std::string>> tools = {
-        {replayTool(), "velmora-replay"},
-        {lintTool(), "velmora-lint"},
-        {logcatTool(), "velmora-import-logcat"},
-        {tracegenTool(), "velmora-gen-trace"}};
-    for (const auto& tool : tools) {
-        const ToolResult result = ToolRun::run({tool.first, "--version"}, cwd);
-        EXPECT_EQ(0, result.status) << tool.second;
-        EXPECT_EQ(tool.second + " " + VELMORA_PROJECT_VERSION + "\n", result.out);
-        EXPECT_EQ("", result.err) << tool.second;
-    }
+// The conventions every tool keeps: --help is the usage on stdout, --version "<tool> <version>",
+// an unknown option, a missing value or conflicting options one line on stderr naming it and a
+// hint, status 2, nothing on stdout. velmora-fleet (Python's argparse) keeps the statuses and
+// says "velmora-fleet: error: ..." last, after its usage.
+struct ConventionRow {
+    std::string name;
+    std::string tool;
+    std::string program;
+    std::vector<std::string> args;
+    int status;
+    std::string out;      // what stdout starts with
+    std::string errLine;  // the first line on stderr (the last for velmora-fleet), "" for none
+};
+
+void PrintTo(const ConventionRow& row, std::ostream* os) {
+    *os << row.name;
 }
+
+class ToolConventionTest : public ::testing::TestWithParam<ConventionRow> {};
+
+TEST_P(ToolConventionTest, StatusOutputAndMessage) {
+    const ConventionRow& row = GetParam();
+    const std::string cwd = scratchDir("convention");
+    std::vector<std::string> argv = {row.tool};
+    argv.insert(argv.end(), row.args.begin(), row.args.end());
+    const ToolResult result = ToolRun::run(argv, cwd);
+    EXPECT_EQ(row.status, result.status) << result.err;
+    EXPECT_EQ(row.out, result.out.substr(0, row.out.size()));
+    if (row.status == 2) {
+        EXPECT_EQ("", result.out);
+    }
+    std::vector<std::string> lines;
+    std::istringstream err(result.err);
+    for (std::string line; std::getline(err, line);) {
+        lines.push_back(line);
+    }
+    if (row.errLine.empty()) {
+        EXPECT_EQ("", result.err);
+    } else if (row.program == "velmora-fleet") {
+        ASSERT_FALSE(lines.empty());
+        EXPECT_EQ(0u, lines.back().rfind(row.errLine, 0)) << result.err;
+    } else {
+        ASSERT_EQ(2u, lines.size()) << result.err;
+        EXPECT_EQ(row.program + ": " + row.errLine, lines[0]);
+        EXPECT_EQ("Try '" + row.program + " --help'.", lines[1]);
+    }
+    EXPECT_EQ(std::vector<std::string>{}, entries(cwd));
+}
+
+std::vector<ConventionRow> conventionRows() {
+    struct Tool {
+        std::string path;
+        std::string program;
+        std::string valued;  // an option that takes a value
+        std::vector<std::string> conflicting;
+        std::string conflict;
+    };
+    const Tool tools[] = {
+        {replayTool(),
+         "velmora-replay",
+         "--timeline",
+         {"--speed=2", "--fast", "t.trace"},
+         "--fast and --speed exclude each other: --fast does not pace at all"},
+        {lintTool(), "velmora-lint", "--device", {}, ""},
+        {logcatTool(), "velmora-import-logcat", "-o", {}, ""},
+        {tracegenTool(),
+         "velmora-gen-trace",
+         "--seed",
+         {"--no-probes", "--probe-share=0.5"},
+         "--no-probes and --probe-share exclude each other"},
+        {synthTool(),
+         "velmora-synth",
+         "--count",
+         {"--no-load", "--load-period-ms", "5", "-o", "d"},
+         "--no-load and --load-period-ms exclude each other"},
+    };
+    const std::string version = VELMORA_PROJECT_VERSION;
+    std::vector<ConventionRow> rows;
+    for (const Tool& tool : tools) {
+        // "import-logcat" shows as "ImportLogcat".
+        std::string name;
+        for (size_t i = std::string("velmora-").size(); i < tool.program.size(); ++i) {
+            const bool starts = name.empty() || tool.program[i - 1] == '-';
+            if (tool.program[i] != '-') {
+                name += starts ? static_cast<char>(toupper(tool.program[i])) : tool.program[i];
+            }
+        }
+        rows.push_back(
+            {name + "Help", tool.path, tool.program, {"--help"}, 0, "usage: " + tool.program, ""});
+        rows.push_back({name + "Version",
+                        tool.path,
+                        tool.program,
+                        {"--version"},
+                        0,
+                        tool.program + " " + version + "\n",
+                        ""});
+        rows.push_back({name + "UnknownOption",
+                        tool.path,
+                        tool.program,
+                        {"x", "--bogus"},
+                        2,
+                        "",
+                        "unknown option --bogus"});
+        rows.push_back({name + "MissingValue",
+                        tool.path,
+                        tool.program,
+                        {"x", tool.valued},
+                        2,
+                        "",
+                        tool.valued + " needs a value"});
+        if (!tool.conflicting.empty()) {
+            rows.push_back({name + "Conflict", tool.path, tool.program, tool.conflicting, 2, "",
+                            tool.conflict});
+        }
+    }
+    rows.push_back(
+        {"FleetHelp", fleetTool(), "velmora-fleet", {"--help"}, 0, "usage: velmora-fleet", ""});
+    rows.push_back({"FleetVersion",
+                    fleetTool(),
+                    "velmora-fleet",
+                    {"--version"},
+                    0,
+                    "velmora-fleet " + version + "\n",
+                    ""});
+    rows.push_back({"FleetUnknownOption",
+                    fleetTool(),
+                    "velmora-fleet",
+                    {"--config-dir", "a", "-o", "o", "s", "--bogus"},
+                    2,
+                    "",
+                    "velmora-fleet: error: unrecognized arguments: --bogus"});
+    rows.push_back({"FleetMissingValue",
+                    fleetTool(),
+                    "velmora-fleet",
+                    {"--config-dir", "a", "s", "-o"},
+                    2,
+                    "",
+                    "velmora-fleet: error: argument -o/--out: expected one argument"});
+    return rows;
+}
+
+INSTANTIATE_TEST_SUITE_P(Rows, ToolConventionTest, ::testing::ValuesIn(conventionRows()),
+                         [](const ::testing::TestParamInfo<ConventionRow>& info) {
+                             std::string name = info.param.name;
+                             name.erase(std::remove(name.begin(), name.end(), '-'), name.end());
+                             return name;
+                         });
 
 struct UsageRow {
     const char* name;
@@ -204,8 +354,12 @@ INSTANTIATE_TEST_SUITE_P(
         UsageRow{"LogcatUnknownOption",
                  logcatTool(),
                  {"--in", "a.log", "-o", "t.trace"},
-                 "unexpected argument '--in'"},
-        UsageRow{"LogcatNoOutput", logcatTool(), {"a.log"}, "usage: velmora-import-logcat"},
+                 "unknown option --in"},
+        UsageRow{"LogcatNoOutput", logcatTool(), {"a.log"}, "no trace to write (-o TRACE)"},
+        UsageRow{"LogcatTwoLogs",
+                 logcatTool(),
+                 {"a.log", "b.log", "-o", "t.trace"},
+                 "more than one log given (a.log, b.log)"},
         UsageRow{"ReplayCompareOnlyAlone",
                  replayTool(),
                  {"--compare-only", "t.trace"},

@@ -23,7 +23,8 @@ int ToolResult::errLines() const {
 }
 
 ToolResult ToolRun::run(const std::vector<std::string>& argv, const std::string& cwd,
-                        const std::vector<std::string>& env, int limitSeconds) {
+                        const std::vector<std::string>& env, int limitSeconds,
+                        int interruptAfterMs) {
     // The output goes to files outside `cwd`, which the tests expect to stay as the tool left it.
     const std::string capture = scratchDir("capture");
     const std::string outPath = capture + "/out";
@@ -52,9 +53,16 @@ ToolResult ToolRun::run(const std::vector<std::string>& argv, const std::string&
         ADD_FAILURE() << "fork failed";
         return result;
     }
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(limitSeconds);
+    const auto started = std::chrono::steady_clock::now();
+    const auto deadline = started + std::chrono::seconds(limitSeconds);
+    bool interrupted = interruptAfterMs <= 0;
     int status = 0;
     while (waitpid(pid, &status, WNOHANG) == 0) {
+        if (!interrupted && std::chrono::steady_clock::now() >
+                                started + std::chrono::milliseconds(interruptAfterMs)) {
+            kill(pid, SIGINT);
+            interrupted = true;
+        }
         if (std::chrono::steady_clock::now() > deadline) {
             ADD_FAILURE() << argv[0] << " ran longer than " << limitSeconds << " s";
             kill(pid, SIGKILL);
@@ -111,6 +119,14 @@ std::string logcatTool() {
 
 std::string tracegenTool() {
     return VELMORA_TRACEGEN_TOOL;
+}
+
+std::string synthTool() {
+    return VELMORA_SYNTH_TOOL;
+}
+
+std::string fleetTool() {
+    return VELMORA_FLEET_TOOL;
 }
 
 std::string examplesDir() {

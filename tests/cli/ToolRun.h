@@ -20,9 +20,11 @@ struct ToolResult {
 class ToolRun {
 public:
     // `argv[0]` is the program's path. Runs it in `cwd` with `env` ("NAME=VALUE") added to this
-    // process's environment, stdin from /dev/null; killed after `limitSeconds`.
+    // process's environment, stdin from /dev/null; killed after `limitSeconds`. With
+    // `interruptAfterMs` it gets a SIGINT (a Ctrl-C) that long after it started.
     static ToolResult run(const std::vector<std::string>& argv, const std::string& cwd,
-                          const std::vector<std::string>& env = {}, int limitSeconds = 60);
+                          const std::vector<std::string>& env = {}, int limitSeconds = 60,
+                          int interruptAfterMs = 0);
 };
 
 // A fresh empty directory of its own for each call.
@@ -36,6 +38,8 @@ std::string replayTool();
 std::string lintTool();
 std::string logcatTool();
 std::string tracegenTool();
+std::string synthTool();
+std::string fleetTool();  // a Python program beside the others
 std::string examplesDir();
 
 }  // namespace clitest

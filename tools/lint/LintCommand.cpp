@@ -5,7 +5,9 @@
 #include <cerrno>
 #include <cstring>
 #include <fstream>
+#include <sstream>
 
+#include "tools/common/CommandLine.h"
 #include "tools/lint/ConfigLinter.h"
 
 namespace velmora {
@@ -41,53 +43,37 @@ void LintCommand::printUsage(std::ostream& to) {
        << "  --explain   list how every command is dispatched (class, duration, pairs)\n"
        << "  --werror    exit 1 when there are warnings (and no errors)\n"
        << "  --device F  check values against device profile F (default: the example device,\n"
-       << "              examples/device/example-device.xml)\n"
+       << "              examples/device/example-device.xml); also --device=F\n"
+       << "  --help      print this help and exit\n"
        << "  --version   print the version and exit\n"
        << "Exit status: 0 clean (notes allowed), 1 warnings with --werror, 2 errors or a\n"
        << "usage error.\n";
 }
 
 int LintCommand::run(const std::vector<std::string>& args, std::ostream& out, std::ostream& err) {
-    LintOptions options;
-    std::string path;
-    std::string devicePath;
-    bool pathGiven = false;
-    for (size_t i = 0; i < args.size(); ++i) {
-        const std::string& arg = args[i];
-        if (arg == "--device") {
-            if (i + 1 >= args.size()) {
-                err << kProgram << ": --device needs a device profile\n";
-                return kUsageError;
-            }
-            devicePath = args[++i];
-        } else if (arg == "--explain") {
-            options.explain = true;
-        } else if (arg == "--werror") {
-            options.werror = true;
-        } else if (arg == "--help" || arg == "-h") {
-            printUsage(out);
-            return 0;
-        } else if (arg == "--version") {
-            out << kProgram << ' ' << VELMORA_VERSION << '\n';
-            return 0;
-        } else if (arg.size() > 1 && arg[0] == '-') {
-            err << kProgram << ": unknown option " << arg << '\n';
-            printUsage(err);
-            return kUsageError;
-        } else if (pathGiven) {
-            err << kProgram << ": more than one configuration given (" << path << ", " << arg
-                << ")\n";
-            return kUsageError;
-        } else {
-            path = arg;
-            pathGiven = true;
-        }
+    std::ostringstream usage;
+    printUsage(usage);
+    CommandLine line(kProgram, usage.str());
+    line.flag("--explain").flag("--werror").value("--device");
+    if (!line.parse(args, out, err)) {
+        return line.status();
     }
-    if (!pathGiven || path.empty()) {
+    const std::vector<std::string>& operands = line.operands();
+    if (operands.size() > 1) {
+        err << line.problem("more than one configuration given (" + operands[0] + ", " +
+                            operands[1] + ")");
+        return kUsageError;
+    }
+    if (operands.empty() || operands[0].empty()) {
         err << kProgram << ": no configuration file given\n";
         printUsage(err);
         return kUsageError;
     }
+    const std::string& path = operands[0];
+    const std::string devicePath = line.get("--device");
+    LintOptions options;
+    options.explain = line.has("--explain");
+    options.werror = line.has("--werror");
     const std::string reason = unreadableReason(path);
     if (!reason.empty()) {
         err << kProgram << ": " << path << ": " << reason << '\n';

@@ -4,12 +4,15 @@
 //
 //   velmora-lint [--explain] [--werror] [--device PROFILE.xml] CONFIG.xml
 //
-// Findings and the listing go to `out`; usage errors to `err`. Stateless.
+// Findings and the listing go to `out`; usage errors to `err` (CommandLine's conventions).
+// Stateless.
 #pragma once
 
 #include <ostream>
 #include <string>
 #include <vector>
+
+#include "tools/common/CommandLine.h"
 
 namespace velmora {
 
@@ -17,7 +20,7 @@ class LintCommand {
 public:
     // Exit status of a usage error (no file, unreadable file, unknown option), the same as for
     // a configuration with errors: either way the file was not shown to be usable.
-    static constexpr int kUsageError = 2;
+    static constexpr int kUsageError = CommandLine::kUsageError;
 
     // `args` are the arguments after the program name. Returns the exit status.
     static int run(const std::vector<std::string>& args, std::ostream& out, std::ostream& err);

@@ -6,6 +6,7 @@
 #include <fstream>
 #include <sstream>
 
+#include "tools/common/CommandLine.h"
 #include "tools/common/InputFile.h"
 #include "tools/logcat/LoadMerge.h"
 #include "tools/logcat/LogcatImporter.h"
@@ -13,6 +14,8 @@
 namespace velmora {
 
 namespace {
+
+constexpr const char* kProgram = "velmora-import-logcat";
 
 constexpr const char* kUsage =
     "usage: velmora-import-logcat LOG -o TRACE [--load FILE]\n"
@@ -23,7 +26,10 @@ constexpr const char* kUsage =
     "  --force    overwrite an existing TRACE\n"
     "  --load FILE  merge the load lines of scripts/record-load into the trace by time (the\n"
     "             log captured with -v epoch or -v monotonic, the clock the file names)\n"
+    "  --help     print this help and exit\n"
     "  --version  print the version and exit\n"
+    "An option's value follows it (-o TRACE, --load FILE) or is joined to it (-oTRACE,\n"
+    "--load=FILE).\n"
     "Exit status: 0 imported, 1 bad input, 2 a usage error.\n";
 
 // Merges the load file at `loadPath` into `trace`; false after one line to `err`.
@@ -64,34 +70,24 @@ bool mergeLoad(const std::string& loadPath, const std::string& logPath,
 
 int LogcatImportCommand::run(const std::vector<std::string>& args, std::ostream& out,
                              std::ostream& err) {
-    std::string logPath;
-    std::string tracePath;
-    std::string loadPath;
-    bool force = false;
-    for (size_t i = 0; i < args.size(); ++i) {
-        if (args[i] == "-h" || args[i] == "--help") {
-            out << kUsage;
-            return kOk;
-        }
-        if (args[i] == "--version") {
-            out << "velmora-import-logcat " << VELMORA_VERSION << "\n";
-            return kOk;
-        }
-        if (args[i] == "--force") {
-            force = true;
-        } else if (args[i] == "-o" && i + 1 < args.size()) {
-            tracePath = args[++i];
-        } else if (args[i] == "--load" && i + 1 < args.size()) {
-            loadPath = args[++i];
-        } else if (!args[i].empty() && args[i][0] != '-' && logPath.empty()) {
-            logPath = args[i];
-        } else {
-            err << "velmora-import-logcat: unexpected argument '" << args[i] << "'\n" << kUsage;
-            return kUsageError;
-        }
+    CommandLine line(kProgram, kUsage);
+    line.value("-o").value("--load").flag("--force");
+    if (!line.parse(args, out, err)) {
+        return line.status();
     }
+    const std::vector<std::string>& operands = line.operands();
+    if (operands.size() > 1) {
+        err << line.problem("more than one log given (" + operands[0] + ", " + operands[1] + ")");
+        return kUsageError;
+    }
+    const std::string logPath = operands.empty() ? std::string() : operands[0];
+    const std::string tracePath = line.get("-o");
+    const std::string loadPath = line.get("--load");
+    const bool force = line.has("--force");
     if (logPath.empty() || tracePath.empty()) {
-        err << kUsage;
+        err << kProgram << ": "
+            << (logPath.empty() ? "no log given (LOG)" : "no trace to write (-o TRACE)") << "\n"
+            << kUsage;
         return kUsageError;
     }
     struct stat st {};

@@ -4,7 +4,8 @@
 //
 // Reads the logcat text LOG, writes the trace TRACE and prints the counts of what was read.
 // Bad input (unreadable, a directory, empty, binary, larger than 256 MiB, an unknown format, no
-// server calls) prints one line to `err`, writes no trace and exits 1; a usage error exits 2.
+// server calls) prints one line to `err`, writes no trace and exits 1; a usage error exits 2
+// (CommandLine's conventions).
 #pragma once
 
 #include <ostream>
