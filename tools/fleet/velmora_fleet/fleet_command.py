@@ -188,6 +188,11 @@ def main(argv, here):
     except UsageError as err:
         print("velmora-fleet: %s" % err, file=sys.stderr)
         return 2
+    except OSError as err:
+        # The outputs could not be written (a full disk, a directory taken away meanwhile).
+        print("velmora-fleet: %s: %s" % (err.filename or args.out, err.strerror),
+              file=sys.stderr)
+        return 2
     except KeyboardInterrupt:
         print("velmora-fleet: interrupted; nothing written", file=sys.stderr)
         return 130
