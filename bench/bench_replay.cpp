@@ -1,11 +1,14 @@
 // velmora-replay --fast as a user runs it: the real program in a child process on a generated
 // hour of device use (tools/tracegen, about 120,000 host calls), with 15 % probe events and with
 // none (the floor: no hand-over to the library's probe worker). Each trace is replayed on an
-// idle machine and with one CPU-bound process beside it; on the idle machine also the hour
-// with a load line every 100 ms ("probes+load"), which the energy model reads. Measured per run:
-// wall time from fork to exit, host calls per second, the child's CPU time (user + system, from
-// wait4) per call and its largest resident set (ru_maxrss). Medians of the repetitions are printed
-// and written as JSON for scripts/bench, which sets them against the targets.
+// idle machine and with one CPU-bound process beside it, as a plain `--fast` replay writes it
+// (the summary). On the idle machine also the probe hour with the timeline and the event log
+// written ("probes+files": the server's trace tracks and per-call records, which cost a plain
+// replay nothing), and the hour with a load line every 100 ms ("probes+load"), which the energy
+// model reads. Measured per run: wall time from fork to exit, host calls per second, the child's
+// CPU time (user + system, from wait4) per call and its largest resident set (ru_maxrss). Medians
+// of the repetitions are printed and written as JSON for scripts/bench, which sets them against
+// the targets.
 //
 //   velmora_bench_replay [--repetitions N] [--out FILE.json] [--replay PATH] [--seed N]
 //
@@ -38,7 +41,7 @@ struct Run {
 
 struct Case {
     std::string load;   // "idle" or "loaded"
-    std::string trace;  // "probes", "no-probes" or "probes+load"
+    std::string trace;  // "probes", "no-probes", "probes+files" or "probes+load"
     std::vector<Run> runs;
 };
 
@@ -62,20 +65,20 @@ long hostCalls(const std::string& outPath) {
     return -1;
 }
 
-bool replayOnce(const std::string& replay, const std::string& trace, Run* run) {
+bool replayOnce(const std::string& replay, const std::string& trace, bool files, Run* run) {
     const std::string out = gScratch + "/replay-stdout.txt";
-    const std::vector<std::string> args = {replay,
-                                           "--fast",
-                                           "--quiet",
-                                           "--config-dir",
-                                           std::string(VELMORA_SOURCE_DIR) + "/examples",
-                                           "--root",
-                                           gScratch + "/device",
-                                           "--timeline",
-                                           gScratch + "/timeline.json",
-                                           "--event-log",
-                                           gScratch + "/events.log",
-                                           trace};
+    std::vector<std::string> args = {replay,
+                                     "--fast",
+                                     "--quiet",
+                                     "--config-dir",
+                                     std::string(VELMORA_SOURCE_DIR) + "/examples",
+                                     "--root",
+                                     gScratch + "/device"};
+    if (files) {
+        args.insert(args.end(), {"--timeline", gScratch + "/timeline.json", "--event-log",
+                                 gScratch + "/events.log"});
+    }
+    args.push_back(trace);
     std::vector<char*> argv;
     for (const std::string& arg : args) {
         argv.push_back(const_cast<char*>(arg.c_str()));
@@ -200,26 +203,28 @@ int main(int argc, char** argv) {
     const std::string none = writeTrace("hour-no-probes", seed, 0);
     const std::string withLoad = writeTrace("hour-probes-load", seed, 150000, 100);
     auto traceOf = [&](const std::string& trace) {
-        return trace == "probes" ? probes : trace == "no-probes" ? none : withLoad;
+        return trace == "no-probes" ? none : trace == "probes+load" ? withLoad : probes;
     };
 
     std::vector<Case> cases = {{"idle", "probes", {}},
                                {"idle", "no-probes", {}},
+                               {"idle", "probes+files", {}},
                                {"idle", "probes+load", {}},
                                {"loaded", "probes", {}},
                                {"loaded", "no-probes", {}}};
-    const size_t blockStart[] = {0, 3, 5};
+    const size_t blockStart[] = {0, 4, 6};
     bool ok = true;
     for (size_t block = 0; block < 2 && ok; ++block) {
         const pid_t busy = block == 1 ? startBusyLoop() : -1;
-        // Alternately, so that a change of machine load meets both traces.
+        // Alternately, so that a change of machine load meets every case of the block.
         for (int rep = 0; rep < repetitions && ok; ++rep) {
             for (size_t c = blockStart[block]; c < blockStart[block + 1] && ok; ++c) {
                 Run run;
-                ok = replayOnce(replay, traceOf(cases[c].trace), &run);
+                ok = replayOnce(replay, traceOf(cases[c].trace), cases[c].trace == "probes+files",
+                                &run);
                 cases[c].runs.push_back(run);
                 printf(
-                    "%-6s %-11s %7ld calls in %6.3f s: %8.0f calls/s, %6.2f us CPU per call, "
+                    "%-6s %-12s %7ld calls in %6.3f s: %8.0f calls/s, %6.2f us CPU per call, "
                     "%6.1f MB resident\n",
                     cases[c].load.c_str(), cases[c].trace.c_str(), run.calls, run.wallS,
                     run.calls / run.wallS, run.cpuS * 1e6 / std::max(1L, run.calls),

@@ -1,14 +1,25 @@
-# Install rules: the two libraries, the tools, the public headers under include/velmora, a
-# pkg-config file per library, a CMake package (find_package(velmora) gives velmora::velmora and
-# velmora::velmora_host), and under share/velmora everything in examples/ and docs/.
+# Install rules: the two libraries, the tools, the public headers under include/velmora (the
+# list in VelmoraPublicHeaders.cmake), a pkg-config file per library, a CMake package
+# (find_package(velmora) gives velmora::velmora and velmora::velmora_host), and under
+# share/velmora everything in examples/ and docs/.
+#
+# Two components, which the Debian package makes two packages of (VelmoraPackage.cmake):
+# runtime (the libraries, the tools, examples and docs) and dev (headers, the libraries' link
+# names, CMake and pkg-config files).
 #
 # Included by the top-level CMakeLists right after the velmora target exists; the host layer's
 # target is defined later (host/), so the rules run deferred, at the end of the top directory.
+# Libraries go to the multiarch directory (lib/x86_64-linux-gnu) where the toolchain names one,
+# as Debian's own libraries do, for a prefix install as for the package.
+if(NOT DEFINED CMAKE_INSTALL_LIBDIR AND CMAKE_LIBRARY_ARCHITECTURE)
+    set(CMAKE_INSTALL_LIBDIR "lib/${CMAKE_LIBRARY_ARCHITECTURE}" CACHE PATH
+        "Object code libraries (LIBDIR)")
+endif()
 include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)
 
 set(VELMORA_INSTALL_CMAKEDIR "${CMAKE_INSTALL_LIBDIR}/cmake/velmora")
-set(VELMORA_PUBLIC_HEADER_DIRS server config platform dump freq sched probe report trace compat host)
+include(${CMAKE_CURRENT_LIST_DIR}/VelmoraPublicHeaders.cmake)
 set(VELMORA_INSTALL_DATADIR "${CMAKE_INSTALL_DATADIR}/velmora")
 
 # Installed files find each other relative to their own place ($ORIGIN), so that an install
@@ -29,26 +40,25 @@ function(velmora_install_rules)
     endif()
     set_target_properties(${targets} PROPERTIES INSTALL_RPATH "$ORIGIN;${ANDROID_LIBRARY_DIR}")
     install(TARGETS ${targets} EXPORT velmoraTargets
-            LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
-            ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR}
-            RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+            LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT dev
+            ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT dev
+            RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT runtime)
     foreach(tool velmora-replay velmora-lint velmora-import-logcat velmora-synth)
         if(TARGET ${tool})
-            install(TARGETS ${tool} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+            install(TARGETS ${tool} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT runtime)
         endif()
     endforeach()
     # velmora-fleet and its Python package: tools/CMakeLists.txt, which lists the files.
     install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples" "${PROJECT_SOURCE_DIR}/docs"
-            DESTINATION "${VELMORA_INSTALL_DATADIR}")
-    foreach(dir IN LISTS VELMORA_PUBLIC_HEADER_DIRS)
-        if(EXISTS "${PROJECT_SOURCE_DIR}/${dir}")
-            install(DIRECTORY "${PROJECT_SOURCE_DIR}/${dir}/"
-                    DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/velmora/${dir}"
-                    FILES_MATCHING PATTERN "*.h")
-        endif()
+            DESTINATION "${VELMORA_INSTALL_DATADIR}" COMPONENT runtime)
+    foreach(header IN LISTS VELMORA_PUBLIC_HEADERS)
+        get_filename_component(dir "${header}" DIRECTORY)
+        install(FILES "${PROJECT_SOURCE_DIR}/${header}"
+                DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}/velmora/${dir}" COMPONENT dev)
     endforeach()
 
-    install(EXPORT velmoraTargets NAMESPACE velmora:: DESTINATION ${VELMORA_INSTALL_CMAKEDIR})
+    install(EXPORT velmoraTargets NAMESPACE velmora:: DESTINATION ${VELMORA_INSTALL_CMAKEDIR}
+            COMPONENT dev)
     configure_package_config_file(
         "${PROJECT_SOURCE_DIR}/cmake/velmoraConfig.cmake.in"
         "${PROJECT_BINARY_DIR}/velmoraConfig.cmake"
@@ -59,7 +69,7 @@ function(velmora_install_rules)
     install(FILES "${PROJECT_BINARY_DIR}/velmoraConfig.cmake"
                   "${PROJECT_BINARY_DIR}/velmoraConfigVersion.cmake"
                   "${PROJECT_SOURCE_DIR}/cmake/FindAndroidHostLibs.cmake"
-            DESTINATION ${VELMORA_INSTALL_CMAKEDIR})
+            DESTINATION ${VELMORA_INSTALL_CMAKEDIR} COMPONENT dev)
 
     # Relocatable: the prefix is found from the .pc file's own place.
     file(RELATIVE_PATH VELMORA_PC_TO_PREFIX "/prefix/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/prefix")
@@ -71,7 +81,7 @@ function(velmora_install_rules)
         configure_file("${PROJECT_SOURCE_DIR}/cmake/${pc}.pc.in"
                        "${PROJECT_BINARY_DIR}/${pc}.pc" @ONLY)
         install(FILES "${PROJECT_BINARY_DIR}/${pc}.pc"
-                DESTINATION "${CMAKE_INSTALL_LIBDIR}/pkgconfig")
+                DESTINATION "${CMAKE_INSTALL_LIBDIR}/pkgconfig" COMPONENT dev)
     endforeach()
 endfunction()
 

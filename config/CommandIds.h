@@ -15,6 +15,11 @@ inline constexpr const char* kColdPolicyName = "cold";
 inline constexpr int kCmdZolaFollower = 4113;
 inline constexpr int kCmdZolaReference = 4114;
 inline constexpr int kCmdProbe = 4116;
+// The probe worker withdraws a boost this long after applying it (when no off event came first),
+// and caps the duration of the probe action it starts with (a reloaded action is used as
+// configured).
+inline constexpr int kProbeBoostLifetimeMs = 256;
+inline constexpr int kProbeDurationCapMs = 100;
 // Start-up command carrying the default scheduling-group levels.
 inline constexpr int kCmdDefaultSchedLevel = 5376;
 

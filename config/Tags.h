@@ -44,6 +44,10 @@ constexpr int ZOLA_SCHED_LEVEL_NONE = -100;
 
 namespace velmora {
 
+// Most (tag, value) pairs one action or event request may carry: the loader's conversion stops
+// there, and the server and the frequency manager size their arrays by it.
+inline constexpr int kMaxEventPairs = 43;
+
 // DDR floor: on/off actions may carry it, the server leaves it to the platform.
 inline constexpr int kTagDdrMinFreq = 10;
 // A special scene's priority in its integer pairs (governor scenes use the "priority" string).

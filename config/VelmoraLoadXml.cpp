@@ -1,7 +1,13 @@
 #include "config/VelmoraLoadXml.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <tinyxml2.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <string>
 
 #include "compat/BoundedString.h"
 #include "config/DecimalText.h"
@@ -24,6 +30,57 @@ constexpr int kMaxActionsPerCommand = 3;
 // A command configuration is tens of kilobytes. tinyxml2 holds the whole text and its tree in
 // memory, so a larger file (a runaway cloud copy, a wrong path) is refused before it is read.
 constexpr long long kMaxConfigBytes = 16LL * 1024 * 1024;
+
+// readConfigText's refusal of a file over kMaxConfigBytes (already logged); not a tinyxml2 code.
+constexpr int kTooLarge = -1;
+
+// Reads the whole configuration at `path` into `text` through one descriptor: its size is taken
+// with fstat and the read stops one byte past the limit, so a file that grows in between is
+// refused too. tinyxml2::XML_SUCCESS, kTooLarge, or the tinyxml2 error LoadFile would report
+// (not found, read error).
+int readConfigText(const char* path, std::string* text) {
+    const int fd = open(path, O_RDONLY | O_CLOEXEC);
+    if (fd < 0) {
+        return tinyxml2::XML_ERROR_FILE_NOT_FOUND;
+    }
+    int result = tinyxml2::XML_SUCCESS;
+    struct stat info;
+    if (fstat(fd, &info) != 0) {
+        result = tinyxml2::XML_ERROR_FILE_READ_ERROR;
+    } else if (static_cast<long long>(info.st_size) > kMaxConfigBytes) {
+        VLOGE("configuration file %s is too large: %lld bytes, at most %lld", path,
+              static_cast<long long>(info.st_size), kMaxConfigBytes);
+        result = kTooLarge;
+    } else {
+        text->resize(static_cast<size_t>(info.st_size) + 1);
+        size_t got = 0;
+        while (result == tinyxml2::XML_SUCCESS) {
+            if (got == text->size()) {
+                if (text->size() > static_cast<size_t>(kMaxConfigBytes)) {
+                    VLOGE("configuration file %s is too large: grew past %lld bytes while read",
+                          path, kMaxConfigBytes);
+                    result = kTooLarge;
+                    break;
+                }
+                text->resize(std::min(2 * text->size(), static_cast<size_t>(kMaxConfigBytes) + 1));
+            }
+            const ssize_t n = read(fd, &(*text)[got], text->size() - got);
+            if (n < 0 && errno == EINTR) {
+                continue;
+            }
+            if (n < 0) {
+                result = tinyxml2::XML_ERROR_FILE_READ_ERROR;
+            } else if (n == 0) {
+                break;
+            } else {
+                got += static_cast<size_t>(n);
+            }
+        }
+        text->resize(got);
+    }
+    close(fd);
+    return result;
+}
 
 // Reads an integer attribute written in decimal (see DecimalText.h).
 bool queryDecimalAttribute(const tinyxml2::XMLElement* element, const char* name, int* out) {
@@ -103,19 +160,21 @@ int32_t VelmoraLoadXml::innerLoad(const char* path, RawXmlDataMap* rawMap) {
     if (path == nullptr || rawMap == nullptr) {
         return 2;
     }
-    struct stat info;
-    if (stat(path, &info) == 0 && static_cast<long long>(info.st_size) > kMaxConfigBytes) {
-        VLOGE("configuration file %s is too large: %lld bytes, at most %lld", path,
-              static_cast<long long>(info.st_size), kMaxConfigBytes);
+    // The limit is checked on the descriptor that is then read, so a file replaced or grown
+    // after the check cannot get past it. A file cut short while it is read (a copy being
+    // replaced in place) fails to parse, and the caller keeps the configuration in force.
+    std::string text;
+    const int error = readConfigText(path, &text);
+    if (error == kTooLarge) {
         return 2;
     }
-    // A file cut short while it is read (a copy being replaced in place) fails to parse or to
-    // read, and the caller keeps the configuration in force.
     tinyxml2::XMLDocument doc(true);
-    doc.LoadFile(path);
-    const int error = doc.ErrorID();
-    if (error != 0) {
-        VLOGE("LoadFile error, path:%s, error code:%d", path, error);
+    if (error == tinyxml2::XML_SUCCESS) {
+        doc.Parse(text.data(), text.size());
+    }
+    const int parseError = error != tinyxml2::XML_SUCCESS ? error : doc.ErrorID();
+    if (parseError != 0) {
+        VLOGE("LoadFile error, path:%s, error code:%d", path, parseError);
         return 2;
     }
     tinyxml2::XMLElement* policy = doc.FirstChildElement("policy");

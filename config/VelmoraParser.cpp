@@ -3,9 +3,6 @@
 #include "config/VelmoraLoadXml.h"
 #include "platform/VelmoraLog.h"
 #include "server/VelmoraServer.h"
-#include "trace/TraceSlice.h"
-
-using velmora::TraceSlice;
 
 VelmoraParser::VelmoraParser() : mActionMap(nullptr), mServerPtr(nullptr) {
     pthread_rwlock_init(&mRwLock, nullptr);
@@ -58,7 +55,6 @@ int VelmoraParser::doParseLocked(int32_t cmdId, Action* target) {
 }
 
 void VelmoraParser::updateParser() {
-    const TraceSlice slice("reload");
     VelmoraLoadXml* loader = createVelmoraLoadXml();
     if (loader == nullptr) {
         VLOGE("server get loader failed!");

@@ -1,9 +1,10 @@
 // A copy of plain values that a debug dump prints, kept apart from the tables it shows.
 //
 // A manager holds its request lock through platform calls, so a dump that read its tables would
-// either race with a request or wait behind the platform. Instead the manager publishes a copy
-// of what the dump prints whenever a request has finished changing the tables, and the dump
-// reads that copy. mLock is held only to copy the value in or out: it never waits behind
+// either race with a request or wait behind the platform. Instead every operation of the
+// manager that changes a printed table publishes a copy of what the dump prints before it
+// returns (an entry point once, when it has finished), and the dump reads that copy. The manager
+// keeps the values it last published under its own lock and publishes only when they change. mLock is held only to copy the value in or out: it never waits behind
 // anything but another copy, and nothing is called while it is held.
 //
 // T must be a plain value type (arrays of ints, flags): copying it may not allocate or call out.

@@ -60,16 +60,15 @@ int applyConfig(PerfExecutor* exec, int id, int count, const int* tags, const in
 }  // namespace
 
 FreqClientManager::FreqClientManager(VelmoraPlat* plat)
-    : mPlatPtr(plat), mMaxFreqRead(false), mUploadEnabled(false) {
+    : mPlatPtr(plat), mMaxFreqRead(false), mUploadEnabled(false), mFreqListPublished() {
     initConfigSet();
+    initFreqMap();
+    // Not yet shared with any other thread; the lock only keeps the analysis honest.
+    android::Mutex::Autolock lock(mLock);
     initConfigMap(mKxConfigMap);
     initConfigMap(mJnConfigMap);
     initConfigMap(mZolaConfigMap);
     initConfigMap(mMinConfigMap);
-    initFreqMap();
-    // Not yet shared with any other thread; the lock only keeps the analysis honest.
-    android::Mutex::Autolock lock(mLock);
-    publishFreqListLocked();
 }
 
 FreqClientManager::~FreqClientManager() = default;
@@ -84,6 +83,13 @@ void FreqClientManager::initConfigMap(TagMap& table) {
     for (const DumpRow& row : kDumpRows) {
         table[row.tag] = -1;
     }
+    if (isClientTable(table)) {
+        publishFreqListLocked();
+    }
+}
+
+bool FreqClientManager::isClientTable(const TagMap& table) const {
+    return &table == &mKxConfigMap || &table == &mJnConfigMap || &table == &mZolaConfigMap;
 }
 
 void FreqClientManager::initFreqMap() {
@@ -199,7 +205,6 @@ void FreqClientManager::cacheTags(int clientId, int tagLen, const int* tags, con
         return;
     }
     updateConfigMap(tagLen, tags, configs, *table);
-    publishFreqListLocked();
 }
 
 void FreqClientManager::publishFreqListLocked() {
@@ -210,6 +215,10 @@ void FreqClientManager::publishFreqListLocked() {
             values[c][row] = valueOr0(*tables[c], kDumpRows[row].tag);
         }
     }
+    if (values == mFreqListPublished) {
+        return;
+    }
+    mFreqListPublished = values;
     mFreqListSnapshot.publish(values);
 }
 
@@ -219,6 +228,9 @@ void FreqClientManager::updateConfigMap(int tagLen, const int* tags, const int* 
         if (mConfigSet.count(tags[i]) != 0) {
             table[tags[i]] = configs[i];
         }
+    }
+    if (isClientTable(table)) {
+        publishFreqListLocked();
     }
 }
 

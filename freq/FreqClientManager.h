@@ -9,8 +9,9 @@
 //
 // Locking: mLock guards every table, both flags and the reporter. doPerfSetConfig holds it for
 // the whole request, platform calls included; nothing called under it re-enters the manager.
-// The dump never takes it: it prints mFreqListSnapshot, which every change of a client table
-// republishes under mLock (mLock before the snapshot's own lock). Field order and the single
+// The dump never takes it: it prints mFreqListSnapshot, which every operation that changes a
+// client table republishes under mLock before it returns, when a printed value changed (mLock
+// before the snapshot's own lock). Field order and the single
 // virtual destructor are part of the binary interface with separately built components.
 #pragma once
 
@@ -60,8 +61,10 @@ public:
     void enableFreqInfoUpload(int tagLen, const int* tags, const int* configs) REQUIRES(mLock);
     // Stores a successful client request's raw merged-tag values. REQUIRES: mLock held.
     void cacheTags(int clientId, int tagLen, const int* tags, const int* configs) REQUIRES(mLock);
-    // Copies the merged tags of the request into `table`; other tags are ignored.
-    void updateConfigMap(int tagLen, const int* tags, const int* configs, TagMap& table);
+    // Copies the merged tags of the request into `table`; other tags are ignored. REQUIRES:
+    // mLock held.
+    void updateConfigMap(int tagLen, const int* tags, const int* configs, TagMap& table)
+        REQUIRES(mLock);
     // Reads the top frequencies into the reporter. 0 or the platform's failure (-1 without
     // executor). Does not take mLock and does not set mMaxFreqRead. REQUIRES: mLock held.
     int readMaxFreq() REQUIRES(mLock);
@@ -96,7 +99,8 @@ public:
 
     // Construction steps.
     void initConfigSet();
-    void initConfigMap(TagMap& table);
+    // Every merged tag of `table` at -1 (never set). REQUIRES: mLock held.
+    void initConfigMap(TagMap& table) REQUIRES(mLock);
     // Only the constructor calls it, before the object is shared.
     void initFreqMap() NO_THREAD_SAFETY_ANALYSIS;
 
@@ -126,15 +130,21 @@ public:
     static constexpr int kFreqListClients = 3;
     static constexpr int kFreqListTags = 7;
     using FreqListValues = std::array<std::array<int32_t, kFreqListTags>, kFreqListClients>;
-    velmora::DumpSnapshot<FreqListValues> mFreqListSnapshot;
 
 private:
-    // Copies the client tables into mFreqListSnapshot.
+    velmora::DumpSnapshot<FreqListValues> mFreqListSnapshot;
+
+    // Copies the client tables into mFreqListSnapshot when a printed value differs from the last
+    // copy; called by every operation that changes a client table.
     void publishFreqListLocked() REQUIRES(mLock);
+    // Whether `table` is one of the client tables the dump prints.
+    bool isClientTable(const TagMap& table) const NO_THREAD_SAFETY_ANALYSIS;
     // The platform's executor, or null when the platform or its executor is absent.
     PerfExecutor* executor() const;
     // The client's table, or null for ids other than 1..3.
     TagMap* clientTable(int clientId) REQUIRES(mLock);
+
+    FreqListValues mFreqListPublished GUARDED_BY(mLock);  // what mFreqListSnapshot holds
 };
 
 // A new manager built on `plat`, owned by the caller. Exported: a factory of the platform

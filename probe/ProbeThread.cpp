@@ -1,6 +1,7 @@
 #include "probe/ProbeThread.h"
 
 #include "config/Action.h"
+#include "config/CommandIds.h"
 #include "platform/PerfExecutor.h"
 #include "platform/VelmoraLog.h"
 #include "platform/VelmoraPlat.h"
@@ -12,10 +13,10 @@ using android::sp;
 namespace {
 
 constexpr int64_t kNsPerMs = 1000000;
-constexpr int64_t kBoostLifetimeNs = 256 * kNsPerMs;
+constexpr int64_t kBoostLifetimeNs = velmora::kProbeBoostLifetimeMs * kNsPerMs;
 // Cap of the start-up probe action's duration. A reloaded action is handed over as configured
 // (update()), so the cap holds only until the first reload.
-constexpr int32_t kMaxProbeDurationMs = 100;
+constexpr int32_t kMaxProbeDurationMs = velmora::kProbeDurationCapMs;
 // Android's foreground priority: boosts must not lag behind the work they are meant for.
 constexpr int32_t kProbeThreadPriority = -2;
 

@@ -1,5 +1,6 @@
 // The probe worker: boosts a queued thread once it has waited mBoostDelayMs (8 ms), so that
-// short bursts never reach the hardware, and withdraws the boost on request or after 256 ms.
+// short bursts never reach the hardware, and withdraws the boost on request or after
+// kProbeBoostLifetimeMs (config/CommandIds.h).
 //
 // Owns the probe action chain (mAction) and two queues keyed by thread id: mWaitQueue (asked
 // for a boost) and mBoostedQueue (holding one). A withdrawn entry is not moved anywhere: its
@@ -53,8 +54,8 @@ public:
     };
     using ProbeQueue = android::KeyedVector<uint32_t, android::sp<ProbeItem>>;
 
-    // Takes ownership of the `action` chain and caps its duration at 100. `handler` supplies
-    // the boost delay and must outlive the worker's passes (see shutdown).
+    // Takes ownership of the `action` chain and caps its duration at kProbeDurationCapMs.
+    // `handler` supplies the boost delay and must outlive the worker's passes (see shutdown).
     ProbeThread(ProbeHandler& handler, VelmoraPlat* plat, Action* action);
     ~ProbeThread() override;
 

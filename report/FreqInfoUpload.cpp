@@ -2,7 +2,7 @@
 
 #include <sstream>
 
-#include "freq/FreqTags.h"
+#include "config/Tags.h"
 #include "platform/PlatformImports.h"
 #include "platform/VelmoraLog.h"
 

@@ -61,12 +61,20 @@ void copyLevels(const SchedLevelManager::LevelMap& from, SchedLevelManager::Leve
     }
 }
 
-// Republishes the dump's copy when an entry point returns, on every path, while its lock is
-// still held (declare it after the lock).
-class PublishOnReturn {
+}  // namespace
+
+// Holds back the helpers' publishing while an entry point runs and republishes the dump's copy
+// once when it returns, on every path, while its lock is still held (declare it after the lock).
+class SchedLevelManager::PublishOnReturn {
 public:
-    explicit PublishOnReturn(SchedLevelManager& manager) : mManager(manager) {}
-    ~PublishOnReturn() NO_THREAD_SAFETY_ANALYSIS { mManager.publishEasGroupListLocked(); }
+    explicit PublishOnReturn(SchedLevelManager& manager) NO_THREAD_SAFETY_ANALYSIS
+        : mManager(manager) {
+        mManager.mPublishDeferred = true;
+    }
+    ~PublishOnReturn() NO_THREAD_SAFETY_ANALYSIS {
+        mManager.mPublishDeferred = false;
+        mManager.publishEasGroupListLocked();
+    }
     PublishOnReturn(const PublishOnReturn&) = delete;
     PublishOnReturn& operator=(const PublishOnReturn&) = delete;
 
@@ -74,10 +82,18 @@ private:
     SchedLevelManager& mManager;
 };
 
-}  // namespace
+bool SchedLevelManager::EasGroupValues::operator==(const EasGroupValues& other) const {
+    return hmpMode == other.hmpMode &&
+           std::equal(&levels[0][0], &levels[0][0] + kTables * kGroups, &other.levels[0][0]);
+}
 
 SchedLevelManager::SchedLevelManager(VelmoraPlat* plat)
-    : mPlatPtr(plat), mSchedLevelNum(0), mZolaFirstEventSeen(false), mHmpMode(false) {
+    : mPlatPtr(plat),
+      mSchedLevelNum(0),
+      mZolaFirstEventSeen(false),
+      mHmpMode(false),
+      mEasGroupPublished(),  // all zero, as the snapshot starts
+      mPublishDeferred(false) {
     // Not yet shared with any other thread; the lock only keeps the analysis honest.
     android::Mutex::Autolock lock(mLock);
     initSchedLevelMap(mDefaultLevelMap);
@@ -180,6 +196,7 @@ int SchedLevelManager::initDefaultSchedLevel(int tagLen, const std::vector<int>&
         groups[i] = tag;
         levels[i] = level;
     }
+    publishEasGroupListLocked();
     return 0;
 }
 
@@ -278,6 +295,9 @@ int SchedLevelManager::checkIfZolaLevelChanged() {
             changed = 1;
         }
     }
+    if (changed != 0) {
+        publishEasGroupListLocked();
+    }
     return changed;
 }
 
@@ -299,6 +319,7 @@ void SchedLevelManager::updateCurrentMapLocked(int* count, int* groups, int* lev
         ++written;
     }
     *count = written;
+    publishEasGroupListLocked();
 }
 
 int SchedLevelManager::updateCurrentSchedlevel() {
@@ -324,6 +345,7 @@ void SchedLevelManager::updateSchedLevelByOneStep(LevelMap& table, int step) {
         const int target = mSchedLevels[std::max(0, std::min(index, mSchedLevelNum - 1))];
         table[tag] = std::min(target, mDefaultLevelMap[tag]);
     }
+    publishEasGroupListLocked();
 }
 
 int SchedLevelManager::doPerfSetSchedLevel(int clientId, int tagLen, const int* tags,
@@ -424,6 +446,9 @@ void SchedLevelManager::dumpEasGroupList(android::String8& out) {
 }
 
 void SchedLevelManager::publishEasGroupListLocked() {
+    if (mPublishDeferred) {
+        return;
+    }
     const LevelMap* const tables[EasGroupValues::kTables] = {
         &mDefaultLevelMap, &mCurrentLevelMap, &mKxLevelMap, &mJnLevelMap, &mZolaLevelMap};
     EasGroupValues values;
@@ -434,6 +459,10 @@ void SchedLevelManager::publishEasGroupListLocked() {
         }
     }
     values.hmpMode = mHmpMode;
+    if (values == mEasGroupPublished) {
+        return;
+    }
+    mEasGroupPublished = values;
     mEasGroupSnapshot.publish(values);
 }
 

@@ -11,9 +11,11 @@
 // Locking: mLock is the manager's only lock and is not recursive. The two entry points take it
 // after validating their input and hold it through the platform call, so a slow platform holds
 // up the other entry point; nothing else is locked while it is held except the dump snapshot's
-// own short lock, which both entry points take last to publish what the dump prints. Every
-// other table operation expects the caller to hold it (see REQUIRES). The dump never takes it:
-// it prints mEasGroupSnapshot. getSchedLevelMap hands out a table without it.
+// own short lock, taken last to publish what the dump prints. Every other table operation
+// expects the caller to hold it (see REQUIRES). The dump never takes it: it prints
+// mEasGroupSnapshot, which every operation that changes a printed table republishes before it
+// returns (an entry point once, when it returns), and only when a printed value changed.
+// getSchedLevelMap hands out a table without it.
 #pragma once
 
 #include <utils/Mutex.h>
@@ -64,6 +66,9 @@ public:
     // Position of `level` on the scale, -1 when it is not on it.
     int getIndex(int level);
 
+    // The operations below that change a printed table (default, current, KX, JN, ZOLA) leave
+    // the dump's copy current before they return.
+
     // Records the defaults of command 5376 (`tags` holds its pairs interleaved) into the
     // default table and the three client tables, and reports them in `groups`/`levels`.
     // 0, or -1 on a shape that is neither one hmp pair nor eight EAS pairs (nothing changed).
@@ -113,18 +118,28 @@ public:
     android::Mutex mLock;
 
     // What "--easgrouplist" prints: the levels of the nine group tags in the default, current,
-    // KX, JN and ZOLA tables, and the mode that picks the lines. Republished under mLock at the
-    // end of every entry point, whatever it changed or rolled back.
+    // KX, JN and ZOLA tables, and the mode that picks the lines.
     struct EasGroupValues {
         static constexpr int kTables = 5;
         static constexpr int kGroups = 9;  // tags 50..58
         int32_t levels[kTables][kGroups];
         bool hmpMode;
+        bool operator==(const EasGroupValues& other) const;
     };
+
+private:
+    class PublishOnReturn;
+
     velmora::DumpSnapshot<EasGroupValues> mEasGroupSnapshot;
 
-    // Copies the five dumped tables into mEasGroupSnapshot.
+    // Copies the five dumped tables into mEasGroupSnapshot when a printed value differs from
+    // the last copy. Held back while an entry point runs, which publishes once as it returns,
+    // so that a dump never shows levels the entry point is about to roll back.
     void publishEasGroupListLocked() REQUIRES(mLock);
+
+    // Guarded by mLock.
+    EasGroupValues mEasGroupPublished GUARDED_BY(mLock);  // what mEasGroupSnapshot holds
+    bool mPublishDeferred GUARDED_BY(mLock);              // an entry point is running
 };
 
 // Creates the manager for `plat`; the caller owns it. Exported for the same reason as

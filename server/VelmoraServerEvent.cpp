@@ -1,6 +1,7 @@
 // Event dispatch: velmoraEvent and the paths it takes inline.
 #include "config/Action.h"
 #include "config/CommandIds.h"
+#include "config/CommandKind.h"
 #include "config/VelmoraParser.h"
 #include "freq/FreqClientManager.h"
 #include "freq/FreqTags.h"
@@ -81,6 +82,9 @@ int VelmoraServer::doNotificationEvent(int cmdId, unsigned int payloadNum, const
             VLOGE("failed to update parser: mParserPtr is NULL!");
             return -1;
         }
+        // The slice is opened here, not in the parser: the configuration layer stays below
+        // the trace layer.
+        const TraceSlice reloadSlice("reload");
         parser->updateParser();
         return 0;
     }
@@ -105,10 +109,11 @@ int VelmoraServer::velmoraEvent(int cmdId, const char* msg, unsigned int payload
     if (enable != 0) {
         return enable;
     }
-    if (cmdId == kCmdMemLatencyRatio || cmdId == kCmdMemLatency) {
+    const CommandKind kind = classify(cmdId);
+    if (kind == CommandKind::kMemoryLatency) {
         return doMemlatencyEvent(cmdId, msg, payloadNum, payload);
     }
-    if (cmdId == kCmdProbe) {
+    if (kind == CommandKind::kProbe) {
         return doProbeEvent(msg, payloadNum, payload);
     }
     if (cmdId >= kCmdClientRestart) {
@@ -126,10 +131,10 @@ int VelmoraServer::velmoraEvent(int cmdId, const char* msg, unsigned int payload
     if (action.mDuration < 0) {
         return 0;
     }
-    if (cmdId >= kSpecialSceneFirst && cmdId <= kSpecialSceneLast) {
+    if (kind == CommandKind::kSpecialScene || kind == CommandKind::kGovernorScene) {
         return doSpecialSceneEvent(cmdId, payloadNum, payload);
     }
-    if (cmdId >= kOnOffFirst && cmdId <= kOnOffLast) {
+    if (kind == CommandKind::kOnOff) {
         return doOnOffAction(&action, payloadNum, payload);
     }
     if (action.mDuration == 0) {

@@ -6,6 +6,7 @@
 
 #include "config/Action.h"
 #include "config/CommandIds.h"
+#include "config/CommandKind.h"
 #include "config/Tags.h"
 #include "config/VelmoraParser.h"
 #include "platform/VelmoraPlat.h"
@@ -21,7 +22,7 @@ constexpr int kPriorityMin = kScenePriorityMin;
 constexpr int kPriorityMax = kScenePriorityMax;
 
 bool isGovScene(int cmdId) {
-    return cmdId >= kGovSceneFirst && cmdId <= kSpecialSceneLast;
+    return isGovernorSceneId(cmdId);
 }
 
 bool inPriorityRange(int prio) {

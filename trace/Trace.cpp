@@ -11,7 +11,12 @@ namespace {
 // Longest slice name: an entry point's name and one number, with room to spare.
 constexpr size_t kMaxSliceName = 64;
 
-AtraceSink gAtraceSink;
+// Made on first use and never destroyed: the probe worker lives as long as the process and may
+// still trace while exit runs the destructors of static objects.
+TraceSink& atraceSink() {
+    static AtraceSink* const sSinkOfTheDevice = new AtraceSink();
+    return *sSinkOfTheDevice;
+}
 
 }  // namespace
 
@@ -20,7 +25,7 @@ std::atomic<TraceSink*> Trace::sSink{nullptr};
 
 TraceSink& Trace::sink() {
     TraceSink* installed = sSink.load(std::memory_order_acquire);
-    return installed != nullptr ? *installed : gAtraceSink;
+    return installed != nullptr ? *installed : atraceSink();
 }
 
 void Trace::counter(const char* track, int64_t value) {

@@ -13,9 +13,9 @@
 
 #include <atomic>
 #include <cstdint>
-#include <map>
 #include <mutex>
 #include <string>
+#include <unordered_map>
 
 #include "host/device/NodeMap.h"
 #include "host/record/Timeline.h"
@@ -76,8 +76,8 @@ private:
     Timeline& mTimeline;
     mutable std::mutex mLock;  // guards everything below
     std::string mRoot;
-    std::map<std::string, Node> mNodeState;  // by key
-    std::atomic<uint64_t> mGeneration{0};     // bumped by forgetLocked, read without mLock
+    std::unordered_map<std::string, Node> mNodeState;  // by key
+    std::atomic<uint64_t> mGeneration{0};              // bumped by forgetLocked, read without mLock
 };
 
 }  // namespace velmora

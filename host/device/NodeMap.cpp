@@ -1,10 +1,10 @@
 #include "host/device/NodeMap.h"
 
-#include <fstream>
 #include <sstream>
 
 #include "config/Tags.h"
 #include "host/device/profile/DeviceProfile.h"
+#include "host/text/TextFile.h"
 
 namespace velmora {
 
@@ -129,15 +129,8 @@ int NodeMap::parse(const std::string& text, const std::string& origin, std::stri
 }
 
 int NodeMap::load(const std::string& path, std::string* error) {
-    std::ifstream file(path);
-    if (!file) {
-        if (error != nullptr)
-            *error = path + ": cannot open node map";
-        return -1;
-    }
-    std::stringstream content;
-    content << file.rdbuf();
-    return parse(content.str(), path, error);
+    return TextFile::parseFile(
+        path, "node map", [&](const std::string& text) { return parse(text, path, error); }, error);
 }
 
 }  // namespace velmora

@@ -19,12 +19,13 @@
 #include <cstdint>
 #include <map>
 #include <string>
+#include <unordered_map>
 #include <utility>
 #include <vector>
 
 #include "host/device/DeviceTree.h"
-#include "host/record/ExecutorObserver.h"
 #include "host/device/NodeMap.h"
+#include "host/record/ExecutorObserver.h"
 #include "host/record/Timeline.h"
 
 namespace velmora {
@@ -53,8 +54,8 @@ public:
 private:
     struct Request {
         std::string value;
-        uint64_t seq = 0;     // order of arrival, for "latest wins"
-        bool asked = false;   // `value` is what the source wrote: the node took it unchanged
+        uint64_t seq = 0;    // order of arrival, for "latest wins"
+        bool asked = false;  // `value` is what the source wrote: the node took it unchanged
     };
     struct Node {
         std::map<std::string, Request> requests;  // by source
@@ -79,8 +80,8 @@ private:
     const NodeMap& mNodes;
     DeviceTree& mTree;
     Timeline* mTimeline;
-    std::map<std::string, Node> mRequests;                            // by node key
-    std::map<std::string, std::vector<std::string>> mSourceKeys;      // source -> its keys
+    std::unordered_map<std::string, Node> mRequests;                        // by node key
+    std::unordered_map<std::string, std::vector<std::string>> mSourceKeys;  // source -> its keys
     uint64_t mSeq = 0;
     ExecutorObserver* mObserver = nullptr;
 };

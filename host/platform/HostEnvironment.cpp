@@ -65,7 +65,12 @@ std::string HostEnvironment::defaultSimulatedRoot() {
     return (dir == "/" ? "" : dir) + "/velmora-sim-" + std::to_string(getpid());
 }
 
+void HostEnvironment::setServerTracing(bool on) {
+    Trace::setSink(on ? &mTraceSink : nullptr);
+}
+
 void HostEnvironment::reset() {
+    setServerTracing(true);
     mClock.setVirtual();
     mTimeline.clear();
     mNodeMap = NodeMap();

@@ -10,7 +10,7 @@
 //
 // The parts are thread safe on their own. useDeviceRoot and nodeMap changes must happen while
 // no platform object exists. The server's trace tracks go to the timeline from the moment the
-// environment exists (it installs its trace sink on construction).
+// environment exists (it installs its trace sink on construction) until setServerTracing(false).
 #pragma once
 
 #include <string>
@@ -33,8 +33,13 @@ public:
     static HostEnvironment& get();
 
     // Everything back to the defaults: an unpaced clock at 0, empty timeline and event
-    // log, default node map and properties, no policies, the default simulated device root.
+    // log, default node map and properties, no policies, the default simulated device root,
+    // the server's trace tracks on.
     void reset();
+    // Whether the server's trace points reach the timeline. Off, the server sees nobody tracing
+    // (as on a device without a capture) and skips the work of its trace points: for a replay
+    // that writes no timeline. Set while no server exists.
+    void setServerTracing(bool on);
 
     // Device root: "/" writes the real nodes; any other directory is a simulated device, seeded
     // with every node's seed value when `fresh` (or when it was never seeded). 0 or -1 (logged).

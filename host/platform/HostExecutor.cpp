@@ -4,6 +4,7 @@
 
 #include "config/Action.h"
 #include "config/CommandIds.h"
+#include "config/CommandKind.h"
 #include "config/Tags.h"
 #include "host/vocabulary/ParamVocabulary.h"
 #include "platform/VelmoraLog.h"
@@ -23,13 +24,17 @@ const std::string kProbeSource = "probe";
 
 // Kind of a command as far as its lifetime goes; also the timeline category of its instants.
 const char* categoryOf(int cmdId) {
-    if (cmdId >= kSpecialSceneFirst && cmdId <= kSpecialSceneLast)
-        return "scene";
-    if (cmdId >= kOnOffFirst && cmdId <= kOnOffLast)
-        return "onoff";
-    if (cmdId == kCmdMemLatencyRatio || cmdId == kCmdMemLatency)
-        return "memlat";
-    return "action";
+    switch (classify(cmdId)) {
+        case CommandKind::kSpecialScene:
+        case CommandKind::kGovernorScene:
+            return "scene";
+        case CommandKind::kOnOff:
+            return "onoff";
+        case CommandKind::kMemoryLatency:
+            return "memlat";
+        default:
+            return "action";
+    }
 }
 
 std::string describe(const Action& action) {

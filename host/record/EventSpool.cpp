@@ -12,9 +12,12 @@ namespace velmora {
 
 namespace {
 
-bool writeAll(int fd, const char* data, size_t size, off_t offset) {
+// Runs `io` (pread or pwrite) until `size` bytes at `offset` are moved; a short transfer goes on
+// from where it stopped, an interrupted one is retried. False on an error or an end of file.
+template <typename Buffer, typename Io>
+bool transferAll(int fd, Buffer* data, size_t size, off_t offset, Io io) {
     while (size > 0) {
-        const ssize_t n = pwrite(fd, data, size, offset);
+        const ssize_t n = io(fd, data, size, offset);
         if (n < 0 && errno == EINTR)
             continue;
         if (n <= 0)
@@ -26,18 +29,12 @@ bool writeAll(int fd, const char* data, size_t size, off_t offset) {
     return true;
 }
 
+bool writeAll(int fd, const char* data, size_t size, off_t offset) {
+    return transferAll(fd, data, size, offset, pwrite);
+}
+
 bool readAll(int fd, char* data, size_t size, off_t offset) {
-    while (size > 0) {
-        const ssize_t n = pread(fd, data, size, offset);
-        if (n < 0 && errno == EINTR)
-            continue;
-        if (n <= 0)
-            return false;
-        data += n;
-        size -= static_cast<size_t>(n);
-        offset += n;
-    }
-    return true;
+    return transferAll(fd, data, size, offset, pread);
 }
 
 }  // namespace

@@ -1,12 +1,14 @@
 #include "host/time/HostProbeClock.h"
 
+#include "config/CommandIds.h"
+
 namespace velmora {
 
 namespace {
 
 // A boosted thread's lifetime: a polling worker must look at the queues again this long after
 // any timestamp it or a host thread took.
-constexpr int64_t kBoostLifetimeUs = 256 * 1000;
+constexpr int64_t kBoostLifetimeUs = int64_t{kProbeBoostLifetimeMs} * 1000;
 // Trace time starts at 0, but a probe timestamp of 0 means "withdrawn": the worker's time runs
 // one second ahead of trace time.
 constexpr int64_t kEpochNs = 1000 * 1000 * 1000;

@@ -5,6 +5,7 @@
 #include <cstdlib>
 
 #include "config/CommandIds.h"
+#include "config/CommandKind.h"
 #include "config/Tags.h"
 #include "platform/VelmoraLog.h"
 
@@ -117,8 +118,7 @@ std::vector<std::string> ParamVocabulary::names(bool stringPairs) {
 }
 
 bool ParamVocabulary::usesStringPairs(int cmdId) {
-    return (cmdId >= kGovSceneFirst && cmdId <= kSpecialSceneLast) ||
-           cmdId == kCmdMemLatencyRatio || cmdId == kCmdMemLatency;
+    return isGovernorSceneId(cmdId) || isMemLatencyId(cmdId);
 }
 
 Action* ParamVocabulary::toAction(const RawXmlData& record) {

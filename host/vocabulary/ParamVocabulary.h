@@ -25,13 +25,14 @@
 
 #include "config/Action.h"
 #include "config/RawXmlData.h"
+#include "config/Tags.h"
 
 namespace velmora {
 
 class ParamVocabulary {
 public:
     // Most pairs an action keeps (the on/off path carries at most this many).
-    static constexpr int kMaxPairs = 43;
+    static constexpr int kMaxPairs = kMaxEventPairs;
 
     // Integer tag of a parameter name, or -1.
     static int tagForName(const std::string& name);

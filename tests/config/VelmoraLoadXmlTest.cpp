@@ -2,7 +2,14 @@
 // is logged for each kind of broken file.
 #include "config/VelmoraLoadXml.h"
 
+#include <fcntl.h>
+#include <signal.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <functional>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "tests/fakes/ServerTest.h"
@@ -170,6 +177,67 @@ TEST_F(VelmoraLoadXmlTest, AtMostThreeActionsAndRejectedOnesCount) {
     EXPECT_EQ(chain[2].values, std::vector<std::string>{"3"});
     EXPECT_TRUE(LogCapture::has(ANDROID_LOG_ERROR, "xml name or value is NULL!"));
 }
+
+// Files that are not what a size check on the path would make of them: each is read through the
+// descriptor its size was taken from, and refused with a line naming it.
+struct UnusualFileRow {
+    const char* name;
+    // Makes the file at `path`; may start a thread that feeds it, joined after the load.
+    std::function<std::thread(const std::string& path)> make;
+    const char* log;
+};
+
+class UnusualConfigFileTest : public VelmoraLoadXmlTest,
+                              public ::testing::WithParamInterface<UnusualFileRow> {};
+
+TEST_P(UnusualConfigFileTest, IsRefusedWithALineNamingIt) {
+    const UnusualFileRow& row = GetParam();
+    const std::string path = mTmpDir + "/unusual.xml";
+    std::thread feeder = row.make(path);
+    RawXmlDataMap rawMap;
+    EXPECT_EQ(mLoader.innerLoad(path.c_str(), &rawMap), 2);
+    if (feeder.joinable()) {
+        feeder.join();
+    }
+    EXPECT_TRUE(rawMap.empty());
+    EXPECT_EQ(LogCapture::countContaining(row.log), 1) << row.log;
+    EXPECT_EQ(LogCapture::countContaining(path), 1);
+}
+
+constexpr size_t kOverLimit = 16u * 1024 * 1024 + 1;
+
+// clang-format off
+INSTANTIATE_TEST_SUITE_P(
+    Rows, UnusualConfigFileTest,
+    ::testing::Values(
+        // Size 0 when it is looked at, then more than the limit: the read stops at the limit.
+        UnusualFileRow{"GrowsPastTheLimitWhileRead",
+                       [](const std::string& path) {
+                           EXPECT_EQ(mkfifo(path.c_str(), 0600), 0);
+                           return std::thread([path] {
+                               signal(SIGPIPE, SIG_IGN);  // the loader stops reading early
+                               const int fd = open(path.c_str(), O_WRONLY);
+                               const std::string block(64 * 1024, ' ');
+                               size_t sent = 0;
+                               while (fd >= 0 && sent < kOverLimit + block.size()) {
+                                   const ssize_t n = write(fd, block.data(), block.size());
+                                   if (n <= 0) break;
+                                   sent += static_cast<size_t>(n);
+                               }
+                               if (fd >= 0) close(fd);
+                           });
+                       },
+                       "grew past 16777216 bytes while read"},
+        UnusualFileRow{"Directory",
+                       [](const std::string& path) {
+                           EXPECT_EQ(mkdir(path.c_str(), 0700), 0);
+                           return std::thread();
+                       },
+                       "LoadFile error, path:"},
+        UnusualFileRow{"Missing", [](const std::string&) { return std::thread(); },
+                       "LoadFile error, path:"}),
+    [](const ::testing::TestParamInfo<UnusualFileRow>& info) { return info.param.name; });
+// clang-format on
 
 }  // namespace
 }  // namespace fake

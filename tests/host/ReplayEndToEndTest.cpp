@@ -7,6 +7,7 @@
 
 #include <cstdio>
 #include <cstring>
+#include <sstream>
 #include <string>
 #include <vector>
 
@@ -21,6 +22,15 @@ class ReplayEndToEndTest : public testing::Test {
 protected:
     static void SetUpTestSuite() {
         sDir = new std::string(hosttest::makeScratchDir("replay"));
+        // First as a plain replay runs (no timeline, no event log: the server's trace points
+        // off), then with both files; the tests below look at the second.
+        ReplayOptions plain =
+            hosttest::replayOptions(*sDir, hosttest::examplesDir() + "/minute.trace");
+        plain.timelinePath.clear();
+        plain.eventLogPath.clear();
+        FILE* plainOut = fopen((*sDir + "/stdout-plain.txt").c_str(), "w");
+        ReplaySession(plain, plainOut, stderr).run();
+        fclose(plainOut);
         FILE* out = fopen((*sDir + "/stdout.txt").c_str(), "w");
         ReplaySession session(
             hosttest::replayOptions(*sDir, hosttest::examplesDir() + "/minute.trace"), out, stderr);
@@ -130,6 +140,24 @@ TEST_F(ReplayEndToEndTest, TimelineHoldsTheNodeAndServerTracks) {
     for (const auto& sample : HostEnvironment::get().timeline().counter("velmora.scene"))
         scenes.push_back(sample.value);
     EXPECT_EQ((std::vector<int64_t>{4118, 0, 4119, 4224, 4230, 0}), scenes);
+}
+
+// Writing the files changes nothing of what the replay prints but the lines that name them.
+TEST_F(ReplayEndToEndTest, PlainReplayPrintsWhatTheOneWithFilesPrints) {
+    auto without = [](std::string text) {
+        std::string kept;
+        std::istringstream in(text);
+        for (std::string line; std::getline(in, line);) {
+            if (line.rfind("timeline: ", 0) != 0 && line.rfind("event log: ", 0) != 0)
+                kept += line + "\n";
+        }
+        while (kept.size() > 1 && kept.compare(kept.size() - 2, 2, "\n\n") == 0)
+            kept.pop_back();  // the blank line before the files' lines
+        return kept;
+    };
+    const std::string plain = hosttest::readFile(*sDir + "/stdout-plain.txt");
+    EXPECT_NE(std::string::npos, plain.find(" host calls, ")) << plain;
+    EXPECT_EQ(without(hosttest::readFile(*sDir + "/stdout.txt")), without(plain));
 }
 
 // No configuration, one that does not know the trace's calls (warned about once per command, where

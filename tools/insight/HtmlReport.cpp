@@ -1,9 +1,9 @@
 #include "tools/insight/HtmlReport.h"
 
 #include <cstdio>
-#include <fstream>
 #include <sstream>
 
+#include "host/text/TextFile.h"
 #include "tools/insight/InsightSummary.h"
 #include "tools/insight/ReportScripts.h"
 
@@ -221,18 +221,8 @@ bool HtmlReport::write(const InsightResult& result, const std::string& path, std
 
 bool HtmlReport::write(const InsightResult& result, const std::vector<ReportPlot>& plots,
                        const std::string& path, std::string* error) {
-    std::ofstream file(path, std::ios::trunc);
-    if (!file) {
-        *error = "cannot write " + path;
-        return false;
-    }
-    write(result, plots, file);
-    file.close();
-    if (!file) {
-        *error = "write failed: " + path;
-        return false;
-    }
-    return true;
+    return TextFile::write(
+        path, [&](std::ostream& file) { write(result, plots, file); }, error);
 }
 
 }  // namespace velmora

@@ -1,6 +1,8 @@
 #include "tools/insight/InsightJson.h"
 
-#include <fstream>
+#include <ostream>
+
+#include "host/text/TextFile.h"
 
 #include "tools/energy/EnergyComparison.h"
 
@@ -34,20 +36,14 @@ nlohmann::json nodeJson(const NodeInsight& node, int64_t endUs) {
 
 bool writeFile(const std::string& path, std::string* error,
                const std::function<void(JsonStreamWriter&)>& write) {
-    std::ofstream file(path, std::ios::trunc);
-    if (!file) {
-        *error = "cannot write " + path;
-        return false;
-    }
-    JsonStreamWriter out(file);
-    write(out);
-    file << "\n";
-    file.close();
-    if (!file) {
-        *error = "write failed: " + path;
-        return false;
-    }
-    return true;
+    return TextFile::write(
+        path,
+        [&write](std::ostream& file) {
+            JsonStreamWriter out(file);
+            write(out);
+            file << "\n";
+        },
+        error);
 }
 
 // "energy": {"<id>": {"mJ", "saturated_ms", "limits_mJ", "limits_saturated_ms", "residency":

@@ -4,15 +4,13 @@
 #include <cstdio>
 #include <cstdlib>
 
+#include "config/CommandKind.h"
+
 namespace velmora {
 
 namespace {
 
 constexpr uint64_t kDigestSeed = 14695981039346656037ull;
-
-bool isOnOff(int cmdId) {
-    return cmdId >= 12288 && cmdId <= 13568;
-}
 
 // FNV-1a, continued over `text` and a separator.
 uint64_t digest(uint64_t hash, const std::string& text) {
@@ -97,16 +95,16 @@ void ReplayInsight::endCall(int status) {
         const int cmdId = mCall.id;
         const bool on = mCall.payload[0] == 0;
         const bool off = mCall.payload[0] == -1;
-        if (cmdId == 4116 && on) {
+        if (classify(cmdId) == CommandKind::kProbe && on) {
             int pid = 0;
             unsigned int tid = 0;
             if (sscanf(mCall.msg.c_str(), "pid=%d|tid=%u", &pid, &tid) == 2)
                 mProbeCalls[tid] = mCallRef;
-        } else if (isOnOff(cmdId) && on && mOnOff.count(cmdId) == 0) {
+        } else if (isOnOffId(cmdId) && on && mOnOff.count(cmdId) == 0) {
             mOnOff[cmdId] = {"onoff",
                              std::to_string(cmdId) + (mCallName.empty() ? "" : " " + mCallName),
                              now, mCallRef};
-        } else if (isOnOff(cmdId) && off && mOnOff.count(cmdId) != 0) {
+        } else if (isOnOffId(cmdId) && off && mOnOff.count(cmdId) != 0) {
             const Applied applied = mOnOff[cmdId];
             mOnOff.erase(cmdId);
             closeSpanLocked("onoff", applied.name, applied.beginUs, now, applied.call, false);

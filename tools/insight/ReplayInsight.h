@@ -14,6 +14,7 @@
 #include <mutex>
 #include <set>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 #include "host/device/NodeMap.h"
@@ -101,7 +102,7 @@ private:
 
     mutable std::mutex mLock;  // guards everything below
     SourceLedger mLedger;
-    std::map<std::string, NodeTrack> mTracks;
+    std::unordered_map<std::string, NodeTrack> mTracks;
     std::vector<std::string> mOrder;  // node keys in order of first sight
     bool mInCall = false;
     CallRecord mCall;

@@ -2,6 +2,7 @@
 #include <algorithm>
 #include <map>
 
+#include "config/CommandKind.h"
 #include "host/record/Timeline.h"
 #include "tools/insight/ReplayInsight.h"
 
@@ -128,8 +129,7 @@ void ReplayInsight::stuckWarningsLocked(InsightResult* result) const {
     for (const auto& entry : mApplied) {
         const int cmdId = entry.first;
         const Applied& a = entry.second;
-        if (a.category == "scene" && cmdId >= 4224 && cmdId <= 4352 &&
-            mSwitchedOff.count(cmdId) != 0) {
+        if (a.category == "scene" && isGovernorSceneId(cmdId) && mSwitchedOff.count(cmdId) != 0) {
             warn("governor_scene",
                  "governor scene " + a.name +
                      " is still applied although it was switched off: the server does not "

@@ -4,13 +4,14 @@ namespace velmora {
 
 DispatchClass CommandClass::classify(int cmdId, bool hasAction, int duration) {
     // Ids from 20224 up are taken apart before any parse; 20481 parses but ignores duration.
-    if (cmdId == kCmdMemLatency) {
+    const CommandKind kind = velmora::classify(cmdId);
+    if (kind == CommandKind::kMemoryLatency && cmdId == kCmdMemLatency) {
         return DispatchClass::kMemoryLatency;
     }
     if (cmdId >= kCmdClientRestart) {
         return DispatchClass::kNeverRead;
     }
-    if (cmdId == kCmdProbe) {
+    if (kind == CommandKind::kProbe) {
         return DispatchClass::kProbe;
     }
     if (!hasAction) {
@@ -19,11 +20,13 @@ DispatchClass CommandClass::classify(int cmdId, bool hasAction, int duration) {
     if (duration < 0) {
         return DispatchClass::kDisabled;
     }
-    if (isScene(cmdId)) {
-        return cmdId >= kGovSceneFirst ? DispatchClass::kGovernorScene
-                                       : DispatchClass::kSpecialScene;
+    if (kind == CommandKind::kSpecialScene) {
+        return DispatchClass::kSpecialScene;
     }
-    if (isOnOff(cmdId)) {
+    if (kind == CommandKind::kGovernorScene) {
+        return DispatchClass::kGovernorScene;
+    }
+    if (kind == CommandKind::kOnOff) {
         return DispatchClass::kOnOff;
     }
     if (duration == 0) {

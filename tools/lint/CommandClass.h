@@ -7,6 +7,7 @@
 #include <string>
 
 #include "config/CommandIds.h"
+#include "config/CommandKind.h"
 
 namespace velmora {
 
@@ -34,10 +35,8 @@ public:
     // What an event of the class does, for the --explain listing.
     static std::string effect(DispatchClass dispatchClass, int cmdId, int duration);
 
-    static bool isScene(int cmdId) {
-        return cmdId >= kSpecialSceneFirst && cmdId <= kSpecialSceneLast;
-    }
-    static bool isOnOff(int cmdId) { return cmdId >= kOnOffFirst && cmdId <= kOnOffLast; }
+    static bool isScene(int cmdId) { return isSceneId(cmdId); }
+    static bool isOnOff(int cmdId) { return isOnOffId(cmdId); }
     // Built-in priority of a special scene, 0 when it has none.
     static int builtInPriority(int cmdId);
 };

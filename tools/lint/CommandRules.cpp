@@ -17,7 +17,7 @@ constexpr int kMaxGroupPairs = kEasGroupCount;
 constexpr int kPriorityTag = kTagScenePriority;
 constexpr const char* kPriorityKey = kScenePriorityKey;
 // The probe worker caps the start-up probe action's duration; a reloaded one keeps its own.
-constexpr int kMaxProbeDurationMs = 100;
+constexpr int kMaxProbeDurationMs = kProbeDurationCapMs;
 
 const char* const kEasGroupNames[kEasGroupCount] = {
     "group_boost",          "group_vip",        "group_top_app",
@@ -232,12 +232,13 @@ void CommandRules::checkProbe(const CheckedCommand* command) {
     const int duration = record->action->mDuration;
     if (duration > kMaxProbeDurationMs) {
         mDiagnostics.warning(durationLine(*record),
-                             "probe duration " + str(duration) +
-                                 " ms is capped to 100 at start-up but used as configured after a "
-                                 "reload");
+                             "probe duration " + str(duration) + " ms is capped to " +
+                                 str(kMaxProbeDurationMs) +
+                                 " at start-up but used as configured after a reload");
         mDiagnostics.explain(
-            "the probe worker clamps the duration of the probe action it is built with to 100 "
-            "ms; a reload hands it the newly parsed action unchanged, so the same configuration "
+            "the probe worker clamps the duration of the probe action it is built with to " +
+            str(kMaxProbeDurationMs) +
+            " ms; a reload hands it the newly parsed action unchanged, so the same configuration "
             "boosts probed threads longer after a reload than after start-up.");
     }
 }

@@ -70,6 +70,8 @@ ReplaySession::~ReplaySession() {
 int ReplaySession::setUp() {
     HostEnvironment& env = HostEnvironment::get();
     env.reset();
+    // Without a timeline file nothing reads the server's tracks or the per-call instants.
+    env.setServerTracing(writesTimeline());
     if (mOptions.fast) {
         env.clock().setVirtual();
     } else {
@@ -292,7 +294,8 @@ int ReplaySession::performCall(const TraceCall& call) {
     ++mCalls;
     if (status != 0)
         ++mFailed;
-    env.timeline().recordInstant("call", call.source + " -> " + std::to_string(status));
+    if (writesTimeline())
+        env.timeline().recordInstant("call", call.source + " -> " + std::to_string(status));
     echo(call, result + std::to_string(status));
     return status;
 }
@@ -478,6 +481,8 @@ void ReplaySession::finishInsight() {
     if (auto* plat = mServer != nullptr ? dynamic_cast<HostPlatform*>(mServer->mPlatPtr) : nullptr)
         plat->executor()->setObserver(nullptr);
     mInsight.reset();
+    if (!writesTimeline())
+        return;
     Timeline& timeline = HostEnvironment::get().timeline();
     for (const auto& span : mResult.spans) {
         timeline.recordSpan(span.track, span.category, span.name, span.beginUs, span.endUs);

@@ -101,6 +101,9 @@ private:
     void echo(const TraceCall& call, const std::string& result);
     std::string commandName(int cmdId) const;
     int writeOutputs();
+    // The timeline file is asked for: only then are the server's tracks, the per-call instants
+    // and the analysis's spans recorded.
+    bool writesTimeline() const { return !mOptions.timelinePath.empty(); }
     // The HTML report: the node plots, then the energy model's.
     bool writeReport(std::string* error) const;
 

@@ -12,6 +12,10 @@ namespace {
 std::mutex gLock;        // guards gFile and gToStderr; the server logs from threads
 FILE* gFile = nullptr;   // --server-log, or null
 bool gToStderr = false;  // --verbose
+// liblog's threshold before route(): with no file and no stderr, route() raises it above every
+// priority, so liblog drops a line before formatting it.
+int gPriorityBefore = ANDROID_LOG_DEFAULT;
+bool gSilenced = false;
 
 char priorityLetter(int priority) {
     switch (priority) {
@@ -62,11 +66,22 @@ bool ServerLog::route(const std::string& path, bool toStderr, std::string* error
         gToStderr = toStderr;
     }
     __android_log_set_logger(routedLogger);
+    if (path.empty() && !toStderr) {
+        if (!gSilenced)
+            gPriorityBefore = __android_log_set_minimum_priority(ANDROID_LOG_SILENT);
+        gSilenced = true;
+    } else if (gSilenced) {
+        __android_log_set_minimum_priority(gPriorityBefore);
+        gSilenced = false;
+    }
     return true;
 }
 
 void ServerLog::restore() {
     __android_log_set_logger(__android_log_stderr_logger);
+    if (gSilenced)
+        __android_log_set_minimum_priority(gPriorityBefore);
+    gSilenced = false;
     std::lock_guard<std::mutex> lock(gLock);
     if (gFile != nullptr)
         fclose(gFile);

@@ -15,6 +15,7 @@
 #include <utility>
 #include <vector>
 
+#include "config/CommandIds.h"
 #include "tools/tracegen/SplitMix64.h"
 
 namespace velmora {
@@ -38,7 +39,7 @@ public:
     // The probe worker: a queued thread is boosted this long after the request, and a boost
     // is withdrawn this long after it was applied.
     static constexpr int64_t kProbeDelayMs = 8;
-    static constexpr int64_t kProbeLifetimeMs = 256;
+    static constexpr int64_t kProbeLifetimeMs = kProbeBoostLifetimeMs;
 
     explicit DeviceUseModel(SplitMix64& random) : mRandom(random) {}
 

@@ -3,14 +3,13 @@
 #include <tinyxml2.h>
 
 #include <algorithm>
-#include <cerrno>
 #include <cstdlib>
-#include <fstream>
 #include <map>
 #include <sstream>
 
 #include "host/device/profile/EnergyTableReader.h"
 #include "host/device/profile/XmlErrorText.h"
+#include "host/text/TextFile.h"
 
 namespace velmora {
 
@@ -18,20 +17,6 @@ namespace velmora {
 extern const char* const kDefaultDeviceProfileText;
 
 namespace {
-
-bool toNumber(const std::string& text, long long* value) {
-    if (text.empty()) {
-        return false;
-    }
-    errno = 0;
-    char* end = nullptr;
-    const long long v = strtoll(text.c_str(), &end, 10);
-    if (*end != '\0' || errno == ERANGE) {
-        return false;
-    }
-    *value = v;
-    return true;
-}
 
 std::vector<std::string> words(const char* text) {
     std::vector<std::string> out;
@@ -83,7 +68,7 @@ public:
                     long long v = 0;
                     if (what == "governors") {
                         rule.choices.push_back(word);
-                    } else if (toNumber(word, &v) && v > 0) {
+                    } else if (parseDecimalInteger(word, &v) && v > 0) {
                         rule.steps.push_back(v);
                     } else {
                         return fail(e->GetLineNum(), "frequency '" + word + "' of table '" + id +
@@ -108,8 +93,9 @@ public:
                 }
             } else if (what == "levels") {
                 if (!e->Attribute("min") || !e->Attribute("max") ||
-                    !toNumber(e->Attribute("min"), &mLevels.min) ||
-                    !toNumber(e->Attribute("max"), &mLevels.max) || mLevels.min > mLevels.max) {
+                    !parseDecimalInteger(e->Attribute("min"), &mLevels.min) ||
+                    !parseDecimalInteger(e->Attribute("max"), &mLevels.max) ||
+                    mLevels.min > mLevels.max) {
                     return fail(e->GetLineNum(),
                                 "<levels> needs whole numbers min=\"...\" max=\"...\", min <= max");
                 }
@@ -138,8 +124,8 @@ public:
                 return fail(e.GetLineNum(), "allowed=\"levels\" needs a <levels> element");
             }
             *rule = mLevels;
-        } else if (dots != std::string::npos && toNumber(allowed.substr(0, dots), &lo) &&
-                   toNumber(allowed.substr(dots + 2), &hi) && lo <= hi) {
+        } else if (dots != std::string::npos && parseDecimalInteger(allowed.substr(0, dots), &lo) &&
+                   parseDecimalInteger(allowed.substr(dots + 2), &hi) && lo <= hi) {
             rule->type = ValueRule::Type::kRange;
             rule->min = lo;
             rule->max = hi;
@@ -279,15 +265,9 @@ int DeviceProfile::parse(const std::string& text, const std::string& origin, std
 }
 
 int DeviceProfile::load(const std::string& path, std::string* error) {
-    std::ifstream file(path);
-    if (!file) {
-        if (error != nullptr)
-            *error = path + ": cannot open device profile";
-        return -1;
-    }
-    std::stringstream content;
-    content << file.rdbuf();
-    return parse(content.str(), path, error);
+    return TextFile::parseFile(
+        path, "device profile", [&](const std::string& text) { return parse(text, path, error); },
+        error);
 }
 
 const NodeSpec* DeviceProfile::find(const std::string& key) const {

@@ -1,26 +1,12 @@
 #include "host/device/profile/KernelRules.h"
 
 #include <algorithm>
-#include <cerrno>
-#include <cstdlib>
+
+#include "host/text/TextFile.h"
 
 namespace velmora {
 
 namespace {
-
-bool toNumber(const std::string& text, long long* value) {
-    if (text.empty()) {
-        return false;
-    }
-    errno = 0;
-    char* end = nullptr;
-    const long long v = strtoll(text.c_str(), &end, 10);
-    if (*end != '\0' || errno == ERANGE) {
-        return false;
-    }
-    *value = v;
-    return true;
-}
 
 std::string withUnit(long long value, const ValueRule& rule) {
     return std::to_string(value) + (rule.unit.empty() ? "" : " " + rule.unit);
@@ -66,7 +52,7 @@ KernelRules::Outcome KernelRules::take(const NodeSpec& spec, const std::string& 
             }
             return out;
         case ValueRule::Type::kRange:
-            if (!toNumber(requested, &v)) {
+            if (!parseDecimalInteger(requested, &v)) {
                 return refuse("'" + requested + "' is not a whole number");
             }
             if (v < rule.min || v > rule.max) {
@@ -77,7 +63,7 @@ KernelRules::Outcome KernelRules::take(const NodeSpec& spec, const std::string& 
         case ValueRule::Type::kSteps:
             break;
     }
-    if (!toNumber(requested, &v)) {
+    if (!parseDecimalInteger(requested, &v)) {
         return refuse("'" + requested + "' is not a whole number");
     }
     if (v < rule.min) {
