@@ -59,6 +59,22 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     if (profile.nodes().empty() || profile.lowestLevel() > profile.highestLevel()) {
         __builtin_trap();
     }
+    // Every energy table belongs to a domain and lists its OPPs by increasing frequency, with a
+    // power that is not negative and does not fall.
+    for (const velmora::EnergyTable& table : profile.energyTables()) {
+        bool known = false;
+        for (const auto& id : profile.frequencyDomains())
+            known = known || id == table.id;
+        if (!known || table.cpus < 1 || table.opps.empty() || table.opps[0].mw < 0) {
+            __builtin_trap();
+        }
+        for (size_t i = 1; i < table.opps.size(); ++i) {
+            if (table.opps[i].freq <= table.opps[i - 1].freq ||
+                table.opps[i].mw < table.opps[i - 1].mw) {
+                __builtin_trap();
+            }
+        }
+    }
     const velmora::NodeMap map(profile);
     for (const velmora::NodeSpec& node : map.nodes()) {
         if (profile.find(node.key) == nullptr) {

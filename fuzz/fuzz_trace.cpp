@@ -27,6 +27,20 @@ bool wellFormed(const velmora::TraceCall& call, int previousLine) {
             return !call.tags.empty() && call.values.empty();
         case Kind::Stamp:
             return call.atMs >= 0;
+        case Kind::Load:
+            // Named domains with shares in [0, 1], none twice (checked against a device later).
+            if (call.loads.empty() || call.loads.size() > velmora::TraceParser::kMaxLoads)
+                return false;
+            for (size_t i = 0; i < call.loads.size(); ++i) {
+                const velmora::LoadShare& share = call.loads[i];
+                if (share.domain.empty() || !(share.u >= 0 && share.u <= 1))
+                    return false;
+                for (size_t j = 0; j < i; ++j) {
+                    if (call.loads[j].domain == share.domain)
+                        return false;
+                }
+            }
+            return true;
         case Kind::Sleep:
         case Kind::Reload:
         case Kind::Dump:

@@ -17,7 +17,7 @@ namespace velmora {
 namespace clitest {
 namespace {
 
-enum class Tool { Replay, Logcat, Lint };
+enum class Tool { Replay, Compare, Logcat, Lint };
 
 struct BadFileRow {
     const char* name;
@@ -70,6 +70,10 @@ TEST_P(BadToolInputTest, RefusedWithOneLineNamingTheFile) {
         case Tool::Replay:
             argv = {replayTool(), "--fast", "--quiet", "--config-dir", examplesDir(), input};
             break;
+        case Tool::Compare:
+            argv = {replayTool(),  "--fast",    "--quiet", "--config-dir",
+                    examplesDir(), "--compare", input,     examplesDir() + "/minute.trace"};
+            break;
         case Tool::Logcat:
             argv = {logcatTool(), input, "-o", trace};
             break;
@@ -104,6 +108,11 @@ INSTANTIATE_TEST_SUITE_P(
         BadFileRow{"ReplayOverTheCap", Tool::Replay,
                    [](const std::string& d) { return sparse(d, kOverCap); }, 1,
                    " is 268435457 bytes, more than the 268435456 (256 MiB) a file may have here"},
+        BadFileRow{"CompareDirectoryWithoutConfiguration", Tool::Compare, subdirectory, 2,
+                   " does not load: no configuration in"},
+        BadFileRow{"CompareNothingThere", Tool::Compare,
+                   [](const std::string& d) { return d + "/none.xml"; }, 2,
+                   " does not load: no such file or directory"},
         BadFileRow{"LogcatDirectory", Tool::Logcat, subdirectory, 1, " is a directory, not a file"},
         BadFileRow{"LogcatNulByte", Tool::Logcat,
                    [](const std::string& d) { return withContent(d, kLogText + '\0' + kLogText); },

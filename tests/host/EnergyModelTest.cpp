@@ -4,7 +4,6 @@
 // configurations; how the domain picks its OPP under each governor; load lines the device
 // cannot take; the summary without load lines.
 #include <gtest/gtest.h>
-#include <sys/stat.h>
 
 #include <nlohmann/json.hpp>
 
@@ -147,9 +146,7 @@ const char* const kLaunchConfig = R"(<policy>
 //   B, floor 2000000: 16 + 2 x 100 x 0.2 = 40 mW x 1.5 s + 8 = 16 + 60 + 8 = 84
 // The comparison puts the +24 mJ first; the report of run A carries the energy plots.
 TEST(EnergyReplayTest, ComparisonPutsTheEnergyDeltaFirst) {
-    const std::string dirA = hosttest::makeScratchDir("energy-compare");
-    mkdir((dirA + "/xml").c_str(), 0755);
-    hosttest::writeFile(dirA + "/xml/velmora_config_cust.xml", kLaunchConfig);
+    const std::string dirA = hosttest::configDir("energy-compare", kLaunchConfig);
     hosttest::writeFile(dirA + "/small.xml", kSmallDevice);
     hosttest::writeFile(dirA + "/t.trace", "@0 load cpu.little=0.2\n@1000 event 4099 0\n@3000\n");
     std::string configB = kLaunchConfig;

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 #include <stdlib.h>
+#include <sys/stat.h>
 
 #include <fstream>
 #include <sstream>
@@ -15,6 +16,13 @@ std::string makeScratchDir(const std::string& name) {
         ADD_FAILURE() << "mkdtemp failed for " << pattern;
     }
     return pattern;
+}
+
+std::string configDir(const std::string& name, const std::string& config) {
+    const std::string dir = makeScratchDir(name);
+    mkdir((dir + "/xml").c_str(), 0755);
+    writeFile(dir + "/xml/velmora_config_cust.xml", config);
+    return dir;
 }
 
 std::string readFile(const std::string& path) {

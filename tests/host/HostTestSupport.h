@@ -19,6 +19,8 @@ std::string readAndClose(FILE* file);
 
 // A quiet replay of `trace` in virtual time with the device, timeline and event log in `dir`.
 ReplayOptions replayOptions(const std::string& dir, const std::string& trace);
+// A new configuration directory holding `config` as xml/velmora_config_cust.xml.
+std::string configDir(const std::string& name, const std::string& config);
 // The example configuration's directory.
 std::string examplesDir();
 

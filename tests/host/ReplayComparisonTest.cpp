@@ -25,13 +25,6 @@ const char* kConfig = R"(<policy>
 </policy>
 )";
 
-std::string configDir(const std::string& name, const std::string& config) {
-    const std::string dir = hosttest::makeScratchDir(name);
-    mkdir((dir + "/xml").c_str(), 0755);
-    hosttest::writeFile(dir + "/xml/velmora_config_cust.xml", config);
-    return dir;
-}
-
 struct CompareRow {
     const char* what;
     const char* trace;
@@ -50,7 +43,7 @@ class ComparisonTest : public testing::TestWithParam<CompareRow> {};
 
 TEST_P(ComparisonTest, TellsWhereAndWhyTheRunsPart) {
     const CompareRow& row = GetParam();
-    const std::string dirA = configDir("compare-a", kConfig);
+    const std::string dirA = hosttest::configDir("compare-a", kConfig);
     hosttest::writeFile(dirA + "/t.trace", row.trace);
     std::string config = kConfig;
     config.replace(config.find(row.from), std::string(row.from).size(), row.to);
@@ -119,7 +112,7 @@ class ComparedConfigTest : public testing::TestWithParam<ConfigPathRow> {};
 
 TEST_P(ComparedConfigTest, FindsTheConfiguration) {
     const ConfigPathRow& row = GetParam();
-    const std::string root = configDir("compared-config", kConfig);
+    const std::string root = hosttest::configDir("compared-config", kConfig);
     mkdir((root + "/empty").c_str(), 0755);
     const ComparedConfig config(root + row.given);
     if (!row.found) {

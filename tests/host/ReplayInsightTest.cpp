@@ -33,14 +33,6 @@ const char* kConfig = R"(<policy>
 </policy>
 )";
 
-// A configuration directory holding `config`.
-std::string configDir(const std::string& name, const std::string& config) {
-    const std::string dir = hosttest::makeScratchDir(name);
-    mkdir((dir + "/xml").c_str(), 0755);
-    hosttest::writeFile(dir + "/xml/velmora_config_cust.xml", config);
-    return dir;
-}
-
 struct Replayed {
     std::string dir;
     InsightResult insight;
@@ -49,7 +41,7 @@ struct Replayed {
 // Replays `trace` under kConfig in a scratch directory, with every output written there.
 Replayed replay(const std::string& name, const std::string& trace) {
     Replayed run;
-    run.dir = configDir(name, kConfig);
+    run.dir = hosttest::configDir(name, kConfig);
     hosttest::writeFile(run.dir + "/t.trace", trace);
     ReplayOptions options = hosttest::replayOptions(run.dir, run.dir + "/t.trace");
     options.summaryJsonPath = run.dir + "/summary.json";
@@ -190,7 +182,7 @@ TEST(ReplayInsightTest, ComparesTwoConfigurationsDifferingInOneValue) {
     const Replayed a = replay("compare-a", trace);
     std::string configB = kConfig;
     configB.replace(configB.find("1804800"), 7, "1497600");
-    const std::string dirB = configDir("compare-b", configB);
+    const std::string dirB = hosttest::configDir("compare-b", configB);
     ReplayOptions options = hosttest::replayOptions(a.dir, a.dir + "/t.trace");
     options.summaryJsonPath = a.dir + "/comparison.json";
     FILE* out = fopen((a.dir + "/compare.txt").c_str(), "w");

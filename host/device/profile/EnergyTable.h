@@ -27,15 +27,6 @@ struct EnergyTable {
     int cpus = 1;                 // CPUs of the domain (1 for a devfreq device such as the GPU)
     std::vector<EnergyOpp> opps;  // one per available frequency, ascending
     int line = 0;                 // line of <energy> in its profile
-
-    // Power of one fully busy CPU at `freq`, an OPP of the table; 0 when it is none.
-    double mwAt(long long freq) const {
-        for (const auto& opp : opps) {
-            if (opp.freq == freq)
-                return opp.mw;
-        }
-        return 0;
-    }
 };
 
 }  // namespace velmora
