@@ -72,4 +72,4 @@ def test_a_dask_cluster_gives_the_local_fleet_json(cluster, tmp_path):
     assert local.returncode == 1 and dask.returncode == 1, dask.stderr
     local_json = (tmp_path / "local" / "fleet.json").read_bytes()
     assert (tmp_path / "dask" / "fleet.json").read_bytes() == local_json
-    assert local_json.count(b'"status": "ok"') == 4
+    assert local_json.count(b'"status":"ok"') == 4

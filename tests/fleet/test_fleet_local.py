@@ -140,6 +140,7 @@ def test_progress_shows_on_a_terminal(fleet_input, tmp_path):
       "SESSIONS"], "not allowed with"),
     (["--config-dir", EXAMPLES, "-o", "OUT", "--frobnicate", "SESSIONS"], "unrecognized"),
     (["--config-dir", EXAMPLES, "-o", "OUT", "EMPTY"], "no sessions"),
+    (["--config-dir", EXAMPLES, "-o", "/proc/version/out", "SESSIONS"], "cannot make"),
     (["--config-dir", EXAMPLES, "-o", "OUT", "--scheduler", "tcp://127.0.0.1:9",
       "SESSIONS"], "cannot reach the Dask scheduler"),
 ])

@@ -113,6 +113,18 @@ def print_totals(totals):
     print(left + ("; B: %d" % b["left_applied"] if b else ""))
 
 
+def fleet_json(fleet):
+    """fleet.json's text: compact (the summaries are large; Python's indenting encoder is
+    several times slower than the compact one), one session per line."""
+    def compact(value):
+        return json.dumps(value, separators=(",", ":"))
+
+    head = ",\n".join('"%s":%s' % (key, compact(fleet[key])) for key in ("config_a", "config_b"))
+    sessions = ",\n".join(compact(session) for session in fleet["sessions"])
+    return '{%s,\n"sessions":[\n%s\n],\n"totals":%s}\n' % (head, sessions,
+                                                             compact(fleet["totals"]))
+
+
 def run(args, replay):
     sessions = find_sessions(args.sessions)
     if args.jobs is not None and args.jobs < 1:
@@ -148,7 +160,7 @@ def run(args, replay):
              "sessions": results,
              "totals": {"a": FleetTotals.of(results, "a"),
                         "b": FleetTotals.of(results, "b") if configs["b"] else None}}
-    write_atomically(os.path.join(out, "fleet.json"), json.dumps(fleet, indent=1) + "\n")
+    write_atomically(os.path.join(out, "fleet.json"), fleet_json(fleet))
     links = {}
     if args.reports:
         for job in jobs:
@@ -175,6 +187,11 @@ def main(argv, here):
         return run(args, replay)
     except UsageError as err:
         print("velmora-fleet: %s" % err, file=sys.stderr)
+        return 2
+    except OSError as err:
+        # The outputs could not be written (a full disk, a directory taken away meanwhile).
+        print("velmora-fleet: %s: %s" % (err.filename or args.out, err.strerror),
+              file=sys.stderr)
         return 2
     except KeyboardInterrupt:
         print("velmora-fleet: interrupted; nothing written", file=sys.stderr)
