@@ -5,12 +5,16 @@
 
 namespace velmora {
 
+std::string FirstDivergence::millis(int64_t us) {
+    char buf[32];
+    snprintf(buf, sizeof(buf), "%.3f", static_cast<double>(us) / 1000.0);
+    return buf;
+}
+
 namespace {
 
 std::string msText(int64_t us) {
-    char buf[32];
-    snprintf(buf, sizeof(buf), "%.3f ms", static_cast<double>(us) / 1000.0);
-    return buf;
+    return FirstDivergence::millis(us) + " ms";
 }
 
 // The value `segments` hold right after everything that happened at `us`.

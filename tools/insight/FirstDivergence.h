@@ -17,6 +17,9 @@ public:
     // Compares the value histories of every node present in both runs.
     FirstDivergence(const InsightResult& a, const InsightResult& b);
 
+    // A trace time in milliseconds as the comparison prints it: "2200.000".
+    static std::string millis(int64_t us);
+
     bool found() const { return mUs >= 0; }
     int64_t us() const { return mUs; }
     const std::string& node() const { return mNode; }

@@ -7,16 +7,6 @@
 
 namespace velmora {
 
-namespace {
-
-std::string msText(int64_t us) {
-    char buf[32];
-    snprintf(buf, sizeof(buf), "%.3f", static_cast<double>(us) / 1000.0);
-    return buf;
-}
-
-}  // namespace
-
 ReplayComparison::ReplayComparison(std::string labelA, InsightResult a, std::string labelB,
                                    InsightResult b)
     : mLabelA(std::move(labelA)),
@@ -102,13 +92,13 @@ std::string ReplayComparison::headline() const {
 std::string ReplayComparison::divergenceText() const {
     std::string out;
     if (timedFirst()) {
-        out += "first divergence at " + msText(mTimed.us()) + " ms, a timed change of " +
-               mTimed.node() + "\n";
+        out += "first divergence at " + FirstDivergence::millis(mTimed.us()) +
+               " ms, a timed change of " + mTimed.node() + "\n";
         out += "  A: " + mTimed.a() + "\n  B: " + mTimed.b() + "\n";
     } else if (mFirst >= 0) {
         const CallRef& call = firstDivergentCall();
         out += "first divergence at call " + std::to_string(call.index + 1) + " [" +
-               msText(call.us) + " ms] " + call.where + ": " + call.text + "\n";
+               FirstDivergence::millis(call.us) + " ms] " + call.where + ": " + call.text + "\n";
         out += "  A: status " + divergenceA() + "\n  B: status " + divergenceB() + "\n";
     } else {
         out += "the runs never diverge: every call had the same status and node changes\n";
@@ -133,7 +123,8 @@ std::string ReplayComparison::nodesText() const {
         std::string times;
         for (size_t i = 0; i < diff.residency.size() && i < 3; ++i) {
             const ValueTime& v = diff.residency[i];
-            times += " " + v.value + ":" + msText(v.aUs) + "->" + msText(v.bUs);
+            times += " " + v.value + ":" + FirstDivergence::millis(v.aUs) + "->" +
+                     FirstDivergence::millis(v.bUs);
         }
         snprintf(line, sizeof(line), "%-26s %14s %14s  %s / %s;%s\n", diff.key.c_str(),
                  diff.finalA.c_str(), diff.finalB.c_str(), diff.heldByA.c_str(),
