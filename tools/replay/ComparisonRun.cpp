@@ -10,6 +10,7 @@
 #include "tools/insight/InsightJson.h"
 #include "tools/insight/ReplayComparison.h"
 #include "tools/replay/ComparedConfig.h"
+#include "tools/replay/ReplayOutputs.h"
 
 namespace velmora {
 
@@ -72,7 +73,7 @@ int ComparisonRun::run() {
     }
     for (const std::string* path : {&mOptions.summaryJsonPath, &mOptions.reportPath}) {
         std::string why;
-        if (!path->empty() && !ReplaySession::checkWritable(*path, &why)) {
+        if (!path->empty() && !ReplayOutputs::checkWritable(*path, &why)) {
             fprintf(mErr, "velmora-replay: %s\n", why.c_str());
             return ReplaySession::kSetupFailed;
         }

@@ -14,17 +14,15 @@
 #include "platform/VelmoraPlat.h"
 #include "server/VelmoraServer.h"
 #include "tools/common/InputFile.h"
-#include "tools/common/Spelling.h"
 #include "tools/energy/EnergyModel.h"
-#include "tools/energy/EnergyPlots.h"
 #include "tools/energy/EnergySummary.h"
 #include "tools/energy/LoadDomains.h"
-#include "tools/insight/HtmlReport.h"
-#include "tools/insight/InsightJson.h"
 #include "tools/insight/InsightSummary.h"
 #include "tools/insight/ReplayInsight.h"
+#include "tools/replay/CallWarnings.h"
 #include "tools/replay/PacedLineReader.h"
 #include "tools/replay/ProgressLine.h"
+#include "tools/replay/ReplayOutputs.h"
 #include "tools/replay/SameCpuScope.h"
 #include "tools/replay/TraceReader.h"
 #include "tools/replay/TraceSurvey.h"
@@ -34,8 +32,6 @@ namespace velmora {
 namespace {
 
 constexpr int kReloadCmdId = kCmdReload;
-constexpr const char* kColdPolicy = kColdPolicyName;
-constexpr const char* kWinSwitchPolicy = kWinSwitchPolicyName;
 // How long, in trace time, the end of a replay waits for the library's probe worker to
 // withdraw its boosts (boosts live at most 256 ms), in steps of kProbeDrainStepMs, and then for
 // the worker to drop the withdrawn entries.
@@ -50,12 +46,6 @@ std::string directoryOf(const std::string& path) {
     if (slash == std::string::npos)
         return ".";
     return slash == 0 ? "/" : path.substr(0, slash);
-}
-
-std::string formatNumber(double v) {
-    char buf[32];
-    snprintf(buf, sizeof(buf), "%.10g", v);
-    return buf;
 }
 
 }  // namespace
@@ -329,7 +319,7 @@ int ReplaySession::replayFile() {
         mInsight->keepCallDigests();
     if (mInsight != nullptr && !mOptions.compareWithDigests.empty())
         mInsight->compareWith(std::move(mOptions.compareWithDigests));
-    warnAboutCalls(survey);
+    CallWarnings::print(survey, *mServer, mOptions.tracePath, mErr);
     HostClock& clock = HostEnvironment::get().clock();
     ProgressLine progress(mErr);
     TraceReader reader(mOptions.tracePath);
@@ -386,60 +376,6 @@ int ReplaySession::replayInteractive() {
     return result;
 }
 
-void ReplaySession::warnAboutCalls(const TraceSurvey& survey) {
-    warnAboutPlaceholders(survey);
-    std::set<int> configured;
-    VelmoraParser* parser = mServer->mPlatPtr != nullptr ? mServer->mPlatPtr->mParserPtr : nullptr;
-    if (parser == nullptr) {
-        return;
-    }
-    pthread_rwlock_rdlock(&parser->mRwLock);
-    if (parser->mActionMap != nullptr) {
-        for (const auto& entry : *parser->mActionMap) {
-            configured.insert(entry.first);
-        }
-    }
-    pthread_rwlock_unlock(&parser->mRwLock);
-    const std::vector<std::string> policies = {kColdPolicy, kWinSwitchPolicy};
-    for (const auto& use : survey.uses()) {
-        // Said once, where first used: "(3 calls)" when more calls use it.
-        const std::string calls = use.calls > 1 ? " (" + std::to_string(use.calls) + " calls)" : "";
-        // Ids from 20224 up are taken apart before any parse, except memory latency 20481.
-        const bool parsed = use.cmdId < kCmdClientRestart || use.cmdId == kCmdMemLatency;
-        if (use.kind == TraceCall::Kind::Event && parsed && configured.count(use.cmdId) == 0) {
-            fprintf(mErr,
-                    "velmora-replay: %s: warning: command %d%s is not in the configuration: the "
-                    "server answers 2\n",
-                    use.where.c_str(), use.cmdId, calls.c_str());
-        } else if (use.kind == TraceCall::Kind::Policy && use.policy != kColdPolicy &&
-                   use.policy != kWinSwitchPolicy) {
-            const std::string guess = Spelling::closest(use.policy, policies);
-            fprintf(mErr,
-                    "velmora-replay: %s: warning: policy '%s'%s is never asked for: the server "
-                    "asks for \"cold\" (4099) and \"winswitch\" (4098)%s\n",
-                    use.where.c_str(), use.policy.c_str(), calls.c_str(),
-                    guess.empty() ? "" : ("; did you mean '" + guess + "'?").c_str());
-        }
-    }
-}
-
-void ReplaySession::warnAboutPlaceholders(const TraceSurvey& survey) {
-    for (const auto& placeholder : survey.placeholders()) {
-        const bool probe = placeholder.cmdId == kCmdProbe;
-        fprintf(mErr,
-                "velmora-replay: %s: warning: unedited placeholder from the import, msg=\"%s\": "
-                "%s; fill in %s\n",
-                placeholder.where.c_str(), TraceSurvey::kPlaceholderMsg,
-                probe ? "the probe boosts no thread" : "the memory-latency event fails (status 3)",
-                probe ? "the pid and tid of the thread to probe"
-                      : "the pid and tid of the thread and its ratio_b= and ratio_l=");
-    }
-    const size_t more = survey.placeholderCount() - survey.placeholders().size();
-    if (more > 0)
-        fprintf(mErr, "velmora-replay: %s: warning: %zu more unedited placeholders\n",
-                mOptions.tracePath.c_str(), more);
-}
-
 void ReplaySession::waitForProbeBoosts() {
     auto* plat = mServer != nullptr ? dynamic_cast<HostPlatform*>(mServer->mPlatPtr) : nullptr;
     if (plat == nullptr)
@@ -492,81 +428,8 @@ void ReplaySession::finishInsight() {
         [holders](const std::string& key, size_t sample) { return holders->at(key, sample); });
 }
 
-bool ReplaySession::checkWritable(const std::string& path, std::string* error) {
-    const bool existed = access(path.c_str(), F_OK) == 0;
-    FILE* file = fopen(path.c_str(), "a");
-    if (file == nullptr) {
-        *error = "cannot write " + path;
-        return false;
-    }
-    fclose(file);
-    if (!existed)
-        unlink(path.c_str());
-    return true;
-}
-
-bool ReplaySession::writeReport(std::string* error) const {
-    std::vector<ReportPlot> plots = HtmlReport::plots(mResult);
-    for (auto& plot : EnergyPlots::plots(mResult.energy))
-        plots.push_back(std::move(plot));
-    return HtmlReport::write(mResult, plots, mOptions.reportPath, error);
-}
-
-int ReplaySession::writeOutputs() {
-    if (!mOptions.writeFiles)
-        return kOk;
-    HostEnvironment& env = HostEnvironment::get();
-    std::string error;
-    if ((!mOptions.timelinePath.empty() &&
-         !env.timeline().writeChromeJson(mOptions.timelinePath, &error)) ||
-        (!mOptions.summaryJsonPath.empty() &&
-         !InsightJson::writeSummary(mResult, mOptions.summaryJsonPath, &error)) ||
-        (!mOptions.reportPath.empty() && !writeReport(&error))) {
-        fprintf(mErr, "velmora-replay: %s\n", error.c_str());
-        return kSetupFailed;
-    }
-    const bool any = !mOptions.timelinePath.empty() || !mOptions.eventLogPath.empty() ||
-                     !mOptions.summaryJsonPath.empty() || !mOptions.reportPath.empty();
-    if (any)
-        fputc('\n', mOut);
-    if (!mOptions.timelinePath.empty())
-        fprintf(mOut, "timeline: %s (open in https://ui.perfetto.dev)\n",
-                mOptions.timelinePath.c_str());
-    if (!mOptions.eventLogPath.empty())
-        fprintf(mOut, "event log: %s\n", mOptions.eventLogPath.c_str());
-    if (!mOptions.summaryJsonPath.empty())
-        fprintf(mOut, "summary: %s\n", mOptions.summaryJsonPath.c_str());
-    if (!mOptions.reportPath.empty())
-        fprintf(mOut, "report: %s (open in any browser, works offline)\n",
-                mOptions.reportPath.c_str());
-    return kOk;
-}
-
 std::string ReplaySession::summaryText() const {
-    if (!mResult.nodes.empty())
-        return InsightSummary::table(mResult);
-    std::string out;
-    char line[512];
-    snprintf(line, sizeof(line), "%-30s %14s %14s %8s %14s %14s\n", "node", "initial", "final",
-             "changes", "min", "max");
-    out += line;
-    for (const auto& node : HostEnvironment::get().timeline().summary()) {
-        snprintf(line, sizeof(line), "%-30s %14s %14s %8d %14s %14s\n", node.key.c_str(),
-                 node.initial.c_str(), node.final.c_str(), node.changes,
-                 node.numeric ? formatNumber(node.min).c_str() : "-",
-                 node.numeric ? formatNumber(node.max).c_str() : "-");
-        out += line;
-    }
-    // Where the device took a request other than asked: rounded to an available frequency, or
-    // refused like a sysfs write.
-    const auto deviceNotes = HostEnvironment::get().timeline().instants("device");
-    if (!deviceNotes.empty()) {
-        out += "\nrequested vs effective:\n";
-        for (const auto& note : deviceNotes) {
-            out += "  " + note.name + "\n";
-        }
-    }
-    return out;
+    return ReplayOutputs::summaryText(mResult);
 }
 
 int ReplaySession::run() {
@@ -574,7 +437,7 @@ int ReplaySession::run() {
         // Found out before anything is replayed, not after a long replay.
         for (const std::string* path : {&mOptions.summaryJsonPath, &mOptions.reportPath}) {
             std::string error;
-            if (!path->empty() && !checkWritable(*path, &error)) {
+            if (!path->empty() && !ReplayOutputs::checkWritable(*path, &error)) {
                 fprintf(mErr, "velmora-replay: %s\n", error.c_str());
                 return kSetupFailed;
             }
@@ -597,7 +460,8 @@ int ReplaySession::run() {
         fputs(("\n" + InsightSummary::warnings(mResult)).c_str(), mOut);
         fputs(("\n" + EnergySummary::text(mResult.energy, mResult.endUs)).c_str(), mOut);
     }
-    const int written = writeOutputs();
+    const int written =
+        mOptions.writeFiles ? ReplayOutputs::write(mOptions, mResult, mOut, mErr) : kOk;
     if (mOptions.keepRoot && mOptions.deviceRoot.empty())
         fprintf(mOut, "device kept: %s\n", env.device().root().c_str());
     return written != kOk ? written : result;

@@ -77,8 +77,6 @@ public:
     const InsightResult& insight() const { return mResult; }
     // Ends the analysis at the current trace time. Called by run() before the tear-down.
     void finishInsight();
-    // Message and false when `path` cannot be written (the file is left as it was).
-    static bool checkWritable(const std::string& path, std::string* error);
 
 private:
     int performCall(const TraceCall& call);
@@ -88,24 +86,14 @@ private:
     // Reads the device profile into mProfile once (the example device's without --device).
     int loadProfile();
     int replayInteractive();
-    // Warns (on `err`) about calls that are valid but surely not meant: events of commands the
-    // configuration lacks, launch-policy names the server never asks for; once per command or
-    // name, where it is first used.
-    void warnAboutCalls(const TraceSurvey& survey);
-    // Warns once per placeholder the importer left unedited (the first few, then how many more),
-    // naming the line and what to fill in.
-    void warnAboutPlaceholders(const TraceSurvey& survey);
     void waitForProbeBoosts();
     // Removes the simulated device root when this session made it.
     void removeOwnedRoot();
     void echo(const TraceCall& call, const std::string& result);
     std::string commandName(int cmdId) const;
-    int writeOutputs();
     // The timeline file is asked for: only then are the server's tracks, the per-call instants
     // and the analysis's spans recorded.
     bool writesTimeline() const { return !mOptions.timelinePath.empty(); }
-    // The HTML report: the node plots, then the energy model's.
-    bool writeReport(std::string* error) const;
 
     ReplayOptions mOptions;
     FILE* mOut;
