@@ -33,9 +33,9 @@ namespace {
 
 constexpr int kReloadCmdId = kCmdReload;
 // How long, in trace time, the end of a replay waits for the library's probe worker to
-// withdraw its boosts (boosts live at most 256 ms), in steps of kProbeDrainStepMs, and then for
-// the worker to drop the withdrawn entries.
-constexpr int64_t kProbeDrainLimitMs = 1000;
+// withdraw its boosts (a boost lives at most kProbeBoostLifetimeMs), in steps of
+// kProbeDrainStepMs, and then for the worker to drop the withdrawn entries.
+constexpr int64_t kProbeDrainLimitMs = 1000;  // several lifetimes
 constexpr int64_t kProbeDrainStepMs = 1;
 constexpr int64_t kProbeSettleMs = 20;
 // How often a paced interactive replay brings the device up to the wall clock between lines.
