@@ -7,15 +7,11 @@
 
 namespace velmora {
 
-namespace {
-
-std::string formatNumber(double v) {
+std::string InsightSummary::number(double v) {
     char buf[32];
     snprintf(buf, sizeof(buf), "%.10g", v);
     return buf;
 }
-
-}  // namespace
 
 std::string InsightSummary::topResidency(const NodeInsight& node, int64_t traceUs, size_t count) {
     std::string out;
@@ -47,8 +43,8 @@ std::string InsightSummary::table(const InsightResult& result) {
         }
         snprintf(line, sizeof(line), "%-30s %14s %14s %8d %14s %14s  %s\n", node.key.c_str(),
                  node.initial.c_str(), node.final.c_str(), node.changes,
-                 node.numeric ? formatNumber(lo).c_str() : "-",
-                 node.numeric ? formatNumber(hi).c_str() : "-", node.heldBy.c_str());
+                 node.numeric ? number(lo).c_str() : "-", node.numeric ? number(hi).c_str() : "-",
+                 node.heldBy.c_str());
         out += line;
     }
     return out;

@@ -21,6 +21,8 @@ public:
     static std::string warnings(const InsightResult& result);
     // "1804800 62.5%, 2841600 37.5%": the top values of `node` with their share of the trace.
     static std::string topResidency(const NodeInsight& node, int64_t traceUs, size_t count);
+    // A node's numeric value as the tables print it (up to 10 significant digits).
+    static std::string number(double v);
 };
 
 }  // namespace velmora

@@ -13,16 +13,6 @@
 
 namespace velmora {
 
-namespace {
-
-std::string formatNumber(double v) {
-    char buf[32];
-    snprintf(buf, sizeof(buf), "%.10g", v);
-    return buf;
-}
-
-}  // namespace
-
 bool ReplayOutputs::checkWritable(const std::string& path, std::string* error) {
     const bool existed = access(path.c_str(), F_OK) == 0;
     FILE* file = fopen(path.c_str(), "a");
@@ -84,8 +74,8 @@ std::string ReplayOutputs::summaryText(const InsightResult& result) {
     for (const auto& node : HostEnvironment::get().timeline().summary()) {
         snprintf(line, sizeof(line), "%-30s %14s %14s %8d %14s %14s\n", node.key.c_str(),
                  node.initial.c_str(), node.final.c_str(), node.changes,
-                 node.numeric ? formatNumber(node.min).c_str() : "-",
-                 node.numeric ? formatNumber(node.max).c_str() : "-");
+                 node.numeric ? InsightSummary::number(node.min).c_str() : "-",
+                 node.numeric ? InsightSummary::number(node.max).c_str() : "-");
         out += line;
     }
     // Where the device took a request other than asked: rounded to an available frequency, or

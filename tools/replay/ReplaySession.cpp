@@ -202,18 +202,22 @@ int ReplaySession::perform(const TraceCall& call) {
     return status;
 }
 
+void ReplaySession::warnIfBehind(const TraceCall& call, const char* what) const {
+    const long long now = HostEnvironment::get().clock().nowMs();
+    if (call.atMs >= 0 && call.atMs < now) {
+        fprintf(mErr,
+                "velmora-replay: %s:%d: warning: @%lld is before the time already reached "
+                "(%lld ms); %s %lld ms\n",
+                call.file.c_str(), call.line, static_cast<long long>(call.atMs), now, what, now);
+    }
+}
+
 int ReplaySession::performLoad(const TraceCall& call) {
     // Not a host call: the server never sees it and the analysis need not. A load stamped at or
     // before the time reached holds from there, without the hand-over to the probe worker that
     // moving the clock costs; one ahead of it moves the clock like any "@".
     HostClock& clock = HostEnvironment::get().clock();
-    if (call.atMs >= 0 && call.atMs < clock.nowMs()) {
-        fprintf(mErr,
-                "velmora-replay: %s:%d: warning: @%lld is before the time already reached "
-                "(%lld ms); the load holds from %lld ms\n",
-                call.file.c_str(), call.line, static_cast<long long>(call.atMs),
-                static_cast<long long>(clock.nowMs()), static_cast<long long>(clock.nowMs()));
-    }
+    warnIfBehind(call, "the load holds from");
     if (call.atMs > clock.nowMs())
         clock.advanceTo(call.atMs);
     if (clock.interrupted())
@@ -226,14 +230,7 @@ int ReplaySession::performLoad(const TraceCall& call) {
 
 int ReplaySession::performCall(const TraceCall& call) {
     HostEnvironment& env = HostEnvironment::get();
-    if (call.atMs >= 0 && call.atMs < env.clock().nowMs()) {
-        fprintf(mErr,
-                "velmora-replay: %s:%d: warning: @%lld is before the time already reached "
-                "(%lld ms); the call runs at %lld ms\n",
-                call.file.c_str(), call.line, static_cast<long long>(call.atMs),
-                static_cast<long long>(env.clock().nowMs()),
-                static_cast<long long>(env.clock().nowMs()));
-    }
+    warnIfBehind(call, "the call runs at");
     // This also lets the probe worker finish what the last call gave it, so a line without a
     // time runs after it, as it would a moment later on a device.
     env.clock().advanceTo(call.atMs >= 0 ? call.atMs : env.clock().nowMs());

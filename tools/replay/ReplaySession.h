@@ -90,6 +90,8 @@ private:
     // Removes the simulated device root when this session made it.
     void removeOwnedRoot();
     void echo(const TraceCall& call, const std::string& result);
+    // A time stamp behind the time reached: a warning with the line, ending "<what> N ms".
+    void warnIfBehind(const TraceCall& call, const char* what) const;
     std::string commandName(int cmdId) const;
     // The timeline file is asked for: only then are the server's tracks, the per-call instants
     // and the analysis's spans recorded.
