@@ -70,5 +70,18 @@ std::string examplesDir() {
     return std::string(VELMORA_SOURCE_DIR) + "/examples";
 }
 
+const char* const kAnalysisConfig = R"(<policy>
+  <cmd id="5376" name="defaults"><act><duration>0</duration><tag_51>0</tag_51><tag_52>0</tag_52>
+    <tag_53>0</tag_53><tag_54>0</tag_54><tag_55>0</tag_55><tag_56>0</tag_56><tag_57>0</tag_57>
+    <tag_58>0</tag_58></act></cmd>
+  <cmd id="4116" name="probe"><act><duration>100</duration><big_min>1497600</big_min></act></cmd>
+  <cmd id="4099" name="cold_launch"><act><duration>1500</duration><big_min>1804800</big_min></act></cmd>
+  <cmd id="4118" name="video"><act><gpu_max>600000000</gpu_max></act></cmd>
+  <cmd id="4119" name="game"><act><big_min>2419200</big_min></act></cmd>
+  <cmd id="4230" name="game_gpu"><act><priority>40</priority><gpu_governor>performance</gpu_governor></act></cmd>
+  <cmd id="12300" name="touch_floor"><act><duration>0</duration><little_min>1209600</little_min></act></cmd>
+</policy>
+)";
+
 }  // namespace hosttest
 }  // namespace velmora

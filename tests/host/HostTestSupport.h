@@ -23,6 +23,9 @@ ReplayOptions replayOptions(const std::string& dir, const std::string& trace);
 std::string configDir(const std::string& name, const std::string& config);
 // The example configuration's directory.
 std::string examplesDir();
+// A small configuration for the analysis and comparison tests: start-up levels, the probe
+// command, a cold launch, video and game scenes, a governor scene and an on/off floor.
+extern const char* const kAnalysisConfig;
 
 }  // namespace hosttest
 }  // namespace velmora

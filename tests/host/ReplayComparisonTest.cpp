@@ -15,15 +15,7 @@
 namespace velmora {
 namespace {
 
-const char* kConfig = R"(<policy>
-  <cmd id="5376" name="defaults"><act><duration>0</duration><tag_51>0</tag_51><tag_52>0</tag_52>
-    <tag_53>0</tag_53><tag_54>0</tag_54><tag_55>0</tag_55><tag_56>0</tag_56><tag_57>0</tag_57>
-    <tag_58>0</tag_58></act></cmd>
-  <cmd id="4116" name="probe"><act><duration>100</duration><big_min>1497600</big_min></act></cmd>
-  <cmd id="4099" name="cold_launch"><act><duration>1500</duration><big_min>1804800</big_min></act></cmd>
-  <cmd id="4118" name="video"><act><gpu_max>600000000</gpu_max></act></cmd>
-</policy>
-)";
+const char* const kConfig = hosttest::kAnalysisConfig;
 
 struct CompareRow {
     const char* what;
